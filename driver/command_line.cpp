@@ -1,0 +1,132 @@
+#include "driver/command_line.h"
+
+#include "driver/driver_messages.h"
+#include "driver/notice.h"
+#include "driver/version.h"
+
+#include <boost/program_options.hpp>
+
+#include <sstream>
+
+namespace po = boost::program_options;
+
+namespace {
+
+// A file option: one string argument, empty when not given (shown without a default).
+po::typed_value<std::string>* fileName() {
+    return po::value<std::string>()->default_value(std::string(), "");
+}
+
+po::options_description basicOptions() {
+    po::options_description options("Options");
+    options.add_options()
+        ("input,i", fileName(), "The input kqraw bayer image file.")
+        ("inputasjpeg,u", fileName(),
+         "Filename to save the input image file converted into jpeg format.")
+        ("inputasbmp,w", fileName(),
+         "Filename to save the input image file converted into bmp format.")
+        ("raw,r", fileName(),
+         "Indicates that the input image file is a headerless raw input file and specifies the "
+         "text file with the details on the layout of the file.")
+        ("translate,z", fileName(), "Filename to store headerless raw input file in kqraw format.")
+        ("config,c", fileName(), "The input config file used to set various options.")
+        ("calibrate,l", fileName(), "The lens shading calibration register file.")
+        ("autofocus,a", fileName(),
+         "Autofocus calibration data file to include in binary calibration file.")
+        ("binary,b", fileName(), "filename to store binary calibration data.")
+        ("flat,f", fileName(),
+         "The flatten image resulting from applying the lens shading calibration register "
+         "values.")
+        ("jpeg,j", fileName(),
+         "The flatten jpeg image resulting from applying the lens shading calibration register "
+         "values.")
+        ("bmp,m", fileName(),
+         "The flatten bmp image resulting from applying the lens shading calibration register "
+         "values.")
+        ("xtest,x", "Generate a surface that causes obvious color distortions for sanity checking.")
+        ("version,V", "Print version string.")
+        ("help,H", "Print this help message.");
+    return options;
+}
+
+po::options_description advancedOptions() {
+    po::options_description options("Advanced Options");
+    options.add_options()
+        ("kq", "Enable advanced options.")
+        ("samples,s", fileName(), "File containing input samples to process.")
+        ("outsamples,o", fileName(), "File to store samples obtained from input image file.")
+        ("preproc,p", fileName(),
+         "Save the adjusted preprocessed image (input to lens shading algorithm) to the specified "
+         "filename.")
+        ("nodelta,n", "Skip the delta ab check.")
+        ("delta,d", fileName(), "Output delta ab filename (CSV format).")
+        ("stats,t", fileName(), "Output delta ab stats filename (CSV format).")
+        ("log", po::value<std::string>()->default_value("-"),
+         "The name of the output info file.  \"-\" means use stdout.")
+        ("debug", "Enable debug mode.")
+        ("ignore,I",
+         "Ignore HW limits warnings and continue. The default is to stop writing the output "
+         "configuration mid-stream upon encountering a HW limit and return error code 257.")
+        ("quiet,q", "Suppress warning and informational messages.")
+        ("verbose,v", "Output detailed information during processing.");
+    return options;
+}
+
+po::variables_map parseWith(int argc, const char* const argv[],
+                            const po::options_description& options) {
+    po::variables_map map;
+    po::store(po::parse_command_line(argc, argv, options), map);
+    po::notify(map);
+    return map;
+}
+
+} // namespace
+
+CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream& out,
+                               std::ostream& err) {
+    const po::options_description basic = basicOptions();
+    po::options_description all("Options");
+    all.add(basic).add(advancedOptions());
+
+    CommandLine line;
+    line.map_ = parseWith(argc, argv, all);
+    // Without --kq an advanced option must fail as an unknown one.
+    if (!line.given("kq"))
+        parseWith(argc, argv, basic);
+
+    for (int i = 1; i < argc; ++i)
+        line.arguments_ += std::string(argv[i]) + " ";
+
+    if (line.given("version"))
+        throw notice(lscversion::versionLine());
+    if (line.given("help")) {
+        out << lscversion::versionLine() << std::endl;
+        std::ostringstream text;
+        text << (line.given("kq") ? all : basic);
+        throw notice(text.str());
+    }
+
+    bool failed = false;
+    const auto check = [&](bool bad, const char* message) {
+        if (bad) {
+            err << message << std::endl;
+            failed = true;
+        }
+    };
+    const bool noInput = line.value("input").empty();
+    check(line.value("config").empty(), msg::kNeedConfig);
+    check(noInput && line.value("samples").empty(), msg::kNeedInputOrSamples);
+    check(noInput && !line.value("outsamples").empty(), msg::kNeedInputForOutSamples);
+    check(line.value("calibrate").empty() && line.value("outsamples").empty(),
+          msg::kNeedCalibrateOrOutSamples);
+    if (failed)
+        throw notice(msg::kUseHelp);
+    return line;
+}
+
+std::string CommandLine::value(const char* name) const {
+    const auto found = map_.find(name);
+    if (found == map_.end())
+        return std::string();
+    return found->second.as<std::string>();
+}

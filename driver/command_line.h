@@ -1,0 +1,30 @@
+#pragma once
+// The two option groups, their parsing and the checks on their combination.
+
+#include <boost/program_options/variables_map.hpp>
+
+#include <ostream>
+#include <string>
+#include <vector>
+
+class CommandLine {
+public:
+    // Parses the arguments and runs, in order: the second parse without --kq,
+    // --version, --help and the combination checks. Version, help and a failed
+    // combination check are raised as `notice`; parser errors pass through.
+    // Help writes the version line to `out`; combination errors go to `err`.
+    static CommandLine parse(int argc, const char* const argv[], std::ostream& out,
+                             std::ostream& err);
+
+    // The value of a file option; empty when it was not given.
+    std::string value(const char* name) const;
+    // True when a flag (or any option) was given.
+    bool given(const char* name) const { return map_.count(name) == 1; }
+
+    // The arguments after the program name, each followed by one blank.
+    const std::string& argumentsText() const { return arguments_; }
+
+private:
+    boost::program_options::variables_map map_;
+    std::string arguments_;
+};

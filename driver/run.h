@@ -1,0 +1,5 @@
+#pragma once
+
+// The program: runs every stage and turns whatever ends the run into the
+// printed report and the exit status.
+int runProgram(int argc, const char* const argv[]);

@@ -1,0 +1,13 @@
+#include "driver/version.h"
+
+namespace lscversion {
+
+std::string versionText() {
+    return std::to_string(kMajor) + "." + std::to_string(kMinor) + "." + std::to_string(kPatch);
+}
+
+std::string versionLine() {
+    return std::string(kShortName) + " version " + versionText();
+}
+
+} // namespace lscversion

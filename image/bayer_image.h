@@ -1,0 +1,64 @@
+#pragma once
+// The driver's image object: owns one ImageBuffer whose samples are REAL32,
+// normalised so that 1.0 is the sensor's full scale, and turns the image
+// library's result codes into exceptions (std::runtime_error with a fixed text).
+
+#include "image/image_buffer.h"
+
+#include <cstdint>
+#include <string>
+
+class BayerImage {
+public:
+    BayerImage() = default;
+    BayerImage(BayerImage&&) noexcept = default;
+    BayerImage& operator=(BayerImage&&) noexcept = default;
+
+    // Reads a raw file (fixed-header or chunked container, ...) and normalises
+    // each sample s to (s & (2^bits - 1)) / (2^bits - 1).
+    void read(const std::string& path);
+
+    // A new sensor image for headerless raw data; the capture data go into a
+    // KQRAW fixed header (fixedHeader) or a KQRAW2 container.
+    void createFromHeaderless(std::int32_t width, std::int32_t height, std::uint16_t bits,
+                              std::uint32_t cfa, float exposureTime, float gain,
+                              const std::string& serialNumber, const std::string& sensorGuid,
+                              bool fixedHeader);
+
+    // A new image with the template's bitsPerSample, numberOfImages and data
+    // type and the given geometry; metadata copied from the template.
+    void createLike(const BayerImage& templateImage, std::int32_t width, std::int32_t height,
+                    std::uint16_t samplesPerPixel, std::uint32_t cfa0, std::uint32_t cfa1,
+                    std::uint32_t pixelType, std::uint32_t bufferType);
+
+    void copy(const BayerImage& source);           // pixels and metadata
+    void copyMetadata(const BayerImage& source);   // metadata and raw header only
+
+    void storeKqraw(const std::string& path) const;
+    void storeJpeg(const std::string& path, int quality) const;
+    void storeBmp(const std::string& path) const;
+
+    float exposureTime() const;
+    float channelGain(int channel) const;
+    // The module serial number; maxLength 0 means all of it.
+    std::string serialNumber(std::size_t maxLength) const;
+    void setSensorGuid(const std::string& guidHex);
+    bool samePixels(const BayerImage& other) const;
+
+    // Takes ownership of a buffer (the previous one is released).
+    void reset(ImageBuffer* buffer = nullptr) { buffer_.reset(buffer); }
+    bool empty() const { return !buffer_; }
+    ImageBuffer* buffer() { return buffer_.get(); }
+    const ImageBuffer* buffer() const { return buffer_.get(); }
+
+    std::int32_t width() const { return buffer_->width; }
+    std::int32_t height() const { return buffer_->height; }
+    std::uint16_t bitsPerSample() const { return buffer_->bitsPerSample; }
+    std::uint16_t channels() const { return buffer_->samplesPerPixel; }
+    std::uint32_t cfa() const { return buffer_->cfa[1]; }
+    float* pixels() { return static_cast<float*>(buffer_->data); }
+    const float* pixels() const { return static_cast<const float*>(buffer_->data); }
+
+private:
+    ImagePtr buffer_;
+};

@@ -1,0 +1,7 @@
+#include "image/kqraw_container.h"
+
+struct KqRawContainer {};
+
+void kqrawContainerRelease(KqRawContainer* container) noexcept {
+    delete container;
+}

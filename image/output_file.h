@@ -1,0 +1,39 @@
+#pragma once
+// Writes an output file so that nobody ever sees it half-written. A regular
+// file (or one that does not exist yet) is written beside its target under a
+// temporary name and renamed into place by commit(); a device, a FIFO or any
+// other special file (/dev/stdout, /dev/full, a named pipe) is written
+// directly, never renamed over. Without commit() the temporary is removed.
+//
+// Procedural like the rest of the image library: no exceptions, results as bool.
+
+#include <cstdio>
+#include <string>
+
+class OutputFile {
+public:
+    OutputFile() = default;
+    ~OutputFile();
+    OutputFile(const OutputFile&) = delete;
+    OutputFile& operator=(const OutputFile&) = delete;
+
+    // Opens the file for writing. False when it cannot be created.
+    bool open(const std::string& path);
+    std::FILE* stream() const { return stream_; }
+
+    // Flushes, closes and moves the file into place. False when any write,
+    // the flush, the close or the rename failed; the target is then left as
+    // it was (for a direct write, as far as it got).
+    bool commit();
+
+    // Drops what was written (removes the temporary).
+    void abort();
+
+private:
+    std::FILE* stream_ = nullptr;
+    std::string target_;
+    std::string temporary_;  // empty for a direct write
+};
+
+// Writes a whole byte block to `path` through OutputFile. False on any failure.
+bool writeWholeFile(const std::string& path, const void* data, std::size_t size);

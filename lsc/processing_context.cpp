@@ -1,0 +1,1 @@
+#include "lsc/processing_context.h"

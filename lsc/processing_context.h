@@ -1,0 +1,64 @@
+#pragma once
+// Everything the fit, the correction and the evaluation share for one run:
+// the working image, the settings copied out of the configuration, the
+// samples and the fitted control grids. Owned by the run driver.
+
+#include "image/bayer_image.h"
+
+#include <cstdint>
+#include <vector>
+
+inline constexpr int kChannels = 4;       // red, green/red, green/blue, blue
+inline constexpr int kGridPoints = 100;   // 10 x 10 control points per channel
+
+// Display names of the four channels, in channel order.
+inline constexpr const char* kChannelNames[kChannels] = {"red", "green/red", "green/blue", "blue"};
+
+// One sample point of the flat field: even pixel coordinates of a 2x2 Bayer
+// block and one value per channel (measured levels, later the gains).
+struct shadingSample {
+    std::uint32_t x;
+    std::uint32_t y;
+    float value[kChannels];
+};
+
+struct ProcessingContext {
+    // Images
+    BayerImage image;      // working (prepared) Bayer image, samples in 0..1
+    BayerImage corrected;  // the flattened image the correction leaves here
+
+    // Fit settings (defaults are those in force before the configuration is copied in)
+    bool greenBalance = false;
+    float blackLevel = 0.0f;       // fraction of full scale
+    int sampleAngleStep = 1;       // lsc.sampling_factor, degrees
+    int sampleMargin = 0;          // lsc.sampling_margin, per mille of the width
+    float falloff = 0.0f;          // lsc.falloff_factor / 100
+    double leftFraction = 0.25, centerFraction = 0.5;
+    double topFraction = 0.25, middleFraction = 0.5;
+    bool averageChannels = false;  // lsc.avg_luma
+    bool quiet = false;
+    int awbFilterSize = 100;       // lsc.awb_avg_filter_size
+    float maxGain = 6.0f;
+    float maxRmsError = 0.2f;
+    float maxError = 0.2f;
+
+    // Preparation and evaluation settings
+    int procSamplingFactor = 1;    // shared.proc_sampling_factor
+    unsigned applyStep = 1;        // apply_lsc.sampling_factor
+    float maxDeltaAb = 10.0f;
+    float lumaNormalizeFactor = 0.75f;
+    int deltaAbBlocks[2] = {0, 0}; // horizontal, vertical
+    float ccm[3][3] = {{1, 0, 0}, {0, 1, 0}, {0, 0, 1}};
+
+    // Fit results
+    float targetLevels[kChannels] = {0, 0, 0, 0};
+    std::vector<shadingSample> samples;
+    float controlGrids[kChannels][kGridPoints] = {};
+    float whiteBalance[kChannels] = {0, 0, 0, 0};  // read back from calibration data
+
+    // Evaluation results
+    std::vector<float> deltaImage;  // deltaAbBlocks[0] x deltaAbBlocks[1], row-major
+    float meanChroma = 0.0f;
+    float maxDelta = 0.0f;
+    float deltaStdDev = 0.0f;
+};

@@ -1,0 +1,7 @@
+#!/usr/bin/env bash
+# One command from a fresh clone to a green test run: dependencies, build, tests.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+scripts/install-deps.sh
+scripts/build.sh
+ctest --test-dir "${BUILD_DIR:-build}" --output-on-failure -j "$(nproc)"
