@@ -1,0 +1,34 @@
+#pragma once
+// Where the patch borders of the 3 x 3 patch grid lie, and the patch sizes and
+// fixed-point patch steps that the register file exports.
+
+#include <cstdint>
+
+// Breakpoints (0, L, L + Cw, W) and (0, T, T + M, H) used by the fit and the
+// correction: the left width and top height truncate, the centre width and
+// middle height round.
+struct PatchBreakpoints {
+    std::uint32_t x[4];
+    std::uint32_t y[4];
+};
+PatchBreakpoints patchBreakpoints(std::uint32_t width, std::uint32_t height, double leftFraction,
+                                  double centerFraction, double topFraction,
+                                  double middleFraction);
+
+// Patch sizes as the register file exports them: the outer patches round, the
+// central ones truncate, the far ones take the rest (signed: a bad geometry
+// can leave them zero or negative).
+struct ExportedPatchSizes {
+    std::int64_t left, center, right;
+    std::int64_t top, middle, bottom;
+};
+ExportedPatchSizes exportedPatchSizes(std::uint32_t width, std::uint32_t height,
+                                      double leftFraction, double centerFraction,
+                                      double topFraction, double middleFraction);
+
+// 4 x (2 / size) as unsigned fixed point: 3 integer bits and 32 fraction bits.
+struct PatchStep {
+    std::uint32_t msb;
+    std::uint32_t lsb;
+};
+PatchStep patchStep(std::int64_t size);
