@@ -1,0 +1,48 @@
+// How the run driver reports whatever ends a run.
+
+#include "driver/output_stream.h"
+#include "driver/run.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+
+namespace {
+
+class TopLevelReport : public ::testing::Test {
+protected:
+    void SetUp() override {
+        file_ = std::tmpfile();
+        messageStream.setTarget(file_);
+    }
+    void TearDown() override { messageStream.reset(); }
+
+    std::string written() {
+        std::fflush(file_);
+        std::rewind(file_);
+        std::string text;
+        int c;
+        while ((c = std::fgetc(file_)) != EOF)
+            text += static_cast<char>(c);
+        return text;
+    }
+
+    int run(std::vector<const char*> args) {
+        args.insert(args.begin(), "lsc");
+        return runProgram(static_cast<int>(args.size()), args.data());
+    }
+
+    std::FILE* file_ = nullptr;
+};
+
+TEST_F(TopLevelReport, NoticeIsPrintedWithStatusZero) {
+    EXPECT_EQ(run({"--version"}), 0);
+    EXPECT_EQ(written(), "lsc version 3.8.1\n");
+}
+
+TEST_F(TopLevelReport, ParserErrorIsPrefixedWithError) {
+    EXPECT_EQ(run({"--nope"}), 1);
+    EXPECT_EQ(written(), "ERROR: unrecognised option '--nope'\n");
+}
+
+} // namespace
