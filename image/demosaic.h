@@ -1,0 +1,11 @@
+#pragma once
+// Turns a normalised Bayer sensor image into 8-bit RGB for people to look at.
+
+#include "image/image_buffer.h"
+
+// Bilinear demosaic of a RAW, RAW_CFA, REAL32 image with one sample a pixel
+// (1.0 is full scale) into a new RGB, INTERLEAVED, UINT8 image of the same
+// size. Result in *result: 0; -6 (img::kUnsupported) for any other kind of
+// source (or a null one); -4 (img::kWrongFormat) for a pattern that is not
+// RGGB, GRBG, GBRG or BGGR; -3 (img::kNoMemory). The caller releases the image.
+ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept;
