@@ -32,3 +32,14 @@ struct PatchStep {
     std::uint32_t lsb;
 };
 PatchStep patchStep(std::int64_t size);
+
+// True when every patch of the grid holds at least one pixel in each
+// direction (0 < L < L + Cw < W, 0 < T < T + M < H). Anything else would
+// give a patch of zero or negative size and infinite local coordinates.
+bool patchGeometryUsable(const PatchBreakpoints& breaks);
+
+// The breakpoints of a width x height image, or std::runtime_error when the
+// fractions leave a patch without pixels (see patchGeometryUsable).
+PatchBreakpoints usablePatchBreakpoints(std::uint32_t width, std::uint32_t height,
+                                        double leftFraction, double centerFraction,
+                                        double topFraction, double middleFraction);
