@@ -1,0 +1,35 @@
+#include "prep/prep_image.h"
+
+#include "prep/prep_messages.h"
+
+#include <stdexcept>
+
+namespace prep {
+
+BayerImage createFloatImage(std::int32_t width, std::int32_t height, std::uint16_t bitsPerSample,
+                            std::uint16_t channels, std::uint32_t cfa0, std::uint32_t cfa1,
+                            std::uint32_t pixelType, std::uint32_t bufferType) {
+    int result = 0;
+    BayerImage image;
+    image.reset(imageCreate(width, height, bitsPerSample, channels, 1, cfa0, cfa1, pixelType,
+                            bufferType, kDataReal32, &result));
+    if (image.empty())
+        throw std::runtime_error(msg::kImageAllocation);
+    return image;
+}
+
+void requireFloatImage(const BayerImage& image) {
+    const ImageBuffer* buffer = image.buffer();
+    if (!buffer || !buffer->data || buffer->dataType != kDataReal32 || buffer->width < 1 ||
+        buffer->height < 1 || buffer->samplesPerPixel < 1 || buffer->numberOfImages != 1 ||
+        buffer->pixelType == kPixelYuv422 || buffer->pixelType == kPixelYuv420)
+        throw std::invalid_argument(msg::kNotFloatImage);
+}
+
+std::size_t sampleCount(const BayerImage& image) {
+    // The block was allocated for this many samples, so the product fits size_t.
+    return static_cast<std::size_t>(image.width()) * static_cast<std::size_t>(image.height()) *
+           image.channels();
+}
+
+} // namespace prep
