@@ -1,0 +1,135 @@
+#include "prep/image_checks.h"
+
+#include "prep/prep_image.h"
+#include "prep/prep_messages.h"
+
+#include <cmath>
+#include <iomanip>
+#include <limits>
+#include <locale>
+#include <sstream>
+#include <stdexcept>
+
+namespace prep {
+namespace {
+
+double roundHalfUp(double x) {
+    return std::floor(x + 0.5);
+}
+
+// Messages format their numbers the same way in any locale.
+std::ostringstream messageText() {
+    std::ostringstream text;
+    text.imbue(std::locale::classic());
+    return text;
+}
+
+} // namespace
+
+std::uint32_t fullScale(int depth) {
+    const std::uint32_t power = depth >= 32 || depth < 0 ? 0u : std::uint32_t{1} << depth;
+    return power - 1u;
+}
+
+void writeStatistics(const BayerImage& image, int depth, std::ostream& out) {
+    requireFloatImage(image);
+    const float* samples = image.pixels();
+    const std::size_t count = sampleCount(image);
+    float minimum = samples[0];
+    float maximum = samples[0];
+    double sum = 0.0;
+    for (std::size_t i = 0; i < count; ++i) {
+        const float v = samples[i];
+        if (v < minimum)
+            minimum = v;
+        if (v > maximum)
+            maximum = v;
+        sum += v;
+    }
+    const double scale = fullScale(depth);
+    out << std::fixed << std::setprecision(0);
+    out << msg::kMinimumPixel << roundHalfUp(minimum * scale) << std::endl;
+    out << msg::kMaximumPixel << roundHalfUp(maximum * scale) << std::endl;
+    out << std::setprecision(2) << msg::kAveragePixel << sum * scale / static_cast<double>(count);
+}
+
+OutOfRangePosition scanRange(const BayerImage& image, float low, float high) {
+    requireFloatImage(image);
+    OutOfRangePosition found;
+    const float* sample = image.pixels();
+    const std::int32_t width = image.width();
+    const std::int32_t height = image.height();
+    const std::uint16_t channels = image.channels();
+    for (std::int32_t row = 0; row < height; ++row) {
+        for (std::int32_t column = 0; column < width; ++column) {
+            for (std::uint16_t channel = 0; channel < channels; ++channel, ++sample) {
+                if (!(*sample >= low && *sample <= high))
+                    found = {row, column, channel};
+            }
+        }
+    }
+    return found;
+}
+
+float peakSample(const BayerImage& image) {
+    requireFloatImage(image);
+    const float* samples = image.pixels();
+    const std::size_t count = sampleCount(image);
+    // Starting below every number keeps a leading NaN from hiding the peak.
+    float peak = -std::numeric_limits<float>::infinity();
+    for (std::size_t i = 0; i < count; ++i)
+        if (samples[i] > peak)
+            peak = samples[i];
+    return peak;
+}
+
+std::uint32_t sampleUnits(float sample, std::uint32_t fullScale) {
+    const double units = static_cast<double>(sample) * fullScale + 0.5;
+    if (!(units > 0.0))
+        return 0;
+    if (units >= fullScale)
+        return fullScale;
+    return static_cast<std::uint32_t>(units);
+}
+
+void checkPixelRange(const BayerImage& image, const PixelLimits& limits,
+                     std::uint32_t fullScale, std::ostream& out) {
+    const float scale = static_cast<float>(fullScale);
+    const OutOfRangePosition position =
+        scanRange(image, limits.minPixel / scale, limits.maxPixel / scale);
+    if (position.row >= 0) {
+        const std::size_t index =
+            (static_cast<std::size_t>(position.row) * static_cast<std::size_t>(image.width()) +
+             static_cast<std::size_t>(position.column)) *
+                image.channels() +
+            position.channel;
+        std::ostringstream text = messageText();
+        text << msg::kPixelsNotWithin << limits.minPixel << " to " << limits.maxPixel << ".\n"
+             << msg::kPossibleCauses << '\n'
+             << msg::kOutOfRangeValue << position.row << ',' << position.column << ") = "
+             << sampleUnits(image.pixels()[index], fullScale) << ".\n";
+        throw std::runtime_error(text.str());
+    }
+    out << msg::kPixelsWithin << std::endl;
+}
+
+void checkPeakLevel(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+                    std::ostream& out) {
+    const float peak = peakSample(image);
+    if (limits.peakMinimum / static_cast<float>(fullScale) > peak) {
+        std::ostringstream text = messageText();
+        text << msg::kPeakBelowMinimum << limits.peakMinimum << ".\n"
+             << msg::kPossibleCauses << '\n'
+             << msg::kPeakValue << sampleUnits(peak, fullScale) << ".\n";
+        throw std::runtime_error(text.str());
+    }
+    out << msg::kPixelsWithin << std::endl;
+}
+
+void checkPixels(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+                 std::ostream& out) {
+    checkPixelRange(image, limits, fullScale, out);
+    checkPeakLevel(image, limits, fullScale, out);
+}
+
+} // namespace prep

@@ -1,0 +1,63 @@
+#pragma once
+// Acceptance checks of a flat-field image: the statistics lines, the range
+// scan against the configured pixel window and the peak level check. Images
+// are float images of any channel count with samples in 0..1 of full scale;
+// for more than one channel the samples of a pixel lie together (plane image
+// layout, prep/bayer_planes.h).
+
+#include "image/bayer_image.h"
+
+#include <cstdint>
+#include <ostream>
+
+namespace prep {
+
+// Full scale of a bit depth: 2^depth - 1, computed in 32-bit unsigned
+// arithmetic (0 - 1 = 4294967295 for depths of 32 and more).
+std::uint32_t fullScale(int depth);
+
+// Writes "Minimum pixel value = ", "Maximum pixel value = " (both rounded to
+// whole units of full scale) and "Average pixel value = " (two decimals) into
+// `out`, the first two ended with std::endl, the last left open for the caller
+// to end. The stream stays in fixed notation with precision 2.
+void writeStatistics(const BayerImage& image, int depth, std::ostream& out);
+
+// Position of an out-of-range sample; row -1 when there is none.
+struct OutOfRangePosition {
+    std::int32_t row = -1;
+    std::int32_t column = -1;
+    std::uint16_t channel = 0xFFFF;
+};
+
+// Visits rows, then columns, then channels and returns the last sample below
+// `low` or above `high` (a sample equal to a limit is inside). A sample that
+// is not a number is outside.
+OutOfRangePosition scanRange(const BayerImage& image, float low, float high);
+
+// Largest sample of the whole image.
+float peakSample(const BayerImage& image);
+
+// A sample as a whole number of full-scale units, sample * M + 0.5 truncated,
+// kept within 0..M.
+std::uint32_t sampleUnits(float sample, std::uint32_t fullScale);
+
+// The configured limits, in whole units of full scale.
+struct PixelLimits {
+    float minPixel = 0.0f;   // proc.min_pixel_val
+    float maxPixel = 0.0f;   // proc.max_pixel_val
+    float peakMinimum = 0.0f;  // proc.peak_pixel_min
+};
+
+// The range check then the peak check. After each passed check
+// "Image pixels within specified parameters." is written to `out` as a line
+// of its own; a failed check throws std::runtime_error with the three-line
+// explanation (every line ended by '\n').
+void checkPixelRange(const BayerImage& image, const PixelLimits& limits,
+                     std::uint32_t fullScale, std::ostream& out);
+void checkPeakLevel(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+                    std::ostream& out);
+// Both, in that order.
+void checkPixels(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+                 std::ostream& out);
+
+} // namespace prep
