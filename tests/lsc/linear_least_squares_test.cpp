@@ -1,0 +1,163 @@
+#include "lsc/linear_least_squares.h"
+
+#include "lsc/apan_exception.h"
+#include "lsc/dense_matrix.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <random>
+#include <stdexcept>
+#include <vector>
+
+namespace {
+
+// Least squares through the normal equations AᵀA x = Aᵀb, in long double with
+// partial pivoting: an independent reference for well-conditioned problems.
+std::vector<long double> normalEquations(const denseMatrix& a, const denseMatrix& b) {
+    const std::size_t m = a.rows(), n = a.columns();
+    std::vector<long double> g(n * (n + 1), 0.0L);
+    for (std::size_t i = 0; i < n; ++i) {
+        for (std::size_t j = 0; j < n; ++j)
+            for (std::size_t r = 0; r < m; ++r)
+                g[i * (n + 1) + j] += static_cast<long double>(a(r, i)) * a(r, j);
+        for (std::size_t r = 0; r < m; ++r)
+            g[i * (n + 1) + n] += static_cast<long double>(a(r, i)) * b[r];
+    }
+    for (std::size_t k = 0; k < n; ++k) {
+        std::size_t best = k;
+        for (std::size_t i = k + 1; i < n; ++i)
+            if (std::fabs(g[i * (n + 1) + k]) > std::fabs(g[best * (n + 1) + k]))
+                best = i;
+        for (std::size_t j = 0; j <= n; ++j)
+            std::swap(g[k * (n + 1) + j], g[best * (n + 1) + j]);
+        for (std::size_t i = k + 1; i < n; ++i) {
+            const long double f = g[i * (n + 1) + k] / g[k * (n + 1) + k];
+            for (std::size_t j = k; j <= n; ++j)
+                g[i * (n + 1) + j] -= f * g[k * (n + 1) + j];
+        }
+    }
+    std::vector<long double> x(n);
+    for (std::size_t i = n; i-- > 0;) {
+        long double s = g[i * (n + 1) + n];
+        for (std::size_t j = i + 1; j < n; ++j)
+            s -= g[i * (n + 1) + j] * x[j];
+        x[i] = s / g[i * (n + 1) + i];
+    }
+    return x;
+}
+
+TEST(LinearLeastSquares, SelfTestTakesTheSquarePath) {
+    denseMatrix a(3, 3), x(3, 1), b(3, 1);
+    apan::linearLeastSquares<double> system(&a, &x, &b);
+    apan::linearSystem<double>& base = system;
+    EXPECT_NO_THROW(base.selfTest());
+    EXPECT_NEAR(x[0], 2.0, 1e-12);
+    EXPECT_NEAR(x[1], 1.0, 1e-12);
+    EXPECT_NEAR(x[2], -1.0, 1e-12);
+}
+
+TEST(LinearLeastSquares, SquareProblemMatchesTheSquareSolveExactly) {
+    const double values[] = {4, -2, 1, 3, 6, -4, 2, 1, 8};
+    denseMatrix a1(3, 3), a2(3, 3), b1(3, 1), b2(3, 1), x1(3, 1), x2(3, 1);
+    for (int i = 0; i < 9; ++i)
+        a1[i] = a2[i] = values[i];
+    for (int i = 0; i < 3; ++i)
+        b1[i] = b2[i] = i + 1;
+    apan::linearSystem<double>(&a1, &x1, &b1).solve(1e-7);
+    apan::linearLeastSquares<double>(&a2, &x2, &b2).solve(1e-7);
+    for (int i = 0; i < 3; ++i)
+        EXPECT_EQ(x1[i], x2[i]);
+}
+
+TEST(LinearLeastSquares, FitsALineThroughNoisyPoints) {
+    // y = 1 + 2t sampled at t = 0..4 with residuals that cancel.
+    const double ys[] = {1.1, 2.8, 5.0, 7.2, 8.9};
+    denseMatrix a(5, 2), x(2, 1), b(5, 1);
+    for (int t = 0; t < 5; ++t) {
+        a(t, 0) = 1.0;
+        a(t, 1) = t;
+        b[t] = ys[t];
+    }
+    apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
+    EXPECT_NEAR(x[0], 1.0, 1e-12);
+    EXPECT_NEAR(x[1], 2.0, 1e-12);
+}
+
+TEST(LinearLeastSquares, AgreesWithTheNormalEquationsOnRandomSystems) {
+    std::mt19937 random(12345);
+    std::uniform_real_distribution<double> value(-1.0, 1.0);
+    const std::uint32_t shapes[][2] = {{12, 3}, {40, 9}, {200, 25}, {600, 100}};
+    for (const auto& shape : shapes) {
+        const std::uint32_t m = shape[0], n = shape[1];
+        denseMatrix a(m, n), b(m, 1), x(n, 1);
+        for (std::size_t i = 0; i < a.size(); ++i)
+            a[i] = value(random);
+        for (std::uint32_t r = 0; r < m; ++r)
+            b[r] = value(random);
+        const std::vector<long double> expected = normalEquations(a, b);
+
+        apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
+        long double largest = 0;
+        for (long double v : expected)
+            largest = std::max(largest, std::fabs(v));
+        for (std::uint32_t i = 0; i < n; ++i)
+            EXPECT_NEAR(static_cast<double>(x[i]), static_cast<double>(expected[i]),
+                        1e-9 * static_cast<double>(largest))
+                << m << " x " << n << ", unknown " << i;
+    }
+}
+
+TEST(LinearLeastSquares, IdenticalColumnsThrow230) {
+    denseMatrix a(6, 3), x(3, 1), b(6, 1);
+    for (std::uint32_t r = 0; r < 6; ++r) {
+        a(r, 0) = r + 1.0;
+        a(r, 1) = (r * r) % 5;
+        a(r, 2) = r + 1.0;
+        b[r] = r;
+    }
+    apan::linearLeastSquares<double> system(&a, &x, &b);
+    try {
+        system.solve(1e-10);
+        FAIL() << "no exception";
+    } catch (const apan::exception& e) {
+        EXPECT_EQ(e.code(), 230);
+        EXPECT_STREQ(e.what(), "Warning: trying to solve a rank deficient system");
+        EXPECT_EQ(e.hint(), "Rank deficient matrices often occur whenyou have an ill-conditioned "
+                            "system of linear equations.");
+    }
+}
+
+TEST(LinearLeastSquares, AZeroColumnIsRankDeficientNotNaN) {
+    denseMatrix a(5, 2), x(2, 1), b(5, 1);
+    for (std::uint32_t r = 0; r < 5; ++r) {
+        a(r, 0) = r + 1.0;
+        b[r] = 1.0;
+    }
+    try {
+        apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
+        FAIL() << "no exception";
+    } catch (const apan::exception& e) {
+        EXPECT_EQ(e.code(), 230);
+    }
+}
+
+TEST(LinearLeastSquares, UnderdeterminedProblemsAreRankDeficient) {
+    denseMatrix a(2, 4), x(4, 1), b(2, 1);
+    for (std::size_t i = 0; i < a.size(); ++i)
+        a[i] = static_cast<double>(i * i + 1);
+    b[0] = b[1] = 1.0;
+    try {
+        apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
+        FAIL() << "no exception";
+    } catch (const apan::exception& e) {
+        EXPECT_EQ(e.code(), 230);
+    }
+}
+
+TEST(LinearLeastSquares, RefusesARightHandSideOfTheWrongLength) {
+    denseMatrix a(5, 2), x(2, 1), b(4, 1);
+    EXPECT_THROW(apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10), std::invalid_argument);
+}
+
+} // namespace
