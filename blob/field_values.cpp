@@ -1,0 +1,96 @@
+#include "blob/field_values.h"
+
+#include "blob/blob_layout.h"
+#include "blob/blob_messages.h"
+#include "config/value_text.h"
+
+#include <stdexcept>
+
+namespace blob {
+
+namespace {
+
+[[noreturn]] void refuse(const config_node& config, const config_node& node, const std::string& why) {
+    throw std::runtime_error(msg::kValueFor + config_relative_path(config, node) + why);
+}
+
+int hexDigit(char c) {
+    if (c >= '0' && c <= '9')
+        return c - '0';
+    if (c >= 'a' && c <= 'f')
+        return c - 'a' + 10;
+    if (c >= 'A' && c <= 'F')
+        return c - 'A' + 10;
+    return -1;
+}
+
+// Whole-text decimal with optional sign; false when malformed. Magnitudes
+// beyond 64 bits saturate, which the range check then refuses.
+bool parseWhole(const std::string& text, std::int64_t& value) {
+    std::size_t pos = 0;
+    bool negative = false;
+    if (pos < text.size() && (text[pos] == '-' || text[pos] == '+'))
+        negative = text[pos++] == '-';
+    if (pos == text.size())
+        return false;
+    constexpr std::uint64_t kSaturated = std::uint64_t{1} << 62;
+    std::uint64_t magnitude = 0;
+    for (; pos < text.size(); ++pos) {
+        if (text[pos] < '0' || text[pos] > '9')
+            return false;
+        if (magnitude < kSaturated)
+            magnitude = magnitude * 10 + static_cast<std::uint64_t>(text[pos] - '0');
+    }
+    if (magnitude > kSaturated)
+        magnitude = kSaturated;
+    value = negative ? -static_cast<std::int64_t>(magnitude) : static_cast<std::int64_t>(magnitude);
+    return true;
+}
+
+} // namespace
+
+std::int64_t fieldValue(const config_node& config, const config_node& node, std::int64_t low,
+                        std::int64_t high) {
+    std::int64_t value = 0;
+    if (!parseWhole(node.as_string(), value))
+        refuse(config, node, msg::kNotWholeNumber);
+    if (value < low || value > high)
+        refuse(config, node,
+               msg::kDoesNotFitStart + integerText(low) + " and " + integerText(high) + ".");
+    return value;
+}
+
+std::string unquoted(const std::string& text) {
+    if (text.size() >= 2 && text.front() == '"' && text.back() == '"')
+        return text.substr(1, text.size() - 2);
+    return text;
+}
+
+std::vector<std::uint8_t> serialBytes(const config_node& config, const config_node& node) {
+    const std::string text = unquoted(node.as_string());
+    if (text.size() % 2 != 0)
+        refuse(config, node, msg::kInvalidSerial);
+    if (text.size() / 2 > kMaxSerialBytes)
+        refuse(config, node, msg::kSerialTooLong);
+    std::vector<std::uint8_t> bytes;
+    bytes.reserve(text.size() / 2);
+    for (std::size_t i = 0; i < text.size(); i += 2) {
+        const int high = hexDigit(text[i]);
+        const int low = hexDigit(text[i + 1]);
+        if (high < 0 || low < 0)
+            refuse(config, node, msg::kInvalidSerial);
+        bytes.push_back(static_cast<std::uint8_t>(high * 16 + low));
+    }
+    return bytes;
+}
+
+char postureCharacter(const config_node& config, const config_node& node) {
+    const std::string& text = node.as_string();
+    if (text.size() == 3 && text.front() == '\'' && text.back() == '\'')
+        return text[1];
+    if (text.empty())
+        refuse(config, node, msg::kEmptyPosture);
+    return text[0];
+}
+
+} // namespace blob
