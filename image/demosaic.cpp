@@ -38,11 +38,10 @@ std::size_t mirror(std::ptrdiff_t index, std::size_t size) {
 
 // 1.0 is 255. Below zero and NaN give 0: a corrected value slightly under the
 // black level must not wrap round to a bright pixel.
-std::uint8_t toByte(float value) {
-    if (!(value > 0.0f))
-        return 0;
-    const float scaled = value * 255.0f + 0.5f;
-    return scaled >= 255.0f ? 255 : static_cast<std::uint8_t>(scaled);
+[[gnu::always_inline]] inline std::uint8_t toByte(float value) {
+    const float positive = value > 0.0f ? value : 0.0f;  // written so that NaN gives 0
+    const float scaled = positive * 255.0f + 0.5f;
+    return static_cast<std::uint8_t>(scaled < 255.0f ? scaled : 255.0f);
 }
 
 struct RowNeighbours {
@@ -51,9 +50,12 @@ struct RowNeighbours {
     const float* down;
 };
 
+// Inlined, with the row pointers passed by value, so that the byte stores
+// cannot make the compiler reload them for every pixel.
 template <int S>
-void interpolate(const RowNeighbours& rows, std::size_t left, std::size_t x, std::size_t right,
-                 std::uint8_t* rgb) {
+[[gnu::always_inline]] inline void interpolate(RowNeighbours rows, std::size_t left,
+                                               std::size_t x, std::size_t right,
+                                               std::uint8_t* rgb) {
     const float centre = rows.mid[x];
     if constexpr (S == kRed || S == kBlue) {
         const float cross = (rows.up[x] + rows.down[x] + rows.mid[left] + rows.mid[right]) * 0.25f;
@@ -74,7 +76,7 @@ void interpolate(const RowNeighbours& rows, std::size_t left, std::size_t x, std
 // One output row; Even and Odd are the sites of the even and odd columns.
 // The edge pixels take mirrored neighbours, the run between them plain ones.
 template <int Even, int Odd>
-void demosaicRow(const RowNeighbours& rows, std::size_t width, std::uint8_t* out) {
+void demosaicRow(RowNeighbours rows, std::size_t width, std::uint8_t* out) {
     interpolate<Even>(rows, mirror(-1, width), 0, mirror(1, width), out);
     if (width == 1)
         return;
