@@ -9,6 +9,7 @@ inline constexpr char kInvalidWeaveFormat[] = "Invalid image format for Bayer in
 inline constexpr char kInvalidWeavePattern[] = "Invalid pattern size for Bayer interweaving.";
 inline constexpr char kImageAllocation[] = "Unable to allocate image memory.";
 inline constexpr char kNotFloatImage[] = "Image preparation needs a floating-point image.";
+inline constexpr char kNotBayerImage[] = "The flattened image must be a single-channel Bayer image.";
 inline constexpr char kBadSamplingFactor[] = "The down-sampling factor must be at least 1.";
 inline constexpr char kBadMedianSize[] = "The median filter size must be between 1 and 10.";
 
@@ -54,6 +55,7 @@ inline constexpr char kImageTooSmallForLevels[] =
 inline constexpr char kNoDeltaBlocks[] = "The delta ab block counts must be at least 1.";
 inline constexpr char kDeltaBlocksTooSmall[] =
     "The flattened image is too small for the delta ab block grid.";
+inline constexpr char kDeltaGridMismatch[] = "The delta ab results do not match the block grid.";
 inline constexpr char kNoGreenSignal[] =
     "The flattened image has no green signal; its delta ab cannot be measured.";
 inline constexpr char kCannotOpenFile[] = "Cannot open file : ";

@@ -1,0 +1,72 @@
+#include "prep/delta_ab_report.h"
+
+#include "image/output_file.h"
+#include "prep/prep_messages.h"
+
+#include <cstdio>
+#include <iomanip>
+#include <locale>
+#include <sstream>
+#include <stdexcept>
+
+namespace prep {
+namespace {
+
+// Report files read the same in every locale.
+std::ostringstream reportText() {
+    std::ostringstream text;
+    text.imbue(std::locale::classic());
+    return text;
+}
+
+void writeReport(const std::string& path, const std::string& text) {
+    OutputFile file;
+    if (!file.open(path))
+        throw std::string(msg::kCannotOpenFile) + path;
+    if (std::fwrite(text.data(), 1, text.size(), file.stream()) != text.size() || !file.commit())
+        throw std::string(msg::kCannotWriteFile) + path;
+}
+
+} // namespace
+
+std::string formatDeltaFile(const ProcessingContext& context) {
+    const std::size_t columns = static_cast<std::size_t>(
+        context.deltaAbBlocks[0] > 0 ? context.deltaAbBlocks[0] : 0);
+    const std::size_t rows = static_cast<std::size_t>(
+        context.deltaAbBlocks[1] > 0 ? context.deltaAbBlocks[1] : 0);
+    if (context.deltaImage.size() != columns * rows)
+        throw std::invalid_argument(msg::kDeltaGridMismatch);
+    std::ostringstream text = reportText();
+    text << std::fixed << std::setprecision(5);
+    for (std::size_t row = 0; row < rows; ++row) {
+        for (std::size_t column = 0; column < columns; ++column)
+            text << context.deltaImage[row * columns + column] << ',';
+        text << '\n';
+    }
+    text << '\n';
+    return text.str();
+}
+
+std::string formatStatsFile(const ProcessingContext& context) {
+    std::ostringstream text = reportText();
+    text << context.meanChroma << ", " << context.maxDelta << ", " << context.deltaStdDev << '\n';
+    return text.str();
+}
+
+void writeDeltaFile(const std::string& path, const ProcessingContext& context) {
+    writeReport(path, formatDeltaFile(context));
+}
+
+void writeStatsFile(const std::string& path, const ProcessingContext& context) {
+    writeReport(path, formatStatsFile(context));
+}
+
+void checkDeltaThreshold(float maxDelta, float threshold) {
+    if (maxDelta <= threshold)
+        return;
+    std::ostringstream text = reportText();
+    text << msg::kDeltaAboveThreshold << threshold << '\n' << msg::kPossibleCauses;
+    throw std::range_error(text.str());
+}
+
+} // namespace prep

@@ -1,0 +1,31 @@
+#pragma once
+// White balance of the flattened (corrected) Bayer image and the measurement
+// of its channel levels afterwards.
+
+#include "lsc/processing_context.h"
+
+#include <cstdint>
+
+namespace prep {
+
+// Columns x0..x1 and rows y0..y1 (inclusive) of the window of up to 201 x 201
+// pixels around the image centre in which the levels are measured when no
+// target levels are known.
+struct CentreWindow {
+    std::int32_t x0, x1, y0, y1;
+};
+CentreWindow centreWindow(std::int32_t width, std::int32_t height);
+
+// Scales the channels of context.corrected to a common level: the levels are
+// context.targetLevels, or, when targetLevels[0] is 0, the channel means over
+// the centre window; each channel is multiplied by (largest level / its level).
+// Throws std::runtime_error when the window misses a channel or a level is
+// not positive, leaving the image as it was.
+void whiteBalance(ProcessingContext& context);
+
+// The four channel levels of context.corrected: each channel's half-resolution
+// plane smoothed by a box mean (odd side from lsc.awb_avg_filter_size and the
+// preparation sampling factor, shrinking at the borders), its largest value.
+void measureLevels(float (&levels)[kChannels], const ProcessingContext& context);
+
+} // namespace prep

@@ -1,0 +1,165 @@
+#include "prep/white_balance.h"
+
+#include "prep/box_filtered_levels.h"
+#include "test_images.h"
+
+#include <stdexcept>
+
+#include <gtest/gtest.h>
+
+using prep_test::makeImage;
+
+namespace {
+
+// Channel of (x, y) for RGGB.
+int rggbChannel(int x, int y) {
+    return (x & 1) + (y & 1) * 2;
+}
+
+// Every pixel of channel k holds values[k].
+BayerImage channelImage(std::int32_t width, std::int32_t height, const float (&values)[4]) {
+    BayerImage image = makeImage(width, height, 1, kCfaRggb);
+    for (int y = 0; y < height; ++y)
+        for (int x = 0; x < width; ++x)
+            image.pixels()[y * width + x] = values[rggbChannel(x, y)];
+    return image;
+}
+
+TEST(CentreWindow, SmallImageSpansWholeImage) {
+    const prep::CentreWindow window = prep::centreWindow(150, 150);
+    EXPECT_EQ(window.x0, 0);
+    EXPECT_EQ(window.x1, 149);
+    EXPECT_EQ(window.y0, 0);
+    EXPECT_EQ(window.y1, 149);
+}
+
+TEST(CentreWindow, LargeImageGets201PixelsAroundCentre) {
+    const prep::CentreWindow window = prep::centreWindow(640, 480);
+    EXPECT_EQ(window.x0, 220);
+    EXPECT_EQ(window.x1, 420);
+    EXPECT_EQ(window.y0, 140);
+    EXPECT_EQ(window.y1, 340);
+}
+
+TEST(CentreWindow, MixedBounds) {
+    const prep::CentreWindow window = prep::centreWindow(250, 199);
+    EXPECT_EQ(window.x0, 25);
+    EXPECT_EQ(window.x1, 225);
+    EXPECT_EQ(window.y0, 0);
+    EXPECT_EQ(window.y1, 198);
+}
+
+class WhiteBalance : public ::testing::TestWithParam<std::uint32_t> {};
+
+TEST_P(WhiteBalance, TargetLevelsGiveGainsPerChannel) {
+    ProcessingContext context;
+    context.corrected = makeImage(4, 4, 1, GetParam());
+    prep_test::fill(context.corrected, 1.0f);
+    const float levels[4] = {1.0f, 2.0f, 2.0f, 0.5f};
+    std::copy(levels, levels + 4, context.targetLevels);
+    prep::whiteBalance(context);
+    const float gains[4] = {2.0f, 1.0f, 1.0f, 4.0f};
+    // Channel k of (x, y) for the pattern under test.
+    const int phase = GetParam() == kCfaGrbg ? 1 : GetParam() == kCfaGbrg ? 2
+                                                 : GetParam() == kCfaBggr ? 3 : 0;
+    for (int y = 0; y < 4; ++y)
+        for (int x = 0; x < 4; ++x) {
+            const int channel = ((x + phase) & 1) + ((y + (phase >> 1)) & 1) * 2;
+            EXPECT_EQ(context.corrected.pixels()[y * 4 + x], gains[channel]) << x << "," << y;
+        }
+}
+
+INSTANTIATE_TEST_SUITE_P(BayerOrders, WhiteBalance,
+                         ::testing::Values(kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr));
+
+TEST(WhiteBalanceCentre, MeasuredLevelsBalanceTheChannels) {
+    ProcessingContext context;
+    context.corrected = channelImage(150, 150, {0.5f, 0.25f, 0.25f, 0.125f});
+    prep::whiteBalance(context);
+    for (float v : prep_test::samplesOf(context.corrected))
+        ASSERT_EQ(v, 0.5f);
+}
+
+TEST(WhiteBalanceCentre, OnlyTheCentreWindowCounts) {
+    ProcessingContext context;
+    context.corrected = channelImage(640, 480, {0.5f, 0.5f, 0.5f, 0.5f});
+    // Red outside the window (x < 220) is darker; the gains must ignore it.
+    for (int y = 0; y < 480; y += 2)
+        context.corrected.pixels()[y * 640] = 0.1f;
+    prep::whiteBalance(context);
+    EXPECT_EQ(context.corrected.pixels()[2 * 640 + 2], 0.5f);
+    EXPECT_EQ(context.corrected.pixels()[0], 0.1f);
+}
+
+TEST(WhiteBalanceCentre, RefusesWindowWithoutEveryChannel) {
+    ProcessingContext context;
+    context.corrected = makeImage(1, 8, 1, kCfaRggb);
+    prep_test::fill(context.corrected, 0.5f);
+    try {
+        prep::whiteBalance(context);
+        FAIL();
+    } catch (const std::runtime_error& e) {
+        EXPECT_STREQ(e.what(),
+                     "The centre of the flattened image does not hold pixels of all four colour "
+                     "channels.");
+    }
+}
+
+TEST(WhiteBalanceCentre, RefusesZeroLevelAndLeavesImage) {
+    ProcessingContext context;
+    context.corrected = channelImage(8, 8, {0.5f, 0.5f, 0.0f, 0.5f});
+    try {
+        prep::whiteBalance(context);
+        FAIL();
+    } catch (const std::runtime_error& e) {
+        EXPECT_STREQ(e.what(), "A colour channel of the flattened image has no positive level; "
+                               "it cannot be white balanced.");
+    }
+    EXPECT_EQ(context.corrected.pixels()[0], 0.5f);
+}
+
+TEST(BoxSide, OddSideFromFilterSizeAndSamplingFactor) {
+    EXPECT_EQ(prep::boxSide(100, 1), 51);
+    EXPECT_EQ(prep::boxSide(100, 4), 13);
+    EXPECT_EQ(prep::boxSide(100, 2), 25);
+    EXPECT_EQ(prep::boxSide(1, 1), 1);
+}
+
+TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
+    ProcessingContext context;
+    context.corrected = channelImage(20, 16, {0.5f, 0.25f, 0.75f, 0.125f});
+    context.awbFilterSize = 6;
+    float levels[4];
+    prep::measureLevels(levels, context);
+    EXPECT_FLOAT_EQ(levels[0], 0.5f);
+    EXPECT_FLOAT_EQ(levels[1], 0.25f);
+    EXPECT_FLOAT_EQ(levels[2], 0.75f);
+    EXPECT_FLOAT_EQ(levels[3], 0.125f);
+}
+
+TEST(MeasureLevels, BoxMeanShrinksAtBorders) {
+    ProcessingContext context;
+    context.corrected = channelImage(10, 10, {0, 0, 0, 0});  // 5 x 5 planes
+    context.awbFilterSize = 6;                                 // side 3
+    context.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;     // red plane (2, 2)
+    context.corrected.pixels()[0 * 10 + 1] = 9.0f;             // green/red plane (0, 0)
+    float levels[4];
+    prep::measureLevels(levels, context);
+    EXPECT_FLOAT_EQ(levels[0], 1.0f);   // 9 over a full 3 x 3 window
+    EXPECT_FLOAT_EQ(levels[1], 2.25f);  // 9 over the 2 x 2 corner window
+    EXPECT_FLOAT_EQ(levels[2], 0.0f);
+}
+
+TEST(MeasureLevels, RefusesImageBelowTwoByTwo) {
+    ProcessingContext context;
+    context.corrected = makeImage(1, 5);
+    prep_test::fill(context.corrected, 0.5f);
+    EXPECT_THROW(
+        {
+            float levels[4];
+            prep::measureLevels(levels, context);
+        },
+        std::runtime_error);
+}
+
+} // namespace
