@@ -24,6 +24,26 @@ void planeDimensions(const ImageBuffer* image, int plane, std::uint64_t* width,
     *height = h;
 }
 
+// Size of the sample block, false when it is empty or cannot be addressed.
+// Every step is checked: planes x images x sample size can wrap even 64 bits,
+// and on a 32-bit host width * height * 4 alone can pass SIZE_MAX.
+bool sampleBlockBytes(const ImageBuffer* image, std::uint64_t* bytes) {
+    std::uint64_t samples = 0;
+    for (int plane = 0; plane < image->samplesPerPixel; ++plane) {
+        std::uint64_t w, h;
+        planeDimensions(image, plane, &w, &h);
+        if (w * h > UINT64_MAX - samples)  // each factor is below 2^31
+            return false;
+        samples += w * h;
+    }
+    const std::uint64_t sampleSize = imageSampleBytes(image->dataType);
+    if (samples == 0 || image->numberOfImages == 0 ||
+        samples > UINT64_MAX / image->numberOfImages / sampleSize)
+        return false;
+    *bytes = samples * image->numberOfImages * sampleSize;
+    return *bytes <= SIZE_MAX;
+}
+
 char* duplicate(const char* text) {
     const std::size_t length = std::strlen(text) + 1;
     char* copy = static_cast<char*>(std::malloc(length));
@@ -108,10 +128,8 @@ ImageBuffer* imageCreate(std::int32_t width, std::int32_t height, std::uint16_t 
         *result = img::kOk;
         return image.release();
     }
-    const std::uint64_t samples = imageTotalSamples(image.get(), -1);
-    const std::uint64_t bytes = samples * imageSampleBytes(dataType);
-    // Checked in 64 bits: on a 32-bit host width * height * 4 can wrap size_t.
-    if (samples == 0 || bytes / imageSampleBytes(dataType) != samples || bytes > SIZE_MAX) {
+    std::uint64_t bytes = 0;
+    if (!sampleBlockBytes(image.get(), &bytes)) {
         *result = img::kNoMemory;
         return nullptr;
     }
@@ -219,6 +237,8 @@ void imageClearMetadata(ImageBuffer* image) noexcept {
 int imageCopyMetadata(ImageBuffer* target, const ImageBuffer* source) noexcept {
     if (!target || !source)
         return img::kBadArgument;
+    if (target == source)
+        return img::kOk;
     imageClearMetadata(target);
     for (const MetadataEntry* entry = source->metadata; entry; entry = entry->next)
         if (imageSetMetadata(target, entry->key, entry->value) != img::kOk)
