@@ -1,0 +1,46 @@
+#pragma once
+// 16-bit raw samples: little-endian in files, host order in memory, and the
+// bit depth that the raw readers derive from the largest sample.
+
+#include "image/byte_source.h"
+#include "image/image_buffer.h"
+
+#include <cstdint>
+#include <cstdio>
+
+namespace img {
+
+// Reads `count` little-endian samples at the source's position into host order.
+// False when they are not all there (count * 2 is checked before the read).
+bool readSamplesLE(ByteSource& source, std::uint16_t* samples, std::uint64_t count) noexcept;
+// The same for samples stored in either byte order.
+bool readSamples16(ByteSource& source, std::uint16_t* samples, std::uint64_t count,
+                   bool littleEndianFile) noexcept;
+// Writes samples in host order as little-endian. False when a write fails.
+bool writeSamplesLE(std::FILE* file, const std::uint16_t* samples, std::uint64_t count) noexcept;
+
+std::uint16_t largestSample(const std::uint16_t* samples, std::uint64_t count) noexcept;
+// Bit length of the largest sample, and 10 when that is below 10.
+std::uint16_t bitsForLargestSample(std::uint16_t largest) noexcept;
+// Sets bitsPerSample from the largest sample of a UINT16 image, whiteVal and
+// maxClip of all four channels to 2^bits, blackVal and minClip to 0.
+void applyLargestSampleDepth(ImageBuffer* image) noexcept;
+
+} // namespace img
+
+namespace img {
+
+// Makes a RAW, RAW_CFA, UINT16 image of width x height (one sample a pixel,
+// one image) and fills it with the samples at `offset` of the source; the bit
+// depth comes from the largest sample. Result: 0; -5 when a dimension is 0 or
+// beyond 32-bit signed range, or the samples run past the end of the data;
+// -3; -2.
+int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
+                 std::uint32_t height, std::uint32_t cfa, ImageBuffer** image) noexcept;
+
+// True when width x height 16-bit samples fit between `offset` and the end of
+// a source of `size` bytes, computed in 64 bits.
+bool samplesFit(std::uint64_t size, std::uint64_t offset, std::uint32_t width,
+                std::uint32_t height) noexcept;
+
+} // namespace img
