@@ -1,7 +1,55 @@
 #pragma once
-// The chunked raw container (file type KQRAW2) in memory.
+// The chunked raw container (file type KQRAW2) in memory: up to 100 owned
+// blocks in list order, with the positions of the file header block and the
+// pixel block. Procedural and noexcept.
 
-struct KqRawContainer;
+#include "image/byte_source.h"
+#include "image/kqraw_block.h"
 
+#include <cstdint>
+
+constexpr int kKqRawMaxBlocks = 100;
+
+struct KqRawContainer {
+    int headerIndex;  // -1 = none
+    int pixelIndex;   // -1 = none
+    int count;
+    KqRawBlock* blocks[kKqRawMaxBlocks];
+};
+
+KqRawContainer* kqrawContainerCreate() noexcept;
 // Releases every block, then the container. Null is accepted.
 void kqrawContainerRelease(KqRawContainer* container) noexcept;
+
+// The three take ownership of `block` when they return true. Set header and
+// set pixels replace (and release) a block already held in that role, else
+// append; they refuse any other tag, and a header block whose payload is not
+// 36 bytes. Add refuses the header and pixel tags and a full container.
+bool kqrawContainerSetHeader(KqRawContainer* container, KqRawBlock* block) noexcept;
+bool kqrawContainerSetPixels(KqRawContainer* container, KqRawBlock* block) noexcept;
+bool kqrawContainerAdd(KqRawContainer* container, KqRawBlock* block) noexcept;
+
+// Index of the first (or last) block with the tag, -1 when there is none.
+int kqrawContainerFind(const KqRawContainer* container, const char* tag) noexcept;
+int kqrawContainerFindLast(const KqRawContainer* container, const char* tag) noexcept;
+
+// Appends a copy of every block of `source` except its header and pixel
+// blocks, in order. 0, -3 (no memory) or -6 (no room left).
+int kqrawContainerCopyBlocks(KqRawContainer* target, const KqRawContainer* source) noexcept;
+
+// Parses a container, or converts a fixed-header KQRAW file into one, from
+// the source's start. Result: 0; -4 not a container; -21 a container (or
+// fixed-header file) whose blocks are cut short or malformed; -3; -2.
+KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result) noexcept;
+// Reads a container file; null on any failure.
+KqRawContainer* kqrawContainerRead(const char* path) noexcept;
+
+// Writes the header block, then every other block in list order. `pixels`,
+// when given, is written in place of the container's pixel block (or after
+// the last block when the container has none), and `header` in place of its
+// header block. False without a header or a pixel block, or when a write fails.
+bool kqrawContainerWriteStream(const KqRawContainer* container, std::FILE* file,
+                               const KqRawBlock* header = nullptr,
+                               const KqRawBlock* pixels = nullptr) noexcept;
+// Writes a container file through a temporary beside the target.
+bool kqrawContainerWrite(const KqRawContainer* container, const char* path) noexcept;
