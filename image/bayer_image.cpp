@@ -1,0 +1,188 @@
+#include "image/bayer_image.h"
+
+#include "image/hex_text.h"
+#include "image/image_messages.h"
+#include "image/image_result.h"
+#include "image/kqraw_container.h"
+#include "image/kqraw_fixed_header.h"
+#include "image/raw_metadata.h"
+#include "image/raw_reader.h"
+#include "image/sample_scaling.h"
+
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <stdexcept>
+
+namespace {
+
+[[noreturn]] void fail(const char* text) {
+    throw std::runtime_error(text);
+}
+
+// Copy metadata with the object's messages for each failure.
+void copyMetadataOrThrow(ImageBuffer* target, const ImageBuffer* source) {
+    switch (img::copyRawMetadata(target, source)) {
+    case img::MetadataCopy::kCopied: return;
+    case img::MetadataCopy::kTargetHasFileType: fail(img::msg::kAlreadyHasFileType);
+    case img::MetadataCopy::kCopyFailed: fail(img::msg::kCannotCopyMetadata);
+    case img::MetadataCopy::kOutOfMemory: fail(img::msg::kCannotAllocateMetadata);
+    }
+}
+
+struct ContainerRelease {
+    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
+};
+struct BlockRelease {
+    void operator()(KqRawBlock* block) const noexcept { kqrawBlockRelease(block); }
+};
+using BlockPtr = std::unique_ptr<KqRawBlock, BlockRelease>;
+
+// Capture data of a headerless raw file as a container: header block, capture
+// block and SENSORINFO with the serial number. Null when out of memory.
+KqRawContainer* headerlessContainer(float exposureTime, float gain, const std::string& serial) {
+    std::unique_ptr<KqRawContainer, ContainerRelease> container(kqrawContainerCreate());
+    if (!container)
+        return nullptr;
+    BlockPtr header(kqrawBlockCreateHeader());
+    if (!header || !kqrawContainerSetHeader(container.get(), header.get()))
+        return nullptr;
+    header.release();
+    BlockPtr capture(kqrawBlockCreateCapture());
+    if (!capture)
+        return nullptr;
+    kqrawBlockSetFloat(capture.get(), kqcap::kExposureTime, exposureTime);
+    for (std::uint32_t c = 0; c < 4; ++c)
+        kqrawBlockSetFloat(capture.get(), kqcap::kGain0 + 4 * c, gain);
+    if (!kqrawContainerAdd(container.get(), capture.get()))
+        return nullptr;
+    capture.release();
+    BlockPtr info(kqrawBlockCreateSensorInfo());
+    if (!info || !kqrawBlockSetSerialNumber(info.get(), serial.c_str()) ||
+        !kqrawContainerAdd(container.get(), info.get()))
+        return nullptr;
+    info.release();
+    return container.release();
+}
+
+// The same capture data in a fresh fixed header. Null when out of memory.
+KqRawFixedHeader* headerlessFixedHeader(float exposureTime, float gain, const std::string& serial,
+                                        const std::string& sensorGuid) {
+    KqRawFixedHeader* header = kqrawFixedHeaderCreate();
+    if (!header)
+        return nullptr;
+    kqrawFixedSetFloat(header, kqfix::kExposureFloat, exposureTime);
+    for (std::uint32_t c = 0; c < 4; ++c)
+        kqrawFixedSetFloat(header, kqfix::kGain0 + 4 * c, gain);
+    if (!sensorGuid.empty())
+        kqrawFixedSet64(header, kqfix::kSensorGuid, img::parseHex64(sensorGuid.c_str()));
+    img::parseHexBytes(serial.c_str(), header->bytes + kqfix::kSerial, kqfix::kSerialSize);
+    return header;
+}
+
+} // namespace
+
+void BayerImage::read(const std::string& path) {
+    buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr raw(rawRead(path.c_str(), &rc));
+    if (!raw)
+        fail(img::msg::kCannotReadKqraw);
+    ImagePtr image(imageCreate(raw->width, raw->height, raw->bitsPerSample, raw->samplesPerPixel,
+                               raw->numberOfImages, raw->cfa[0], raw->cfa[1], raw->pixelType,
+                               raw->bufferType, kDataReal32, &rc));
+    if (!image)
+        fail(img::msg::kCannotAllocateImage);
+    copyMetadataOrThrow(image.get(), raw.get());
+    if (!img::normaliseSamples(raw.get(), static_cast<float*>(image->data)))
+        fail(img::msg::kCannotReadKqraw);
+    buffer_ = std::move(image);
+}
+
+void BayerImage::createFromHeaderless(std::int32_t width, std::int32_t height, std::uint16_t bits,
+                                      std::uint32_t cfa, float exposureTime, float gain,
+                                      const std::string& serialNumber,
+                                      const std::string& sensorGuid, bool fixedHeader) {
+    buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr image(imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa,
+                               kDataReal32, &rc));
+    if (!image)
+        fail(img::msg::kCannotAllocateImage);
+    if (fixedHeader) {
+        image->rawHeader = headerlessFixedHeader(exposureTime, gain, serialNumber, sensorGuid);
+        image->fileType = kFileKqRaw;
+    } else {
+        image->rawHeader = headerlessContainer(exposureTime, gain, serialNumber);
+        image->fileType = kFileKqRaw2;
+    }
+    if (!image->rawHeader)
+        fail(img::msg::kCannotAllocateMetadataHeaderless);
+    buffer_ = std::move(image);
+}
+
+void BayerImage::createLike(const BayerImage& templateImage, std::int32_t width,
+                            std::int32_t height, std::uint16_t samplesPerPixel, std::uint32_t cfa0,
+                            std::uint32_t cfa1, std::uint32_t pixelType, std::uint32_t bufferType) {
+    const ImageBuffer* pattern = templateImage.buffer();
+    if (!pattern)
+        fail(img::msg::kCannotAllocateImage);
+    if (&templateImage != this)
+        buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr image(imageCreate(width, height, pattern->bitsPerSample, samplesPerPixel,
+                               pattern->numberOfImages, cfa0, cfa1, pixelType, bufferType,
+                               pattern->dataType, &rc));
+    if (!image || img::copyRawMetadata(image.get(), pattern) != img::MetadataCopy::kCopied)
+        fail(img::msg::kCannotAllocateImage);
+    buffer_ = std::move(image);
+}
+
+void BayerImage::copy(const BayerImage& source) {
+    if (&source == this)
+        return;
+    const ImageBuffer* from = source.buffer();
+    if (!from)
+        fail(img::msg::kCannotCopyImage);
+    buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr image(imageCreate(from->width, from->height, from->bitsPerSample,
+                               from->samplesPerPixel, from->numberOfImages, from->cfa[0],
+                               from->cfa[1], from->pixelType, from->bufferType, from->dataType,
+                               &rc));
+    if (!image)
+        fail(img::msg::kCannotCopyImage);
+    if (from->data && image->data)
+        std::memcpy(image->data, from->data,
+                    static_cast<std::size_t>(imageTotalSamples(from, -1) *
+                                             imageSampleBytes(from->dataType)));
+    std::memcpy(image->level, from->level, sizeof image->level);
+    std::memcpy(image->clip, from->clip, sizeof image->clip);
+    if (img::copyRawMetadata(image.get(), from) != img::MetadataCopy::kCopied)
+        fail(img::msg::kCannotCopyImage);
+    buffer_ = std::move(image);
+}
+
+void BayerImage::copyMetadata(const BayerImage& source) {
+    if (!buffer_ || !source.buffer())
+        fail(img::msg::kCannotCopyMetadata);
+    copyMetadataOrThrow(buffer_.get(), source.buffer());
+}
+
+bool BayerImage::samePixels(const BayerImage& other) const {
+    const ImageBuffer* a = buffer_.get();
+    const ImageBuffer* b = other.buffer();
+    if (!a || !b || a->width != b->width || a->height != b->height ||
+        a->samplesPerPixel != b->samplesPerPixel || a->dataType != kDataReal32 ||
+        b->dataType != kDataReal32)
+        return false;
+    const std::uint64_t count = imageTotalSamples(a, -1);
+    if (count != imageTotalSamples(b, -1))
+        return false;
+    const auto* p = static_cast<const float*>(a->data);
+    const auto* q = static_cast<const float*>(b->data);
+    for (std::uint64_t i = 0; i < count; ++i)
+        if (!(p[i] == q[i]))
+            return false;
+    return true;
+}
