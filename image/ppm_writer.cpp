@@ -97,17 +97,16 @@ void convertRow(const ImageBuffer& image, std::uint32_t y, std::uint32_t maxValu
     const auto* samples = static_cast<const Sample*>(image.data);
     const std::uint64_t width = static_cast<std::uint64_t>(image.width);
     const std::uint64_t planeSize = width * static_cast<std::uint64_t>(image.height);
-    const int count = image.samplesPerPixel;
+    const std::uint64_t count = image.samplesPerPixel;
     const bool planar = image.bufferType == kBufferPlanar;
     const bool wide = maxValue > 255;
     for (std::uint64_t x = 0; x < width; ++x) {
-        for (int s = 0; s < count; ++s) {
+        for (std::uint64_t s = 0; s < count; ++s) {
             const std::uint64_t index = planar ? s * planeSize + y * width + x
                                                : (y * width + x) * count + s;
             const std::uint32_t level = toLevel(samples[index], maxValue);
-            if (wide) {
+            if (wide)
                 *out++ = static_cast<std::uint8_t>(level >> 8);
-            }
             *out++ = static_cast<std::uint8_t>(level);
         }
     }
@@ -137,8 +136,8 @@ int ppmWrite(const char* path, const ImageBuffer* image) noexcept {
 
     const std::uint32_t maxValue =
         image->dataType == kDataReal32 ? kFloatMaxValue : integerMaxValue(*image);
-    const std::uint64_t rowBytes = static_cast<std::uint64_t>(image->width) * count *
-                                   (maxValue > 255 ? 2 : 1);
+    const std::uint64_t rowBytes = static_cast<std::uint64_t>(image->width) *
+                                   static_cast<std::uint64_t>(count) * (maxValue > 255 ? 2 : 1);
     if (rowBytes > SIZE_MAX)
         return img::kNoMemory;
     std::string header;

@@ -4,6 +4,7 @@
 #include "image/image_result.h"
 #include "image/output_file.h"
 
+#include <cstdarg>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
