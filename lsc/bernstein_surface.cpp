@@ -1,18 +1,19 @@
 #include "lsc/bernstein_surface.h"
 
+#include <cstddef>
+#include <limits>
+#include <new>
+
 #include "lsc/apan_exception.h"
 #include "lsc/bernstein.h"
 #include "lsc/linear_least_squares.h"
 #include "lsc/lsc_messages.h"
 
-#include <cstddef>
-#include <limits>
-#include <new>
-
 bernsteinSurface::bernsteinSurface(std::uint32_t rows, std::uint32_t columns, double x0,
                                    double xExtent, double y0, double yExtent)
     : controlPoints_(rows, columns), x0_(x0), xExtent_(xExtent), y0_(y0), yExtent_(yExtent),
-      sx_(1.0 / xExtent), sy_(1.0 / yExtent) {}
+      sx_(1.0 / xExtent), sy_(1.0 / yExtent) {
+}
 
 double bernsteinSurface::value(double x, double y) const {
     const int rowDegree = static_cast<int>(controlPoints_.rows()) - 1;

@@ -2,11 +2,11 @@
 // A single tensor-product Bernstein surface over a rectangle; the fit uses a
 // quadratic one as the target level of each channel.
 
-#include "lsc/dense_matrix.h"
-#include "lsc/fit_sample.h"
-
 #include <cstdint>
 #include <vector>
+
+#include "lsc/dense_matrix.h"
+#include "lsc/fit_sample.h"
 
 class bernsteinSurface {
 public:
@@ -31,7 +31,7 @@ public:
 private:
     denseMatrix controlPoints_;
     double x0_, xExtent_, y0_, yExtent_;
-    double sx_, sy_;          // 1 / extent
-    double ox_ = 0, oy_ = 0;  // offsets added after the origin is subtracted
+    double sx_, sy_;         // 1 / extent
+    double ox_ = 0, oy_ = 0; // offsets added after the origin is subtracted
     std::vector<fitSample> samples_;
 };

@@ -4,7 +4,7 @@
 
 #include <cstdint>
 
-inline constexpr std::uint32_t kGridStride = 10;  // control points per grid row
+inline constexpr std::uint32_t kGridStride = 10; // control points per grid row
 
 // Patch start index in the grid: 30 * patch row + 3 * patch column.
 inline constexpr std::uint32_t patchStart(std::uint32_t patchRow, std::uint32_t patchColumn) {
@@ -22,7 +22,8 @@ inline float evalPatch(const float* grid, std::uint32_t start, float u, float v)
     float sum = 0.0f;
     for (std::uint32_t r = 0; r < 4; ++r) {
         const float* p = grid + start + r * kGridStride;
-        const float row = p[0] + 3.0f * (p[1] - p[0]) * u + 3.0f * (p[0] - 2.0f * p[1] + p[2]) * u2 +
+        const float row = p[0] + 3.0f * (p[1] - p[0]) * u +
+                          3.0f * (p[0] - 2.0f * p[1] + p[2]) * u2 +
                           (p[3] - p[0] + 3.0f * p[1] - 3.0f * p[2]) * u3;
         sum += weights[r] * row;
     }

@@ -7,8 +7,8 @@
 inline constexpr const char* kConstraintKindNames[4] = {"value", "du", "dv", "curvature"};
 
 struct fitSample {
-    double x;      // pixel column
-    double y;      // pixel row
+    double x; // pixel column
+    double y; // pixel row
     double value;
-    double weight = static_cast<float>(1e-7);  // carried along, not read by any fit
+    double weight = static_cast<float>(1e-7); // carried along, not read by any fit
 };

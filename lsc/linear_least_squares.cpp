@@ -1,13 +1,13 @@
 #include "lsc/linear_least_squares.h"
 
-#include "lsc/apan_exception.h"
-#include "lsc/lsc_messages.h"
-
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
 #include <memory>
 #include <utility>
+
+#include "lsc/apan_exception.h"
+#include "lsc/lsc_messages.h"
 
 namespace apan {
 
@@ -28,8 +28,7 @@ void reflect(const double* a, std::size_t n, std::size_t m, std::size_t j, doubl
 
 } // namespace
 
-template <typename Real>
-void linearLeastSquares<Real>::solve(Real tolerance) {
+template <typename Real> void linearLeastSquares<Real>::solve(Real tolerance) {
     if (this->a_ && this->a_->rows() == this->a_->columns()) {
         linearSystem<Real>::solve(tolerance);
         return;
@@ -45,7 +44,7 @@ void linearLeastSquares<Real>::solve(Real tolerance) {
 
     // The only temporaries: released on every way out, exceptions included.
     std::unique_ptr<unsigned[]> permutation(new unsigned[k]());
-    std::unique_ptr<double[]> work(new double[n]);  // column measures, then v0 of each step
+    std::unique_ptr<double[]> work(new double[n]); // column measures, then v0 of each step
     auto addSquares = [&](std::size_t fromRow, std::size_t fromColumn) {
         for (std::size_t c = fromColumn; c < n; ++c) {
             double sum = work[c];

@@ -7,8 +7,7 @@
 
 namespace apan {
 
-template <typename Real>
-class linearLeastSquares : public linearSystem<Real> {
+template <typename Real> class linearLeastSquares : public linearSystem<Real> {
 public:
     using linearSystem<Real>::linearSystem;
     void solve(Real tolerance) override;

@@ -1,24 +1,22 @@
 #include "lsc/linear_system.h"
 
-#include "lsc/apan_exception.h"
-#include "lsc/lsc_messages.h"
-
 #include <cmath>
 #include <cstddef>
 #include <stdexcept>
 #include <utility>
 
+#include "lsc/apan_exception.h"
+#include "lsc/lsc_messages.h"
+
 namespace apan {
 
-template <typename Real>
-void linearSystem<Real>::checkShapes() const {
+template <typename Real> void linearSystem<Real>::checkShapes() const {
     if (!a_ || !x_ || !b_ || !a_->data() || !x_->data() || !b_->data() ||
         x_->size() < a_->columns() || b_->size() != a_->rows())
         throw std::invalid_argument(lsc::msg::kSolverShapeMismatch);
 }
 
-template <typename Real>
-void linearSystem<Real>::solve(Real tolerance) {
+template <typename Real> void linearSystem<Real>::solve(Real tolerance) {
     if (a_ && a_->rows() != a_->columns())
         throw exception(231, lsc::msg::kNotSquare, lsc::msg::kNotSquareHint);
     checkShapes();
@@ -70,8 +68,7 @@ void linearSystem<Real>::solve(Real tolerance) {
     }
 }
 
-template <typename Real>
-void linearSystem<Real>::selfTest() {
+template <typename Real> void linearSystem<Real>::selfTest() {
     if (!a_ || a_->rows() != 3 || a_->columns() != 3)
         throw std::invalid_argument(lsc::msg::kSolverShapeMismatch);
     checkShapes();

@@ -12,8 +12,7 @@ namespace apan {
 
 // Gauss elimination with row normalisation; a row is swapped in only when the
 // diagonal entry is below the tolerance, and then the first usable one.
-template <typename Real>
-class linearSystem {
+template <typename Real> class linearSystem {
 public:
     // A: rows x columns; x: at least `columns` elements; b: `rows` elements.
     linearSystem(denseMatrix* a, denseMatrix* x, denseMatrix* b) : a_(a), x_(x), b_(b) {}

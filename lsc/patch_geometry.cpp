@@ -1,10 +1,10 @@
 #include "lsc/patch_geometry.h"
 
-#include "lsc/lsc_messages.h"
-
 #include <cmath>
 #include <limits>
 #include <stdexcept>
+
+#include "lsc/lsc_messages.h"
 
 namespace {
 
@@ -93,8 +93,8 @@ bool patchGeometryUsable(const PatchBreakpoints& breaks) {
 PatchBreakpoints usablePatchBreakpoints(std::uint32_t width, std::uint32_t height,
                                         double leftFraction, double centerFraction,
                                         double topFraction, double middleFraction) {
-    const PatchBreakpoints breaks = patchBreakpoints(width, height, leftFraction, centerFraction,
-                                                     topFraction, middleFraction);
+    const PatchBreakpoints breaks =
+        patchBreakpoints(width, height, leftFraction, centerFraction, topFraction, middleFraction);
     if (!patchGeometryUsable(breaks))
         throw std::runtime_error(lsc::msg::kBadPatchGeometry);
     return breaks;

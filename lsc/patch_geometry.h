@@ -12,8 +12,7 @@ struct PatchBreakpoints {
     std::uint32_t y[4];
 };
 PatchBreakpoints patchBreakpoints(std::uint32_t width, std::uint32_t height, double leftFraction,
-                                  double centerFraction, double topFraction,
-                                  double middleFraction);
+                                  double centerFraction, double topFraction, double middleFraction);
 
 // Patch sizes as the register file exports them: the outer patches round, the
 // central ones truncate, the far ones take the rest (signed: a bad geometry

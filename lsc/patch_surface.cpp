@@ -1,15 +1,15 @@
 #include "lsc/patch_surface.h"
 
-#include "lsc/apan_exception.h"
-#include "lsc/bernstein.h"
-#include "lsc/linear_least_squares.h"
-#include "lsc/lsc_messages.h"
-
 #include <cstddef>
 #include <limits>
 #include <new>
 #include <ostream>
 #include <stdexcept>
+
+#include "lsc/apan_exception.h"
+#include "lsc/bernstein.h"
+#include "lsc/linear_least_squares.h"
+#include "lsc/lsc_messages.h"
 
 namespace {
 
@@ -21,7 +21,9 @@ std::uint32_t nearestInterval(const std::vector<double>& breaks, double t) {
     std::uint32_t best = 0;
     double bestDistance = std::numeric_limits<double>::infinity();
     for (std::size_t i = 0; i + 1 < breaks.size(); ++i) {
-        const double distance = t < breaks[i] ? breaks[i] - t : t > breaks[i + 1] ? t - breaks[i + 1] : 0.0;
+        const double distance = t < breaks[i]       ? breaks[i] - t
+                                : t > breaks[i + 1] ? t - breaks[i + 1]
+                                                    : 0.0;
         if (distance < bestDistance) {
             bestDistance = distance;
             best = static_cast<std::uint32_t>(i);
@@ -99,8 +101,7 @@ const surfacePatch& patchSurface::addDesignRow(denseMatrix& a, std::uint32_t equ
 void patchSurface::fit(double tolerance, std::ostream& messages) {
     const std::uint64_t unknowns = static_cast<std::uint64_t>(globalRows_) * globalColumns_;
     const std::uint64_t equations = static_cast<std::uint64_t>(valueConstraints_.size()) +
-                                    yDerivativeConstraints_.size() +
-                                    xDerivativeConstraints_.size();
+                                    yDerivativeConstraints_.size() + xDerivativeConstraints_.size();
     if (unknowns > equations)
         throw apan::exception(220, lsc::msg::kUnderConstrained, lsc::msg::kUnderConstrainedHint);
     if (equations > std::numeric_limits<std::uint32_t>::max())
@@ -127,7 +128,8 @@ void patchSurface::fit(double tolerance, std::ostream& messages) {
     apan::linearLeastSquares<double>(&a, &solution, &b).solve(tolerance);
     for (std::uint32_t row = 0; row < globalRows_; ++row)
         for (std::uint32_t column = 0; column < globalColumns_; ++column)
-            setGlobal(row, column, solution[static_cast<std::size_t>(row) * globalColumns_ + column]);
+            setGlobal(row, column,
+                      solution[static_cast<std::size_t>(row) * globalColumns_ + column]);
 }
 
 void patchSurface::setGlobal(std::uint32_t row, std::uint32_t column, double value) {

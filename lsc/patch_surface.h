@@ -3,19 +3,19 @@
 // Bernstein patches that share their border control points, so 3 x 3 patches
 // make one 10 x 10 global grid of unknowns.
 
-#include "lsc/dense_matrix.h"
-#include "lsc/fit_sample.h"
-
 #include <cstdint>
 #include <iosfwd>
 #include <vector>
 
+#include "lsc/dense_matrix.h"
+#include "lsc/fit_sample.h"
+
 // One bicubic patch over [x0, x1] x [y0, y1] pixels.
 struct surfacePatch {
-    denseMatrix controlPoints;  // 4 x 4, rows along y
+    denseMatrix controlPoints; // 4 x 4, rows along y
     double x0, x1, y0, y1;
-    double inverseWidth;        // 1 / (x1 - x0)
-    double inverseHeight;       // 1 / (y1 - y0)
+    double inverseWidth;  // 1 / (x1 - x0)
+    double inverseHeight; // 1 / (y1 - y0)
 
     double localU(double x) const { return (x - x0) / (x1 - x0); }
     double localV(double y) const { return (y - y0) / (y1 - y0); }
@@ -28,7 +28,7 @@ struct PatchIndex {
 
 class patchSurface {
 public:
-    static constexpr std::uint32_t kPointsPerPatch = 4;  // along each axis
+    static constexpr std::uint32_t kPointsPerPatch = 4; // along each axis
 
     // patchesX x patchesY patches; xBreaks and yBreaks hold one more value
     // than patches in their direction (std::invalid_argument otherwise).
@@ -82,7 +82,7 @@ private:
     std::vector<fitSample> yDerivativeConstraints_;
     std::uint32_t patchRows_;
     std::uint32_t patchColumns_;
-    std::vector<surfacePatch> patches_;  // row-major
+    std::vector<surfacePatch> patches_; // row-major
     std::vector<double> xBreaks_;
     std::vector<double> yBreaks_;
     std::uint32_t globalRows_;

@@ -1,9 +1,8 @@
-#include "lsc/bernstein.h"
-#include "lsc/bernstein_surface.h"
+#include <gtest/gtest.h>
 
 #include "lsc/apan_exception.h"
-
-#include <gtest/gtest.h>
+#include "lsc/bernstein.h"
+#include "lsc/bernstein_surface.h"
 
 namespace {
 
@@ -51,7 +50,7 @@ TEST(BernsteinSurface, NineSamplesDetermineAQuadraticExactly) {
 
 TEST(BernsteinSurface, ControlPointsAreRowMajorWithRowsAlongY) {
     bernsteinSurface surface(3, 3, 0.0, 100.0, 0.0, 100.0);
-    surface.controlPoints()(2, 0) = 1.0;  // bottom-left corner
+    surface.controlPoints()(2, 0) = 1.0; // bottom-left corner
     EXPECT_EQ(surface.value(0.0, 100.0), 1.0);
     EXPECT_EQ(surface.value(100.0, 0.0), 0.0);
 }

@@ -1,14 +1,13 @@
-#include "lsc/linear_least_squares.h"
-
-#include "lsc/apan_exception.h"
-#include "lsc/dense_matrix.h"
-
-#include <gtest/gtest.h>
-
 #include <cmath>
 #include <random>
 #include <stdexcept>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "lsc/apan_exception.h"
+#include "lsc/dense_matrix.h"
+#include "lsc/linear_least_squares.h"
 
 namespace {
 

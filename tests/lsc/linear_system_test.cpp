@@ -1,13 +1,12 @@
-#include "lsc/linear_system.h"
-
-#include "lsc/apan_exception.h"
-#include "lsc/dense_matrix.h"
-
-#include <gtest/gtest.h>
-
 #include <initializer_list>
 #include <stdexcept>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include "lsc/apan_exception.h"
+#include "lsc/dense_matrix.h"
+#include "lsc/linear_system.h"
 
 namespace {
 
@@ -21,8 +20,7 @@ denseMatrix matrixOf(std::uint32_t rows, std::uint32_t columns,
 }
 
 // Runs f and returns the apan::exception it throws (fails the test if none).
-template <typename F>
-apan::exception caught(F f) {
+template <typename F> apan::exception caught(F f) {
     try {
         f();
     } catch (const apan::exception& e) {
@@ -98,7 +96,7 @@ TEST(LinearSystem, RowsWithALeadWithinTheToleranceAreLeftUntouched) {
 }
 
 TEST(LinearSystem, SingularLastPivotThrows231) {
-    denseMatrix a = matrixOf(3, 3, {2, 1, 1, 1, 3, 2, 3, 4, 3});  // row 2 = row 0 + row 1
+    denseMatrix a = matrixOf(3, 3, {2, 1, 1, 1, 3, 2, 3, 4, 3}); // row 2 = row 0 + row 1
     denseMatrix b = matrixOf(3, 1, {1, 2, 3});
     denseMatrix x(3, 1);
     apan::linearSystem<double> system(&a, &x, &b);
@@ -114,7 +112,8 @@ TEST(LinearSystem, NonSquareMatrixThrows231) {
     const apan::exception e = caught([&] { system.solve(1e-7); });
     EXPECT_EQ(e.code(), 231);
     EXPECT_STREQ(e.what(), "You can only solve linear system if the 'A' matrix is square.");
-    EXPECT_EQ(e.hint(), "You need as many constraints as equations our the system can't be solved.");
+    EXPECT_EQ(e.hint(),
+              "You need as many constraints as equations our the system can't be solved.");
 }
 
 TEST(LinearSystem, RefusesVectorsThatDoNotFitTheMatrix) {

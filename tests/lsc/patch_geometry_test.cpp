@@ -1,9 +1,9 @@
-#include "lsc/patch_geometry.h"
+#include <limits>
+#include <stdexcept>
 
 #include <gtest/gtest.h>
 
-#include <limits>
-#include <stdexcept>
+#include "lsc/patch_geometry.h"
 
 namespace {
 
@@ -20,15 +20,16 @@ TEST(PatchBreakpoints, DefaultFractionsSplitAQuarterAHalfAQuarter) {
 
 TEST(PatchBreakpoints, LeftTruncatesAndCentreRounds) {
     const PatchBreakpoints b = patchBreakpoints(1001, 1001, 0.25, 0.5, 0.25, 0.5);
-    EXPECT_EQ(b.x[1], 250u);  // 250.25 truncated
-    EXPECT_EQ(b.x[2], 751u);  // 500.5 rounded up
+    EXPECT_EQ(b.x[1], 250u); // 250.25 truncated
+    EXPECT_EQ(b.x[2], 751u); // 500.5 rounded up
     EXPECT_EQ(b.x[3], 1001u);
     EXPECT_EQ(b.y[1], 250u);
     EXPECT_EQ(b.y[2], 751u);
 }
 
 TEST(PatchBreakpoints, NonsensicalFractionsStayWithinRange) {
-    const PatchBreakpoints b = patchBreakpoints(100, 100, -0.5, 1e30, std::numeric_limits<double>::quiet_NaN(), 0.5);
+    const PatchBreakpoints b =
+        patchBreakpoints(100, 100, -0.5, 1e30, std::numeric_limits<double>::quiet_NaN(), 0.5);
     EXPECT_EQ(b.x[1], 0u);
     EXPECT_EQ(b.x[2], 0xffffffffu);
     EXPECT_EQ(b.y[1], 0u);

@@ -1,21 +1,22 @@
-#include "lsc/patch_surface.h"
+#include <cmath>
+#include <sstream>
+#include <vector>
+
+#include <gtest/gtest.h>
 
 #include "lsc/apan_exception.h"
 #include "lsc/bernstein.h"
 #include "lsc/eval_patch.h"
-
-#include <gtest/gtest.h>
-
-#include <cmath>
-#include <sstream>
-#include <vector>
+#include "lsc/patch_surface.h"
 
 namespace {
 
 const std::vector<double> kXBreaks = {0, 250, 750, 1000};
 const std::vector<double> kYBreaks = {0, 200, 600, 800};
 
-double plane(double x, double y) { return 1.0 + 0.002 * x - 0.001 * y; }
+double plane(double x, double y) {
+    return 1.0 + 0.002 * x - 0.001 * y;
+}
 
 // Value of a fitted surface at (x, y), evaluated in double precision.
 double surfaceValue(const patchSurface& s, double x, double y) {
@@ -25,8 +26,8 @@ double surfaceValue(const patchSurface& s, double x, double y) {
     double sum = 0;
     for (int r = 0; r < 4; ++r)
         for (int c = 0; c < 4; ++c)
-            sum += p.controlPoints(r, c) * bernstein(r, 3, p.localV(y)) *
-                   bernstein(c, 3, p.localU(x));
+            sum +=
+                p.controlPoints(r, c) * bernstein(r, 3, p.localV(y)) * bernstein(c, 3, p.localU(x));
     return sum;
 }
 
@@ -95,7 +96,7 @@ TEST(PatchSurface, SlopeConstraintsCountAsEquations) {
     for (double x = 0; x < 1000; x += 111)
         for (double y = 0; y < 800; y += 89)
             s.addValueConstraint(x, y, plane(x, y));
-    ASSERT_THROW(s.fit(1e-10, std::cout), apan::exception);  // 81 values: too few
+    ASSERT_THROW(s.fit(1e-10, std::cout), apan::exception); // 81 values: too few
     for (double x = 20; x < 1000; x += 111)
         for (double y = 15; y < 800; y += 89) {
             s.addXDerivativeConstraint(x, y, 0.002);
