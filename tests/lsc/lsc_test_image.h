@@ -1,0 +1,39 @@
+#pragma once
+// Working images for the lens-shading tests: REAL32 Bayer images made with the
+// image library and filled in code.
+
+#include <cstdint>
+#include <functional>
+
+#include <gtest/gtest.h>
+
+#include "image/image_buffer.h"
+#include "lsc/processing_context.h"
+
+namespace lsc_test {
+
+// Gives context.image a width x height REAL32 Bayer image of pattern `cfa`
+// whose pixel (x, y) is value(x, y).
+inline void makeImage(ProcessingContext& context, int width, int height, std::uint32_t cfa,
+                      const std::function<float(int, int)>& value, std::uint16_t bits = 10) {
+    int rc = 0;
+    context.image.reset(
+        imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
+    ASSERT_NE(context.image.buffer(), nullptr) << rc;
+    float* p = context.image.pixels();
+    for (int y = 0; y < height; ++y)
+        for (int x = 0; x < width; ++x)
+            p[y * width + x] = value(x, y);
+}
+
+// Pixel value of a flat field whose channels (in channel order) sit at levels[k].
+inline std::function<float(int, int)> channelLevels(std::uint32_t cfa, const float levels[4]) {
+    const int phase = cfa == kCfaGrbg ? 1 : cfa == kCfaGbrg ? 2 : cfa == kCfaBggr ? 3 : 0;
+    const float l0 = levels[0], l1 = levels[1], l2 = levels[2], l3 = levels[3];
+    return [=](int x, int y) {
+        const int k = ((x + phase) & 1) + ((y + (phase >> 1)) & 1) * 2;
+        return k == 0 ? l0 : k == 1 ? l1 : k == 2 ? l2 : l3;
+    };
+}
+
+} // namespace lsc_test
