@@ -62,7 +62,7 @@ private:
         std::uint64_t v = 0;
         for (; *text >= '0' && *text <= '9'; ++text) {
             const auto digit = static_cast<std::uint64_t>(*text - '0');
-            if (v > (limit - digit) / 10)
+            if (digit > limit || v > (limit - digit) / 10)
                 return false;
             v = v * 10 + digit;
         }
