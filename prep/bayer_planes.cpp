@@ -7,6 +7,38 @@
 #include <stdexcept>
 
 namespace prep {
+namespace {
+
+// The common case, a single-channel 2 x 2 pattern, with two row pointers.
+void splitTwoByTwo(const float* in, std::size_t mosaicWidth, float* out, std::size_t width,
+                   std::size_t height) {
+    for (std::size_t y = 0; y < height; ++y) {
+        const float* top = in + 2 * y * mosaicWidth;
+        const float* bottom = top + mosaicWidth;
+        for (std::size_t x = 0; x < width; ++x, out += 4) {
+            out[0] = top[2 * x];
+            out[1] = top[2 * x + 1];
+            out[2] = bottom[2 * x];
+            out[3] = bottom[2 * x + 1];
+        }
+    }
+}
+
+void weaveTwoByTwo(const float* in, std::size_t width, std::size_t height, float* out,
+                   std::size_t mosaicWidth) {
+    for (std::size_t y = 0; y < height; ++y) {
+        float* top = out + 2 * y * mosaicWidth;
+        float* bottom = top + mosaicWidth;
+        for (std::size_t x = 0; x < width; ++x, in += 4) {
+            top[2 * x] = in[0];
+            top[2 * x + 1] = in[1];
+            bottom[2 * x] = in[2];
+            bottom[2 * x + 1] = in[3];
+        }
+    }
+}
+
+} // namespace
 
 int patternSize(std::uint32_t cfa0, std::uint32_t cfa1) {
     if (cfa0 == 0 && (cfa1 & 0xFFFFu) == 0 && (cfa1 & 0xF0000u) != 0)
@@ -41,6 +73,11 @@ BayerImage split(const BayerImage& mosaic) {
         std::memset(out, 0, sampleCount(planes) * sizeof(float));
     const float* in = mosaic.pixels();
     const std::size_t mosaicWidth = static_cast<std::size_t>(mosaic.width());
+    if (p == 2 && mosaicChannels == 1) {
+        splitTwoByTwo(in, mosaicWidth, out, static_cast<std::size_t>(width),
+                      static_cast<std::size_t>(height));
+        return planes;
+    }
     for (std::size_t y = 0; y < static_cast<std::size_t>(height); ++y) {
         for (std::size_t x = 0; x < static_cast<std::size_t>(width); ++x) {
             float* pixel = out + (y * width + x) * channels;
@@ -91,6 +128,11 @@ BayerImage weave(const BayerImage& planes, int p, std::uint32_t cfa0, std::uint3
     const std::size_t planeWidth = static_cast<std::size_t>(planes.width());
     const std::size_t channels = planes.channels();
     const std::size_t mosaicWidth = static_cast<std::size_t>(width);
+    if (p == 2) {
+        weaveTwoByTwo(in, planeWidth, static_cast<std::size_t>(planes.height()), out,
+                      mosaicWidth);
+        return mosaic;
+    }
     for (std::size_t y = 0; y < static_cast<std::size_t>(planes.height()); ++y) {
         for (std::size_t x = 0; x < planeWidth; ++x) {
             const float* pixel = in + (y * planeWidth + x) * channels;

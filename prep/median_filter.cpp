@@ -20,6 +20,8 @@ constexpr std::size_t kTreeChannels = 4;  // channels filtered side by side
 // image narrower than the window the reflection repeats instead of reading
 // outside the image.
 std::size_t mirror(std::int64_t i, std::int64_t n) {
+    if (i >= 0 && i < n)
+        return static_cast<std::size_t>(i);
     const std::int64_t period = 2 * n;
     i %= period;
     if (i < 0)
