@@ -184,7 +184,8 @@ config_node& config_node_impl::child(std::size_t index) {
                                 config::msg::kIndexTooLargeMiddle + name_ +
                                 config::msg::kIndexTooLargeSuffix);
     if (index >= indexed_.size()) {
-        indexed_.reserve(index + 1);
+        // No exact reserve here: lists grow one index at a time, and
+        // push_back's geometric growth keeps that linear.
         for (std::size_t i = indexed_.size(); i <= index; ++i)
             indexed_.push_back(std::make_shared<config_node_impl>(
                 name_ + "[" + std::to_string(i) + "]"));

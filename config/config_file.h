@@ -1,0 +1,16 @@
+#pragma once
+// Reading configuration text (settings such as `lsc.sampling_factor = 8;`)
+// into the configuration tree. Every accepted setting is stored under the
+// given "config" node; settings applied before an error stay there.
+
+#include "config/config_node.h"
+
+#include <string>
+#include <string_view>
+
+// Reads the whole file and parses it. Throws std::invalid_argument when the
+// file cannot be read, std::runtime_error when its text does not parse.
+void read_config_file(const std::string& path, config_node& config);
+
+// Parses configuration text held in memory (errors as read_config_file).
+void parse_config_text(std::string_view text, config_node& config);
