@@ -1,0 +1,152 @@
+#include "lsc/lens_shading_fit.h"
+
+#include <cmath>
+#include <cstdint>
+#include <ostream>
+#include <stdexcept>
+#include <vector>
+
+#include "lsc/bernstein_surface.h"
+#include "lsc/lsc_messages.h"
+#include "lsc/patch_geometry.h"
+#include "lsc/patch_surface.h"
+#include "lsc/working_image.h"
+
+namespace {
+
+constexpr double kTargetTolerance = 1e-7;
+constexpr double kPatchTolerance = 1e-10;
+
+// Quadratic surface through the wanted level of one channel: t in the centre,
+// falling by the falloff towards the edges and corners.
+bernsteinSurface targetSurface(std::uint32_t width, std::uint32_t height, float level,
+                               float falloff, double fx, double fy, const char* name, bool quiet,
+                               std::ostream& messages) {
+    const double hedge = level * (1.0 - fx);
+    const double vedge = level * (1.0 - fy);
+    const double corner = level * (1.0 - falloff);
+    const double cx = width / 2, cy = height / 2;
+    const double right = width - 1.0, bottom = height - 1.0;
+
+    bernsteinSurface surface(3, 3, 0.0, width, 0.0, height);
+    surface.addSample(0, 0, corner);
+    surface.addSample(0, cy, hedge);
+    surface.addSample(0, bottom, corner);
+    surface.addSample(cx, 0, vedge);
+    surface.addSample(cx, cy, level);
+    surface.addSample(cx, bottom, vedge);
+    surface.addSample(right, 0, corner);
+    surface.addSample(right, cy, hedge);
+    surface.addSample(right, bottom, corner);
+    surface.fit(kTargetTolerance);
+
+    if (!quiet) {
+        messages << lsc::msg::kTargetValue << name << "]";
+        if (falloff != 0.0f)
+            messages << "  center :" << surface.value(cx, cy) << " / " << level
+                     << "  corner :" << surface.value(0, 0) << " / " << corner
+                     << "  hedge :" << surface.value(0, cy) << " / " << hedge
+                     << "  vedge :" << surface.value(cx, 0) << " / " << vedge;
+        else
+            messages << ":" << level;
+        messages << std::endl;
+    }
+    return surface;
+}
+
+[[noreturn]] void refuseGain() {
+    throw std::runtime_error(lsc::msg::kZeroValue);
+}
+
+// Replaces each measured value by target / measured and, unless the gains
+// stay absolute, divides each channel by its smallest gain.
+void turnSamplesIntoGains(std::vector<shadingSample>& samples,
+                          const std::vector<bernsteinSurface>& targets, bool absolute) {
+    float smallest[kChannels] = {0, 0, 0, 0};
+    bool first = true;
+    for (shadingSample& s : samples) {
+        for (int k = 0; k < kChannels; ++k) {
+            const float measured = s.value[k];
+            if (measured == 0.0f)
+                refuseGain();
+            const float gain = static_cast<float>(targets[k].value(s.x, s.y) / measured);
+            // A non-finite gain (tiny or non-finite input) cannot be fitted either.
+            if (!std::isfinite(gain))
+                refuseGain();
+            s.value[k] = gain;
+            if (first || gain <= smallest[k])
+                smallest[k] = gain;
+        }
+        first = false;
+    }
+    if (absolute || samples.empty())
+        return;
+    // A smallest gain below 0 would flip the sign of every gain of the
+    // channel; it is refused like a zero one.
+    for (int k = 0; k < kChannels; ++k)
+        if (!(smallest[k] > 0.0f))
+            refuseGain();
+    for (shadingSample& s : samples)
+        for (int k = 0; k < kChannels; ++k)
+            s.value[k] /= smallest[k];
+}
+
+} // namespace
+
+void fitLensShading(ProcessingContext& context, std::ostream& messages) {
+    const WorkingImage image = workingImage(context.image);
+    const std::uint32_t w = image.width, h = image.height;
+    // A patch without pixels would make the local coordinates infinite.
+    const PatchBreakpoints breaks =
+        usablePatchBreakpoints(w, h, context.leftFraction, context.centerFraction,
+                               context.topFraction, context.middleFraction);
+
+    float* levels = context.targetLevels;
+    if (context.greenBalance) {
+        if (levels[1] > levels[2])
+            levels[2] = levels[1];
+        else
+            levels[1] = levels[2];
+    }
+
+    const double halfW = w / 2, halfH = h / 2;
+    const double diagonal = std::sqrt(halfW * halfW + halfH * halfH);
+    const float f = context.falloff;
+    const double fx = f > 0.0f ? f * halfW / diagonal : f;
+    const double fy = f > 0.0f ? f * halfH / diagonal : f;
+
+    std::vector<bernsteinSurface> targets;
+    targets.reserve(kChannels);
+    for (int k = 0; k < kChannels; ++k)
+        targets.push_back(
+            targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], context.quiet, messages));
+
+    turnSamplesIntoGains(context.samples, targets, context.greenBalance);
+
+    const std::vector<double> xBreaks(breaks.x, breaks.x + 4);
+    const std::vector<double> yBreaks(breaks.y, breaks.y + 4);
+    float grids[kChannels][kGridPoints];
+    for (int k = 0; k < kChannels; ++k) {
+        if (!context.quiet)
+            messages << lsc::msg::kFittingSurface << kChannelNames[k] << std::endl;
+        patchSurface surface(3, 3, xBreaks, yBreaks);
+        for (const shadingSample& s : context.samples)
+            if (s.x < w && s.y < h)
+                surface.addValueConstraint(s.x, s.y, s.value[k]);
+        surface.fit(kPatchTolerance, messages);
+        surface.copyToGrid(grids[k]);
+    }
+
+    for (int k = 0; k < kChannels; ++k)
+        for (int i = 0; i < kGridPoints; ++i)
+            context.controlGrids[k][i] = grids[k][i];
+    if (context.averageChannels)
+        for (int i = 0; i < kGridPoints; ++i) {
+            float sum = 0.0f;
+            for (int k = 0; k < kChannels; ++k)
+                sum += context.controlGrids[k][i];
+            const float mean = sum * 0.25f;
+            for (int k = 0; k < kChannels; ++k)
+                context.controlGrids[k][i] = mean;
+        }
+}
