@@ -1,0 +1,90 @@
+#include "lsc/lens_shading_correction.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <stdexcept>
+
+#include "lsc/bayer_phase.h"
+#include "lsc/eval_patch.h"
+#include "lsc/lsc_messages.h"
+#include "lsc/patch_geometry.h"
+#include "lsc/working_image.h"
+
+namespace {
+
+// Patch index and local coordinate of a block position along one axis, with
+// breakpoints (0, first, second, size).
+struct AxisPosition {
+    std::uint32_t patch;
+    float local;
+};
+
+AxisPosition axisPosition(std::uint32_t p, const std::uint32_t breaks[4]) {
+    if (p < breaks[1])
+        return {0, static_cast<float>(p) / static_cast<float>(breaks[1])};
+    if (p < breaks[2])
+        return {1, static_cast<float>(p - breaks[1]) / static_cast<float>(breaks[2] - breaks[1])};
+    return {2, static_cast<float>(p - breaks[2]) / static_cast<float>(breaks[3] - breaks[2])};
+}
+
+} // namespace
+
+void applyLensShading(ProcessingContext& context) {
+    const WorkingImage in = workingImage(context.image);
+    const std::uint64_t step = context.applyStep;
+    if (step < 1)
+        throw std::runtime_error(lsc::msg::kBadApplyStep);
+    // Smaller inputs have no complete output block.
+    if (in.width < 2 * step || in.height < 2 * step)
+        throw std::runtime_error(lsc::msg::kImageTooSmallToCorrect);
+    const PatchBreakpoints breaks =
+        usablePatchBreakpoints(in.width, in.height, context.leftFraction, context.centerFraction,
+                               context.topFraction, context.middleFraction);
+
+    const std::uint32_t outWidth = static_cast<std::uint32_t>(in.width / step) & ~1u;
+    const std::uint32_t outHeight = static_cast<std::uint32_t>(in.height / step) & ~1u;
+    context.corrected.reset();
+    int rc = 0;
+    const ImageBuffer* source = context.image.buffer();
+    ImageBuffer* out =
+        imageCreate(static_cast<std::int32_t>(outWidth), static_cast<std::int32_t>(outHeight),
+                    source->bitsPerSample, 1, 1, source->cfa[0], source->cfa[1], kPixelRaw,
+                    kBufferRawCfa, kDataReal32, &rc);
+    if (!out)
+        throw std::runtime_error(lsc::msg::kImageAllocation);
+    context.corrected.reset(out);
+
+    const int phase = bayerPhase(in.cfa);
+    int channelAt[2][2];
+    for (int dy = 0; dy < 2; ++dy)
+        for (int dx = 0; dx < 2; ++dx)
+            channelAt[dy][dx] =
+                bayerChannel(static_cast<unsigned>(dx), static_cast<unsigned>(dy), phase);
+    const float black = context.blackLevel;
+    const float* const src = in.pixels;
+    float* const dst = static_cast<float*>(out->data);
+    const std::size_t inStride = in.width;
+    const std::size_t outStride = outWidth;
+
+    // Every output block once: (outWidth / 2) x (outHeight / 2) blocks, taken
+    // from input blocks 2 x step apart; the last one read ends at or before
+    // W - 2 x step + 1, inside the image.
+    for (std::uint32_t yo = 0; yo < outHeight; yo += 2) {
+        const std::uint32_t y = static_cast<std::uint32_t>(yo * step);
+        const AxisPosition row = axisPosition(y, breaks.y);
+        for (std::uint32_t xo = 0; xo < outWidth; xo += 2) {
+            const std::uint32_t x = static_cast<std::uint32_t>(xo * step);
+            const AxisPosition column = axisPosition(x, breaks.x);
+            const std::uint32_t start = patchStart(row.patch, column.patch);
+            for (int dy = 0; dy < 2; ++dy) {
+                const float* inRow = src + (y + dy) * inStride + x;
+                float* outRow = dst + (yo + dy) * outStride + xo;
+                for (int dx = 0; dx < 2; ++dx) {
+                    const float gain = evalPatch(context.controlGrids[channelAt[dy][dx]], start,
+                                                 column.local, row.local);
+                    outRow[dx] = gain * (inRow[dx] - black);
+                }
+            }
+        }
+    }
+}
