@@ -30,25 +30,18 @@ void copyMetadataOrThrow(ImageBuffer* target, const ImageBuffer* source) {
     }
 }
 
-struct ContainerRelease {
-    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
-};
-struct BlockRelease {
-    void operator()(KqRawBlock* block) const noexcept { kqrawBlockRelease(block); }
-};
-using BlockPtr = std::unique_ptr<KqRawBlock, BlockRelease>;
 
 // Capture data of a headerless raw file as a container: header block, capture
 // block and SENSORINFO with the serial number. Null when out of memory.
 KqRawContainer* headerlessContainer(float exposureTime, float gain, const std::string& serial) {
-    std::unique_ptr<KqRawContainer, ContainerRelease> container(kqrawContainerCreate());
+    KqRawContainerPtr container(kqrawContainerCreate());
     if (!container)
         return nullptr;
-    BlockPtr header(kqrawBlockCreateHeader());
+    KqRawBlockPtr header(kqrawBlockCreateHeader());
     if (!header || !kqrawContainerSetHeader(container.get(), header.get()))
         return nullptr;
     header.release();
-    BlockPtr capture(kqrawBlockCreateCapture());
+    KqRawBlockPtr capture(kqrawBlockCreateCapture());
     if (!capture)
         return nullptr;
     kqrawBlockSetFloat(capture.get(), kqcap::kExposureTime, exposureTime);
@@ -57,7 +50,7 @@ KqRawContainer* headerlessContainer(float exposureTime, float gain, const std::s
     if (!kqrawContainerAdd(container.get(), capture.get()))
         return nullptr;
     capture.release();
-    BlockPtr info(kqrawBlockCreateSensorInfo());
+    KqRawBlockPtr info(kqrawBlockCreateSensorInfo());
     if (!info || !kqrawBlockSetSerialNumber(info.get(), serial.c_str()) ||
         !kqrawContainerAdd(container.get(), info.get()))
         return nullptr;

@@ -14,8 +14,10 @@ public:
     BayerImage(BayerImage&&) noexcept = default;
     BayerImage& operator=(BayerImage&&) noexcept = default;
 
-    // Reads a raw file (fixed-header or chunked container, ...) and normalises
-    // each sample s to (s & (2^bits - 1)) / (2^bits - 1).
+    // Reads a raw file (fixed-header, chunked container, NKRAW, or a dump
+    // whose layout is asked on the console) and normalises each sample s to
+    // (s & (2^bits - 1)) / (2^bits - 1) in one pass. On failure the object
+    // holds no image.
     void read(const std::string& path);
 
     // A new sensor image for headerless raw data; the capture data go into a
@@ -34,14 +36,20 @@ public:
     void copy(const BayerImage& source);           // pixels and metadata
     void copyMetadata(const BayerImage& source);   // metadata and raw header only
 
+    // Rounds the samples back to the bit depth and writes them in the file
+    // type the image carries: KQRAW2, KQRAW (also for an NKRAW image, whose
+    // capture data are translated) or, for a dump read by layout, FIXRAW.
     void storeKqraw(const std::string& path) const;
     void storeJpeg(const std::string& path, int quality) const;
     void storeBmp(const std::string& path) const;
 
     float exposureTime() const;
     float channelGain(int channel) const;
-    // The module serial number; maxLength 0 means all of it.
+    // The module serial number. KQRAW2: the SENSORINFO serial string, cut to
+    // maxLength characters unless maxLength is 0. KQRAW: maxLength / 2 bytes
+    // of the 16-byte binary field (all 16 at most) as lowercase hex digits.
     std::string serialNumber(std::size_t maxLength) const;
+    // KQRAW only: the text read as a hexadecimal number into the header.
     void setSensorGuid(const std::string& guidHex);
     bool samePixels(const BayerImage& other) const;
 

@@ -14,11 +14,6 @@
 
 namespace {
 
-struct BlockRelease {
-    void operator()(KqRawBlock* block) const noexcept { kqrawBlockRelease(block); }
-};
-using BlockPtr = std::unique_ptr<KqRawBlock, BlockRelease>;
-
 KqRawBlock* allocateBlock(const char* tag, KqRawForm form) {
     auto* block = static_cast<KqRawBlock*>(std::calloc(1, sizeof(KqRawBlock)));
     if (block) {
@@ -78,7 +73,7 @@ std::uint8_t* duplicateBytes(const std::uint8_t* bytes, std::size_t size) {
 }
 
 KqRawBlock* createOpaque(const char* tag, std::uint32_t size) {
-    BlockPtr block(allocateBlock(tag, KqRawForm::kOpaque));
+    KqRawBlockPtr block(allocateBlock(tag, KqRawForm::kOpaque));
     if (!block)
         return nullptr;
     block->payload = static_cast<std::uint8_t*>(std::calloc(size > 0 ? size : 1, 1));
@@ -89,7 +84,7 @@ KqRawBlock* createOpaque(const char* tag, std::uint32_t size) {
 }
 
 KqRawBlock* createText(const char* tag, const char* text) {
-    BlockPtr block(allocateBlock(tag, KqRawForm::kText));
+    KqRawBlockPtr block(allocateBlock(tag, KqRawForm::kText));
     if (!block || !kqrawBlockSetString(block.get(), 0, text))
         return nullptr;
     return block.release();
@@ -142,7 +137,7 @@ bool kqrawBlockHasTag(const KqRawBlock* block, const char* tag) noexcept {
 KqRawBlock* kqrawBlockClone(const KqRawBlock* source) noexcept {
     if (!source)
         return nullptr;
-    BlockPtr block(static_cast<KqRawBlock*>(std::malloc(sizeof(KqRawBlock))));
+    KqRawBlockPtr block(static_cast<KqRawBlock*>(std::malloc(sizeof(KqRawBlock))));
     if (!block)
         return nullptr;
     *block = *source;
@@ -180,7 +175,7 @@ KqRawBlock* kqrawBlockCreateHeader() noexcept {
 KqRawBlock* kqrawBlockCreatePixels(const std::uint16_t* samples, std::uint64_t count) noexcept {
     if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2 || (count > 0 && !samples))
         return nullptr;
-    BlockPtr block(allocateBlock(kqtag::kPixels, KqRawForm::kPixels));
+    KqRawBlockPtr block(allocateBlock(kqtag::kPixels, KqRawForm::kPixels));
     if (!block)
         return nullptr;
     img::storeLE32(block->lead, 1);
@@ -201,7 +196,7 @@ KqRawBlock* kqrawBlockCreateCapture() noexcept {
 }
 
 KqRawBlock* kqrawBlockCreateSensorInfo() noexcept {
-    BlockPtr block(allocateBlock(kqtag::kSensorInfo, KqRawForm::kSensorInfo));
+    KqRawBlockPtr block(allocateBlock(kqtag::kSensorInfo, KqRawForm::kSensorInfo));
     if (!block)
         return nullptr;
     block->infoWord = 1;
@@ -333,7 +328,7 @@ int kqrawBlockRead(img::ByteSource& source, KqRawBlock** out) noexcept {
     if (size > source.remaining())
         return img::kSizeMismatch;
 
-    BlockPtr block(allocateBlock(reinterpret_cast<const char*>(tag), formOfTag(tag)));
+    KqRawBlockPtr block(allocateBlock(reinterpret_cast<const char*>(tag), formOfTag(tag)));
     if (!block)
         return img::kNoMemory;
     std::memcpy(block->reserved, reserved, sizeof block->reserved);

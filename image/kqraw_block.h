@@ -10,6 +10,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
+#include <memory>
 
 constexpr std::size_t kKqRawTagSize = 16;
 constexpr std::size_t kKqRawBlockHeaderSize = 36;
@@ -61,6 +62,10 @@ struct KqRawBlock {
 };
 
 void kqrawBlockRelease(KqRawBlock* block) noexcept;
+struct KqRawBlockRelease {
+    void operator()(KqRawBlock* block) const noexcept { kqrawBlockRelease(block); }
+};
+using KqRawBlockPtr = std::unique_ptr<KqRawBlock, KqRawBlockRelease>;
 bool kqrawBlockHasTag(const KqRawBlock* block, const char* tag) noexcept;
 KqRawBlock* kqrawBlockClone(const KqRawBlock* block) noexcept;
 

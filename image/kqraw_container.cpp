@@ -13,11 +13,6 @@
 
 namespace {
 
-struct ContainerRelease {
-    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
-};
-using ContainerPtr = std::unique_ptr<KqRawContainer, ContainerRelease>;
-
 bool isHeaderBlock(const KqRawBlock* block) {
     return kqrawBlockHasTag(block, kqtag::kFileHeader) && block->form == KqRawForm::kOpaque &&
            block->size == kKqRawFileHeaderPayloadSize;
@@ -167,7 +162,7 @@ KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result) noexce
         *result = img::kWrongFormat;
         return nullptr;
     }
-    ContainerPtr container(kqrawContainerCreate());
+    KqRawContainerPtr container(kqrawContainerCreate());
     if (!container || !source.seek(0)) {
         *result = img::kNoMemory;
         return nullptr;

@@ -7,6 +7,7 @@
 #include "image/kqraw_block.h"
 
 #include <cstdint>
+#include <memory>
 
 constexpr int kKqRawMaxBlocks = 100;
 
@@ -20,6 +21,10 @@ struct KqRawContainer {
 KqRawContainer* kqrawContainerCreate() noexcept;
 // Releases every block, then the container. Null is accepted.
 void kqrawContainerRelease(KqRawContainer* container) noexcept;
+struct KqRawContainerRelease {
+    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
+};
+using KqRawContainerPtr = std::unique_ptr<KqRawContainer, KqRawContainerRelease>;
 
 // The three take ownership of `block` when they return true. Set header and
 // set pixels replace (and release) a block already held in that role, else

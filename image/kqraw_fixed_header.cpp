@@ -4,6 +4,7 @@
 #include "image/byte_order.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
+#include "image/malloc_ptr.h"
 #include "image/image_warning.h"
 #include "image/raw_samples.h"
 
@@ -13,15 +14,8 @@
 
 namespace {
 
-struct FreeDeleter {
-    void operator()(void* p) const noexcept { std::free(p); }
-};
-using HeaderPtr = std::unique_ptr<KqRawFixedHeader, FreeDeleter>;
+using HeaderPtr = img::MallocPtr<KqRawFixedHeader>;
 
-struct ContainerRelease {
-    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
-};
-using ContainerPtr = std::unique_ptr<KqRawContainer, ContainerRelease>;
 
 // Reads the header from the start of the source. -4 when the source is shorter.
 int readHeader(img::ByteSource& source, HeaderPtr* header) {
@@ -144,7 +138,7 @@ int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** out) noexcep
     if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2)  // a pixel block size is 32 bits
         return img::kRawBadContainer;
 
-    ContainerPtr container(kqrawContainerCreate());
+    KqRawContainerPtr container(kqrawContainerCreate());
     KqRawBlock* headerBlock = kqrawBlockCreateHeader();
     if (!container || !headerBlock || !kqrawContainerSetHeader(container.get(), headerBlock)) {
         kqrawBlockRelease(headerBlock);

@@ -3,25 +3,18 @@
 #include "image/byte_order.h"
 #include "image/bayer_code.h"
 #include "image/image_result.h"
+#include "image/malloc_ptr.h"
 #include "image/raw_samples.h"
 
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 
-namespace {
-
-struct FreeDeleter {
-    void operator()(void* p) const noexcept { std::free(p); }
-};
-
-} // namespace
-
 int nkrawRead(img::ByteSource& source, ImageBuffer** out) noexcept {
     *out = nullptr;
     if (source.size() < kNkRawHeaderSize)
         return img::kWrongFormat;
-    std::unique_ptr<std::uint8_t, FreeDeleter> header(
+    img::MallocPtr<std::uint8_t> header(
         static_cast<std::uint8_t*>(std::malloc(kNkRawHeaderSize)));
     if (!header)
         return img::kNoMemory;

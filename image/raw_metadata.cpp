@@ -7,13 +7,6 @@
 #include <memory>
 
 namespace img {
-namespace {
-
-struct ContainerRelease {
-    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
-};
-
-} // namespace
 
 MetadataCopy copyRawMetadata(ImageBuffer* target, const ImageBuffer* source) noexcept {
     if (target->fileType != kFileNone)
@@ -26,7 +19,7 @@ MetadataCopy copyRawMetadata(ImageBuffer* target, const ImageBuffer* source) noe
     }
     const auto* blocks = static_cast<const KqRawContainer*>(source->rawHeader);
     if (blocks) {
-        std::unique_ptr<KqRawContainer, ContainerRelease> container(kqrawContainerCreate());
+        KqRawContainerPtr container(kqrawContainerCreate());
         KqRawBlock* header = kqrawBlockCreateHeader();
         if (!container || !header || !kqrawContainerSetHeader(container.get(), header)) {
             kqrawBlockRelease(header);

@@ -14,15 +14,10 @@
 namespace img {
 namespace {
 
-struct ContainerRelease {
-    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
-};
-using ContainerPtr = std::unique_ptr<KqRawContainer, ContainerRelease>;
-
 // The image of a container: the pixel block hands its samples over rather
 // than copying them (the raw writer always builds a new pixel block from the
 // image), and the container stays with the image as its raw header.
-int imageOfContainer(ContainerPtr container, ImageBuffer** out) {
+int imageOfContainer(KqRawContainerPtr container, ImageBuffer** out) {
     if (container->headerIndex < 0 || container->pixelIndex < 0)
         return kRawBadContainer;
     const KqRawBlock* header = container->blocks[container->headerIndex];
@@ -55,7 +50,7 @@ int imageOfContainer(ContainerPtr container, ImageBuffer** out) {
 
 int readContainer(ByteSource& source, ImageBuffer** out) {
     int rc = kOk;
-    ContainerPtr container(kqrawContainerParse(source, &rc));
+    KqRawContainerPtr container(kqrawContainerParse(source, &rc));
     if (!container)
         return rc;
     return imageOfContainer(std::move(container), out);

@@ -3,6 +3,7 @@
 #include "image/bayer_code.h"
 #include "image/byte_order.h"
 #include "image/image_result.h"
+#include "image/malloc_ptr.h"
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
 #include "image/nkraw.h"
@@ -14,16 +15,6 @@
 #include <memory>
 
 namespace {
-
-struct FreeDeleter {
-    void operator()(void* p) const noexcept { std::free(p); }
-};
-struct BlockRelease {
-    void operator()(KqRawBlock* block) const noexcept { kqrawBlockRelease(block); }
-};
-struct ContainerRelease {
-    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
-};
 
 // RAW, RAW_CFA, UINT16, no black level or lower clip, and one white level
 // (equal to the upper clip) on every channel.
@@ -53,7 +44,7 @@ int writeFixRaw(std::FILE* file, const ImageBuffer* image) {
 }
 
 int writeKqRaw(std::FILE* file, const ImageBuffer* image) {
-    std::unique_ptr<KqRawFixedHeader, FreeDeleter> header(kqrawFixedHeaderCreate());
+    img::MallocPtr<KqRawFixedHeader> header(kqrawFixedHeaderCreate());
     if (!header)
         return img::kNoMemory;
     if (image->fileType == kFileKqRaw && image->rawHeader) {
@@ -83,7 +74,7 @@ int writeKqRaw2(std::FILE* file, const ImageBuffer* image) {
     const KqRawContainer* own = image->fileType == kFileKqRaw2
                                     ? static_cast<const KqRawContainer*>(image->rawHeader)
                                     : nullptr;
-    std::unique_ptr<KqRawContainer, ContainerRelease> empty;
+    KqRawContainerPtr empty;
     if (!own) {
         empty.reset(kqrawContainerCreate());
         if (!empty)
@@ -92,7 +83,7 @@ int writeKqRaw2(std::FILE* file, const ImageBuffer* image) {
     }
     // The image's container is left as it is: the new header and pixel
     // blocks are written in place of its own.
-    std::unique_ptr<KqRawBlock, BlockRelease> header(
+    KqRawBlockPtr header(
         own->headerIndex >= 0 ? kqrawBlockClone(own->blocks[own->headerIndex])
                               : kqrawBlockCreateHeader());
     if (!header)
