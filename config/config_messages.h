@@ -26,4 +26,15 @@ inline constexpr char kKeyIndexTooLarge[] =
 inline constexpr char kTooManyEntries[] =
     "Failed to parse configuration file parameters, more than 262144 new entries:";
 
+// Parameter table
+inline constexpr char kValueSpecifiedFor[] = "Value specified for ";
+inline constexpr char kTooLow[] = " is too low, value must be between ";
+inline constexpr char kTooHigh[] = " is too high, value must be between ";
+inline constexpr char kAnd[] = " and ";
+inline constexpr char kEmptyBlockName[] = "Empty string not allowed for shared.block_name.";
+inline constexpr char kBadBlockName[] =
+    "Value for shared.block_name may only consist of letters, digits, dashes, and underscores "
+    "and must start with a letter.";
+inline constexpr char kInvalidDate[] = "Invalid ISO 8601 date value (must be YYYY-MM-DDTHH:MM).";
+
 } // namespace config::msg
