@@ -37,4 +37,12 @@ inline constexpr char kBadBlockName[] =
     "and must start with a letter.";
 inline constexpr char kInvalidDate[] = "Invalid ISO 8601 date value (must be YYYY-MM-DDTHH:MM).";
 
+// Fit settings
+inline constexpr char kNoDeltaAbBlocksPrefix[] = "The image size (";
+inline constexpr char kNoDeltaAbBlocksSuffix[] =
+    ") gives no usable delta ab block counts; set apply_lsc.delta_ab_blocks in the configuration "
+    "file.";
+inline constexpr char kZeroBitDepth[] =
+    "The image bit depth is 0; set shared.bit_res in the configuration file.";
+
 } // namespace config::msg
