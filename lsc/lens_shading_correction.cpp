@@ -60,6 +60,15 @@ void applyLensShading(ProcessingContext& context) {
         for (int dx = 0; dx < 2; ++dx)
             channelAt[dy][dx] =
                 bayerChannel(static_cast<unsigned>(dx), static_cast<unsigned>(dy), phase);
+    // The row cubics of every patch of every channel, built once: the
+    // per-pixel work is then one patch evaluation from them (same arithmetic
+    // as evalPatch on the grid).
+    PatchCubics cubics[kChannels][9];
+    for (int k = 0; k < kChannels; ++k)
+        for (std::uint32_t patch = 0; patch < 9; ++patch)
+            cubics[k][patch] =
+                patchCubics(context.controlGrids[k], patchStart(patch / 3, patch % 3));
+
     const float black = context.blackLevel;
     const float* const src = in.pixels;
     float* const dst = static_cast<float*>(out->data);
@@ -72,16 +81,19 @@ void applyLensShading(ProcessingContext& context) {
     for (std::uint32_t yo = 0; yo < outHeight; yo += 2) {
         const std::uint32_t y = static_cast<std::uint32_t>(yo * step);
         const AxisPosition row = axisPosition(y, breaks.y);
+        float weights[4];
+        cubicWeights(row.local, weights);
         for (std::uint32_t xo = 0; xo < outWidth; xo += 2) {
             const std::uint32_t x = static_cast<std::uint32_t>(xo * step);
             const AxisPosition column = axisPosition(x, breaks.x);
-            const std::uint32_t start = patchStart(row.patch, column.patch);
+            const std::uint32_t patch = row.patch * 3 + column.patch;
+            const float u = column.local, u2 = u * u, u3 = u2 * u;
             for (int dy = 0; dy < 2; ++dy) {
                 const float* inRow = src + (y + dy) * inStride + x;
                 float* outRow = dst + (yo + dy) * outStride + xo;
                 for (int dx = 0; dx < 2; ++dx) {
-                    const float gain = evalPatch(context.controlGrids[channelAt[dy][dx]], start,
-                                                 column.local, row.local);
+                    const float gain =
+                        evalPatchCubics(cubics[channelAt[dy][dx]][patch], u, u2, u3, weights);
                     outRow[dx] = gain * (inRow[dx] - black);
                 }
             }

@@ -177,4 +177,36 @@ TEST(EvalPatch, AgreesWithTheBernsteinFormAndHitsTheCorners) {
         }
 }
 
+// The documented single-precision form, written out term by term.
+float powerForm(const float* g, std::uint32_t start, float u, float v) {
+    const float w = 1.0f - v;
+    const float weights[4] = {w * w * w, 3.0f * v * w * w, 3.0f * v * v * w, v * v * v};
+    float sum = 0.0f;
+    for (std::uint32_t r = 0; r < 4; ++r) {
+        const float* p = g + start + r * 10;
+        sum += weights[r] * (p[0] + 3.0f * (p[1] - p[0]) * u +
+                             3.0f * (p[0] - 2.0f * p[1] + p[2]) * (u * u) +
+                             (p[3] - p[0] + 3.0f * p[1] - 3.0f * p[2]) * (u * u * u));
+    }
+    return sum;
+}
+
+TEST(EvalPatch, BothEvaluationPathsGiveTheBitsOfThePowerForm) {
+    float grid[100];
+    for (int i = 0; i < 100; ++i)
+        grid[i] = 0.3f + 0.137f * static_cast<float>((i * 53) % 17);
+    for (std::uint32_t patch = 0; patch < 9; ++patch) {
+        const std::uint32_t start = patchStart(patch / 3, patch % 3);
+        const PatchCubics cubics = patchCubics(grid, start);
+        for (float u : {0.0f, 0.013f, 0.37f, 0.999f})
+            for (float v : {0.0f, 0.25f, 0.61f, 1.0f}) {
+                const float expected = powerForm(grid, start, u, v);
+                EXPECT_EQ(evalPatch(grid, start, u, v), expected);
+                float weights[4];
+                cubicWeights(v, weights);
+                EXPECT_EQ(evalPatchCubics(cubics, u, u * u, u * u * u, weights), expected);
+            }
+    }
+}
+
 } // namespace
