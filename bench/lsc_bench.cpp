@@ -1,0 +1,97 @@
+// Timings of the lens-shading surface: the least-squares fit of one channel,
+// the whole fit of four channels and the correction of a 12-megapixel image.
+
+#include <cmath>
+#include <cstdint>
+#include <sstream>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+
+#include "image/image_buffer.h"
+#include "lsc/lens_shading_correction.h"
+#include "lsc/lens_shading_fit.h"
+#include "lsc/patch_surface.h"
+#include "lsc/processing_context.h"
+#include "lsc/sample_collection.h"
+
+namespace {
+
+// A lens-like flat field: each channel falls to about half at the corners.
+float flatField(int x, int y, int width, int height) {
+    const double dx = (x - width / 2.0) / (width / 2.0);
+    const double dy = (y - height / 2.0) / (height / 2.0);
+    const double r2 = 0.5 * (dx * dx + dy * dy);
+    const double channel[4] = {0.45, 0.8, 0.8, 0.55};
+    return static_cast<float>(channel[(x & 1) + (y & 1) * 2] / ((1 + 0.41 * r2) * (1 + 0.41 * r2)));
+}
+
+void makeFlatImage(ProcessingContext& context, int width, int height) {
+    int rc = 0;
+    context.image.reset(imageCreate(width, height, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
+                                    kDataReal32, &rc));
+    float* p = context.image.pixels();
+    for (int y = 0; y < height; ++y)
+        for (int x = 0; x < width; ++x)
+            p[static_cast<std::size_t>(y) * width + x] = flatField(x, y, width, height);
+}
+
+// The prepared image of a 4000 x 3000 sensor after down-sampling by 4 in
+// each plane, sampled with an angle step of 8 degrees (the default) or finer.
+ProcessingContext collectedContext(int angleStep) {
+    ProcessingContext context;
+    makeFlatImage(context, 1000, 750);
+    context.sampleAngleStep = angleStep;
+    context.procSamplingFactor = 4;
+    context.quiet = true;
+    std::ostringstream messages;
+    collectSamples(context, messages);
+    return context;
+}
+
+void BM_PatchFitOneChannel(benchmark::State& state) {
+    const ProcessingContext collected = collectedContext(8);
+    const std::vector<double> xBreaks = {0, 250, 750, 1000}, yBreaks = {0, 187, 562, 750};
+    std::ostringstream messages;
+    for (auto _ : state) {
+        patchSurface surface(3, 3, xBreaks, yBreaks);
+        for (const shadingSample& s : collected.samples)
+            surface.addValueConstraint(s.x, s.y, 1.0 / s.value[0]);
+        surface.fit(1e-10, messages);
+        benchmark::DoNotOptimize(surface.global(5, 5));
+    }
+    state.counters["samples"] = static_cast<double>(collected.samples.size());
+}
+BENCHMARK(BM_PatchFitOneChannel)->Unit(benchmark::kMillisecond);
+
+void BM_FitLensShading(benchmark::State& state) {
+    ProcessingContext context = collectedContext(static_cast<int>(state.range(0)));
+    const std::vector<shadingSample> measured = context.samples;
+    std::ostringstream messages;
+    for (auto _ : state) {
+        context.samples = measured; // the fit turns them into gains
+        fitLensShading(context, messages);
+        benchmark::DoNotOptimize(context.controlGrids[0][0]);
+    }
+    state.counters["samples"] = static_cast<double>(measured.size());
+}
+BENCHMARK(BM_FitLensShading)->Arg(8)->Arg(2)->Unit(benchmark::kMillisecond);
+
+void BM_ApplyLensShading12MP(benchmark::State& state) {
+    ProcessingContext context;
+    makeFlatImage(context, 4000, 3000);
+    for (int k = 0; k < kChannels; ++k)
+        for (int i = 0; i < kGridPoints; ++i)
+            context.controlGrids[k][i] = 1.0f + 0.01f * static_cast<float>(i % 13);
+    context.applyStep = static_cast<unsigned>(state.range(0));
+    for (auto _ : state) {
+        applyLensShading(context);
+        benchmark::DoNotOptimize(context.corrected.pixels()[0]);
+    }
+    const double pixels = 4000.0 * 3000.0 / (state.range(0) * state.range(0));
+    state.counters["pixels/s"] =
+        benchmark::Counter(pixels, benchmark::Counter::kIsIterationInvariantRate);
+}
+BENCHMARK(BM_ApplyLensShading12MP)->Arg(1)->Arg(4)->Unit(benchmark::kMillisecond);
+
+} // namespace
