@@ -1,6 +1,6 @@
 #include "prep/delta_ab.h"
 
-#include "prep/bayer_phase.h"
+#include "lsc/bayer_phase.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 
@@ -13,6 +13,12 @@ namespace prep {
 namespace {
 
 constexpr float kGamma = 0.45454544f;  // 1 / 2.2
+
+// Offset (dx, dy) within each 2 x 2 block of the pixel of `channel`.
+void channelOffset(int channel, int phase, int& dx, int& dy) {
+    dx = (channel & 1) ^ (phase & 1);
+    dy = ((channel >> 1) & 1) ^ ((phase >> 1) & 1);
+}
 
 struct Rgb {
     float r = 0.0f, g = 0.0f, b = 0.0f;

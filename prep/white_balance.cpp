@@ -1,7 +1,7 @@
 #include "prep/white_balance.h"
 
-#include "prep/bayer_phase.h"
-#include "prep/box_filtered_levels.h"
+#include "lsc/bayer_phase.h"
+#include "lsc/target_levels.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 
@@ -29,7 +29,7 @@ void centreLevels(const BayerImage& image, float (&levels)[kChannels]) {
     for (std::int32_t y = window.y0; y <= window.y1; ++y) {
         const float* row = image.pixels() + static_cast<std::size_t>(y) * width;
         for (std::int32_t x = window.x0; x <= window.x1; ++x) {
-            const int channel = channelAt(static_cast<std::uint64_t>(x),
+            const int channel = bayerChannel(static_cast<std::uint64_t>(x),
                                           static_cast<std::uint64_t>(y), phase);
             sums[channel] += row[x];
             ++counts[channel];
@@ -77,16 +77,31 @@ void whiteBalance(ProcessingContext& context) {
     const std::size_t height = static_cast<std::size_t>(image.height());
     float* pixel = image.pixels();
     for (std::size_t y = 0; y < height; ++y) {
-        const float rowGains[2] = {gains[channelAt(0, y, phase)], gains[channelAt(1, y, phase)]};
+        const float rowGains[2] = {gains[bayerChannel(0, y, phase)], gains[bayerChannel(1, y, phase)]};
         for (std::size_t x = 0; x < width; ++x, ++pixel)
             *pixel *= rowGains[x & 1];
     }
 }
 
+int boxSide(int filterSize, int samplingFactor) {
+    if (samplingFactor < 1)
+        throw std::invalid_argument(msg::kBadSamplingFactor);
+    const int k = filterSize / (2 * samplingFactor);
+    return k < 1 ? 1 : (k & ~1) | 1;
+}
+
 void measureLevels(float (&levels)[kChannels], const ProcessingContext& context) {
-    requireBayerImage(context.corrected);
-    boxFilteredLevels(context.corrected,
-                      boxSide(context.awbFilterSize, context.procSamplingFactor), levels);
+    const BayerImage& image = context.corrected;
+    requireBayerImage(image);
+    // Planes without a pixel would give levels of 0, and the R/G and B/G
+    // ratios reported from them would divide by zero.
+    if (image.width() < 2 || image.height() < 2)
+        throw std::runtime_error(msg::kImageTooSmallForLevels);
+    // The same rule as the target levels of the fit; it only reads the pixels.
+    const WorkingImage view{static_cast<std::uint32_t>(image.width()),
+                            static_cast<std::uint32_t>(image.height()), image.cfa(),
+                            const_cast<float*>(image.pixels())};
+    targetLevelsOf(view, boxSide(context.awbFilterSize, context.procSamplingFactor), levels);
 }
 
 } // namespace prep

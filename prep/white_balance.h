@@ -23,9 +23,16 @@ CentreWindow centreWindow(std::int32_t width, std::int32_t height);
 // not positive, leaving the image as it was.
 void whiteBalance(ProcessingContext& context);
 
+// Odd box side for a filter size given in full-resolution pixels, on planes of
+// an image prepared with `samplingFactor`: k = filterSize / (2 * factor), made
+// odd by setting its lowest bit; at least 1.
+int boxSide(int filterSize, int samplingFactor);
+
 // The four channel levels of context.corrected: each channel's half-resolution
 // plane smoothed by a box mean (odd side from lsc.awb_avg_filter_size and the
-// preparation sampling factor, shrinking at the borders), its largest value.
+// preparation sampling factor, shrinking at the borders), its largest value;
+// the rule of the fit's target levels. Throws std::runtime_error for an image
+// smaller than 2 x 2.
 void measureLevels(float (&levels)[kChannels], const ProcessingContext& context);
 
 } // namespace prep

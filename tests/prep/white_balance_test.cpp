@@ -1,6 +1,5 @@
 #include "prep/white_balance.h"
 
-#include "prep/box_filtered_levels.h"
 #include "test_images.h"
 
 #include <stdexcept>
