@@ -1,5 +1,6 @@
 #include "prep/bayer_planes.h"
 
+#include "image/image_messages.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 
@@ -118,7 +119,7 @@ BayerImage weave(const BayerImage& planes, int p, std::uint32_t cfa0, std::uint3
     const std::int64_t width = std::int64_t{planes.width()} * p;
     const std::int64_t height = std::int64_t{planes.height()} * p;
     if (width > INT32_MAX || height > INT32_MAX)
-        throw std::runtime_error(msg::kImageAllocation);
+        throw std::runtime_error(img::msg::kCannotAllocateImage);
 
     BayerImage mosaic = createFloatImage(static_cast<std::int32_t>(width),
                                          static_cast<std::int32_t>(height), planes.bitsPerSample(),

@@ -1,5 +1,6 @@
 #include "prep/prep_image.h"
 
+#include "image/image_messages.h"
 #include "prep/prep_messages.h"
 
 #include <stdexcept>
@@ -14,7 +15,7 @@ BayerImage createFloatImage(std::int32_t width, std::int32_t height, std::uint16
     image.reset(imageCreate(width, height, bitsPerSample, channels, 1, cfa0, cfa1, pixelType,
                             bufferType, kDataReal32, &result));
     if (image.empty())
-        throw std::runtime_error(msg::kImageAllocation);
+        throw std::runtime_error(img::msg::kCannotAllocateImage);
     return image;
 }
 

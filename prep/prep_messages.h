@@ -7,7 +7,6 @@ namespace prep::msg {
 // Planes, filter and down-sampling
 inline constexpr char kInvalidWeaveFormat[] = "Invalid image format for Bayer interweaving.";
 inline constexpr char kInvalidWeavePattern[] = "Invalid pattern size for Bayer interweaving.";
-inline constexpr char kImageAllocation[] = "Unable to allocate image memory.";
 inline constexpr char kNotFloatImage[] = "Image preparation needs a floating-point image.";
 inline constexpr char kNotBayerImage[] = "The flattened image must be a single-channel Bayer image.";
 inline constexpr char kBadSamplingFactor[] = "The down-sampling factor must be at least 1.";
