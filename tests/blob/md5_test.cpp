@@ -1,5 +1,7 @@
 #include "blob/md5.h"
 
+#include "reference_md5.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdio>
@@ -39,6 +41,14 @@ TEST(Md5, MatchesTheReferenceVectors) {
 
 TEST(Md5, EmptyRangeNeedsNoData) {
     EXPECT_EQ(hex(md5(nullptr, 0)), "d41d8cd98f00b204e9800998ecf8427e");
+}
+
+TEST(Md5, AgreesWithAnIndependentComputationForEveryLengthAroundTheBlockSize) {
+    std::vector<std::uint8_t> data;
+    for (std::size_t length = 0; length < 200; ++length) {
+        EXPECT_EQ(md5(data.data(), data.size()), test::referenceMd5(data)) << length;
+        data.push_back(static_cast<std::uint8_t>(length * 37 + 11));
+    }
 }
 
 TEST(Md5, CoversEveryByteOfALongBinaryInput) {
