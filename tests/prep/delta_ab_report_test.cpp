@@ -59,14 +59,6 @@ TEST(DeltaFile, WrittenByteForByte) {
               "0.50000,1.25000,2.00000,\n0.00000,10.12346,0.00000,\n\n");
 }
 
-TEST(DeltaFile, ReplacesExistingFile) {
-    TempDir dir;
-    testing_support::writeFile(dir.file("delta.csv"), std::string(1000, 'x'));
-    prep::writeDeltaFile(dir.file("delta.csv"), results());
-    EXPECT_EQ(testing_support::readFile(dir.file("delta.csv")),
-              prep::formatDeltaFile(results()));
-}
-
 TEST(DeltaFile, UnopenablePathThrowsString) {
     TempDir dir;
     const std::string path = dir.file("no/such/dir/delta.csv");
@@ -88,12 +80,6 @@ TEST(StatsFile, UnopenablePathThrowsString) {
     const std::string path = dir.file("no/stats.csv");
     EXPECT_EQ(stringThrown([&] { prep::writeStatsFile(path, results()); }),
               "Cannot open file : " + path);
-}
-
-TEST(StatsFile, Written) {
-    TempDir dir;
-    prep::writeStatsFile(dir.file("stats.csv"), results());
-    EXPECT_EQ(testing_support::readFile(dir.file("stats.csv")), "1.5, 2.25, 0.333333\n");
 }
 
 TEST(DeltaThreshold, EqualPasses) {
