@@ -4,7 +4,6 @@
 
 #include <gtest/gtest.h>
 
-#include <set>
 #include <stdexcept>
 #include <string>
 
@@ -360,45 +359,6 @@ TEST_F(BlobParser, PairCountRunningPastTheBlobIsTruncated) {
     EXPECT_EQ(failure(BlobBuilder().block(kFocusBlock, block).build()),
               "Binary calibration data is corrupt or truncated.");
     EXPECT_FALSE(calibration.find("module").valid());
-}
-
-// ---- Every single-byte change ----
-
-TEST_F(BlobParser, AnyChangedByteIsAcceptedOrRefusedWithAKnownMessage) {
-    Focus focus;
-    focus.pairs = {{1, 2}};
-    const Bytes blob = BlobBuilder()
-                           .block(kTrackingBlock, test::trackingBlock({0x12, 0x34}))
-                           .block(kToolBlock, tool())
-                           .block(kLscBlock, test::lscBlock(0, 3, 8, [](int n) { return n; }))
-                           .block(kAwbBlock, test::awbBlock(0, 1, 2, 3, 4))
-                           .block(kFocusBlock, test::focusBlock(focus))
-                           .build();
-    const std::set<std::string> known = {
-        "Binary calibration data is corrupt.",
-        "Binary calibration data is corrupt or truncated.",
-        "Magic number does not match.",
-        "Wrong blob version.",
-        "Two different light sources in lens shading data.",
-        "Bad CRC value",
-        "Unknown header type found.",
-        "Compressed data values larger than 32 bits are not supported.",
-    };
-    for (std::size_t i = 0; i < blob.size(); ++i) {
-        for (std::uint8_t flip : {0x01, 0x80, 0xFF}) {
-            Bytes changed = blob;
-            changed[i] ^= flip;
-            config_node_impl scratch("scratch");
-            try {
-                parseBlob(changed.data(), changed.size(), scratch.child("c"), scratch.child("k"));
-            } catch (const std::runtime_error& e) {
-                const std::string message = e.what();
-                EXPECT_TRUE(known.count(message) ||
-                            message.rfind("Invalid config file date: ", 0) == 0)
-                    << "byte " << i << ": " << message;
-            }
-        }
-    }
 }
 
 } // namespace

@@ -411,24 +411,5 @@ TEST_F(BlobWriter, MoreThan255PairsAreRefused) {
                          "than the binary calibration data can hold.");
 }
 
-// ---- What the tool writes, it reads ----
-
-TEST_F(BlobWriter, ParserAcceptsEveryBlockTheWriterMakes) {
-    set("shared.light_source", "-1");
-    set("reference.serial_no", "0a1b");
-    setGrids("reference.", [](int c, int i, int j) { return 1.0f + 0.01f * (c + i * j); });
-    for (const char* name : {"R", "GR", "GB", "B"})
-        set(std::string("reference.") + name, "700");
-    setFocus(0, "'H'", 2);
-    const Bytes blob = generate();
-    config_node_impl back("root");
-    const BlobVersions versions =
-        parseBlob(blob.data(), blob.size(), back.child("calibration"), back.child("config"));
-    EXPECT_EQ(versions.tool, version);
-    EXPECT_EQ(back.find_path("config.shared.light_source").as_string(), "-1");
-    EXPECT_EQ(back.find_path("calibration.module.af.set[0].posture").as_string(), "H");
-    EXPECT_EQ(back.find_path("config.shared.cfg_file_date").as_string(), "2012-05-01T10:30");
-}
-
 } // namespace
 } // namespace blob
