@@ -112,7 +112,8 @@ void downsample(const BayerImage& planes, int factor, BayerImage& target) {
 
 BayerImage weave(const BayerImage& planes, int p, std::uint32_t cfa0, std::uint32_t cfa1) {
     requireFloatImage(planes);
-    if (p < 1 || planes.channels() != p * p)
+    // p above 255 cannot match a 16-bit channel count (and p * p could overflow).
+    if (p < 1 || p > 255 || planes.channels() != p * p)
         throw std::invalid_argument(msg::kInvalidWeaveFormat);
     if (patternSize(cfa0, cfa1) != p)
         throw std::invalid_argument(msg::kInvalidWeavePattern);

@@ -124,6 +124,12 @@ TEST(Weave, RefusesWrongChannelCount) {
     }
 }
 
+TEST(Weave, RefusesAbsurdPatternSize) {
+    BayerImage planes = makeImage(4, 4, 4);
+    EXPECT_THROW(prep::weave(planes, 65536, 0, kCfaRggb), std::invalid_argument);
+    EXPECT_THROW(prep::weave(planes, 0, 0, kCfaRggb), std::invalid_argument);
+}
+
 TEST(Weave, RefusesPatternOfOtherSize) {
     BayerImage planes = makeImage(4, 4, 4);
     try {
