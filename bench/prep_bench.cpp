@@ -1,14 +1,13 @@
 // Image preparation at sensor size: a 12-megapixel (4000 x 3000) RGGB capture
 // through split, 3 x 3 median filter with down-sampling by 4 and re-weave, as
-// a run with default settings does; beside it the least a load must do (read
-// the 16-bit samples from a file and normalise them), for comparison.
+// a run with default settings does; beside it the load of the same capture.
 
 #include "image/image_buffer.h"
 #include "prep/bayer_planes.h"
 #include "prep/median_filter.h"
+#include "tests/support/flat_field.h"
 
 #include <cstdint>
-#include <cstdio>
 #include <string>
 #include <vector>
 
@@ -79,37 +78,27 @@ BENCHMARK(BM_MedianFilterDownsample)
     ->Args({10, 4})
     ->Unit(benchmark::kMillisecond);
 
-// Reading 24 MB of samples and normalising them into a new image: a lower
-// bound for loading, which also parses the container.
-void BM_LoadLowerBound(benchmark::State& state) {
-    const std::vector<std::uint16_t> samples = sensorSamples();
+// Loading the same capture from a KQRAW2 file, for comparison.
+void BM_LoadKqraw2(benchmark::State& state) {
+    testing_support::FlatFieldSpec spec;
+    spec.width = kWidth;
+    spec.height = kHeight;
+    spec.noise = 0.01;
+    const std::string bytes = testing_support::kqraw2FileBytes(testing_support::makeFlatField(spec));
     char path[] = "/tmp/prep_bench_XXXXXX";
     const int fd = mkstemp(path);
-    if (fd < 0) {
-        state.SkipWithError("no temporary file");
+    if (fd < 0 || write(fd, bytes.data(), bytes.size()) != static_cast<ssize_t>(bytes.size())) {
+        state.SkipWithError("cannot write the capture");
         return;
     }
     close(fd);
-    std::FILE* out = std::fopen(path, "wb");
-    std::fwrite(samples.data(), sizeof(std::uint16_t), samples.size(), out);
-    std::fclose(out);
-    std::vector<std::uint16_t> buffer(samples.size());
     for (auto _ : state) {
-        // Like a load, every pass fills a new float image.
-        std::FILE* in = std::fopen(path, "rb");
-        const std::size_t got = std::fread(buffer.data(), sizeof(std::uint16_t), buffer.size(), in);
-        std::fclose(in);
-        int result = 0;
         BayerImage image;
-        image.reset(imageCreate(kWidth, kHeight, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
-                                kDataReal32, &result));
-        float* normalised = image.pixels();
-        for (std::size_t i = 0; i < got; ++i)
-            normalised[i] = static_cast<float>(buffer[i] & 1023) / 1023.0f;
-        benchmark::DoNotOptimize(normalised);
+        image.read(path);
+        benchmark::DoNotOptimize(image.pixels());
     }
     unlink(path);
 }
-BENCHMARK(BM_LoadLowerBound)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_LoadKqraw2)->Unit(benchmark::kMillisecond);
 
 } // namespace
