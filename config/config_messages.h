@@ -45,4 +45,20 @@ inline constexpr char kNoDeltaAbBlocksSuffix[] =
 inline constexpr char kZeroBitDepth[] =
     "The image bit depth is 0; set shared.bit_res in the configuration file.";
 
+// Calibration register file
+inline constexpr char kCannotWriteCalibration[] =
+    "Unable to open output calibration file, possible invalid output path or output filename "
+    "specified.";
+inline constexpr char kBadExportedGeometryPrefix[] = "Patch geometry of the ";
+inline constexpr char kBadExportedGeometryMiddle[] = " image gives patch sizes ";
+inline constexpr char kBadExportedGeometrySuffix[] =
+    "; every patch must be at least 2 pixels wide and high.";
+inline constexpr char kNonFiniteControlPointPrefix[] = "Control point ";
+inline constexpr char kNonFiniteControlPointSuffix[] = " is not a finite number: ";
+inline constexpr char kNonFiniteLevelPrefix[] = "Target level of the ";
+inline constexpr char kNonFiniteLevelSuffix[] = " channel is not a finite number.";
+inline constexpr char kQuoteInSerial[] =
+    "The module serial number contains a double quote and cannot be written to the calibration "
+    "file.";
+
 } // namespace config::msg
