@@ -64,6 +64,7 @@ TEST_F(LensShadingFit, FlatFieldGivesUnitGainsAndTheProgressLines) {
 
 TEST_F(LensShadingFit, FalloffLineShowsEachCheckPointAgainstItsWantedValue) {
     makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    context.sampleAngleStep = 8;
     context.quiet = true;
     collectSamples(context, messages);
     context.quiet = false;
@@ -85,6 +86,7 @@ TEST_F(LensShadingFit, QuietPrintsNothing) {
 
 TEST_F(LensShadingFit, SmallestGainOfEachChannelBecomesOne) {
     makeImage(context, 160, 120, kCfaRggb, vignetted);
+    context.sampleAngleStep = 8;
     context.quiet = true;
     collectSamples(context, messages);
     fitLensShading(context, messages);
@@ -112,6 +114,7 @@ TEST_F(LensShadingFit, GreenBalanceKeepsAbsoluteGainsAgainstTheBrighterGreen) {
 
 TEST_F(LensShadingFit, AveragedChannelsShareOneGrid) {
     makeImage(context, 160, 120, kCfaRggb, vignetted);
+    context.sampleAngleStep = 8;
     context.quiet = true;
     collectSamples(context, messages);
     context.averageChannels = true;
