@@ -61,4 +61,20 @@ inline constexpr char kQuoteInSerial[] =
     "The module serial number contains a double quote and cannot be written to the calibration "
     "file.";
 
+// Patch geometry check of calibration data
+inline constexpr char kImageNotSet[] = "Input image not set before call to readConfigParam";
+inline constexpr char kMissingPatchSizes[] =
+    "Missing some patch size information from calibration file.";
+inline constexpr char kConfigWithoutLegacyDataWithLegacy[] =
+    "Unsupported use of configuration file without legacy patch boundaries and calibration data "
+    "with legacy patch boundaries.";
+inline constexpr char kConfigWithLegacyDataWithout[] =
+    "Unsupported use of configuration file with legacy patch boundaries and calibration data "
+    "without legacy patch boundaries.";
+inline constexpr char kMismatchMiddle[] = " from input data does not match lsc.";
+inline constexpr char kMismatchSuffix[] = " in configuration file.";
+inline constexpr char kDimensionsPrefix[] = "Input image dimensions (";
+inline constexpr char kDimensionsMiddle[] = ") do not match expected dimensions for sensor (";
+inline constexpr char kDimensionsSuffix[] = ").";
+
 } // namespace config::msg

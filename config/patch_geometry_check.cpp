@@ -1,0 +1,128 @@
+#include "config/patch_geometry_check.h"
+
+#include "config/config_messages.h"
+#include "config/value_text.h"
+
+#include <stdexcept>
+#include <string>
+
+namespace {
+
+constexpr const char* kLegacyKeys[] = {"leftPatchWidth", "centerPatchWidth", "topPatchHeight",
+                                       "middlePatchHeight"};
+constexpr const char* kFactorKeys[] = {"leftPatchFactor", "centerPatchFactor", "topPatchFactor",
+                                       "middlePatchFactor"};
+// The configuration's names for the legacy sizes, in the order of kLegacyKeys.
+constexpr const char* kConfigLegacyKeys[] = {"left_patch_width", "center_patch_width",
+                                             "top_patch_height", "middle_patch_height"};
+constexpr const char* kControlPointKeys[kChannels] = {"controlPointR", "controlPointGR",
+                                                      "controlPointGB", "controlPointB"};
+constexpr const char* kWhiteBalanceKeys[kChannels] = {"R", "GR", "GB", "B"};
+
+template <std::size_t N>
+bool anyInitialized(const config_node& data, const char* const (&keys)[N]) {
+    for (const char* key : keys)
+        if (data.find(key).initialized())
+            return true;
+    return false;
+}
+
+template <std::size_t N>
+bool allInitialized(const config_node& data, const char* const (&keys)[N]) {
+    for (const char* key : keys)
+        if (!data.find(key).initialized())
+            return false;
+    return true;
+}
+
+// "<key> from input data does not match lsc.<key> in configuration file."
+[[noreturn]] void throwMismatch(const char* key) {
+    throw std::runtime_error(std::string(key) + config::msg::kMismatchMiddle + key +
+                             config::msg::kMismatchSuffix);
+}
+
+void setFractions(ProcessingContext& context, const double (&fractions)[4]) {
+    context.leftFraction = fractions[0];
+    context.centerFraction = fractions[1];
+    context.topFraction = fractions[2];
+    context.middleFraction = fractions[3];
+}
+
+void readLegacyGeometry(const config_node& lsc, const config_node& data, float width, float height,
+                        ProcessingContext& context) {
+    if (!allInitialized(data, kLegacyKeys))
+        throw std::runtime_error(config::msg::kMissingPatchSizes);
+    int sizes[4];
+    for (int i = 0; i < 4; ++i)
+        sizes[i] = data.find(kLegacyKeys[i]).as_int();
+    setFractions(context, {static_cast<float>(sizes[0]) / width, static_cast<float>(sizes[1]) / width,
+                           static_cast<float>(sizes[2]) / height,
+                           static_cast<float>(sizes[3]) / height});
+    if (lsc.find("left_patch_width").is_default()) {
+        if (!lsc.find("leftPatchFactor").is_default())
+            throw std::runtime_error(config::msg::kConfigWithoutLegacyDataWithLegacy);
+        return;
+    }
+    for (int i = 0; i < 4; ++i)
+        if (lsc.find(kConfigLegacyKeys[i]).as_int() != sizes[i])
+            throwMismatch(kLegacyKeys[i]);
+}
+
+void readFactorGeometry(const config_node& lsc, const config_node& data, std::int32_t width,
+                        std::int32_t height, ProcessingContext& context) {
+    if (!allInitialized(data, kFactorKeys) || !data.find("imageWidth").initialized() ||
+        !data.find("imageHeight").initialized())
+        throw std::runtime_error(config::msg::kMissingPatchSizes);
+    float factors[4];
+    for (int i = 0; i < 4; ++i)
+        factors[i] = data.find(kFactorKeys[i]).as_float();
+    setFractions(context, {factors[0], factors[1], factors[2], factors[3]});
+    const int dataWidth = data.find("imageWidth").as_int();
+    const int dataHeight = data.find("imageHeight").as_int();
+    if (dataWidth != width || dataHeight != height)
+        throw std::range_error(config::msg::kDimensionsPrefix + integerText(width) + "x" +
+                               integerText(height) + config::msg::kDimensionsMiddle +
+                               integerText(dataWidth) + "x" + integerText(dataHeight) +
+                               config::msg::kDimensionsSuffix);
+    if (lsc.find("leftPatchFactor").is_default()) {
+        if (!lsc.find("left_patch_width").is_default())
+            throw std::runtime_error(config::msg::kConfigWithLegacyDataWithout);
+        return;
+    }
+    for (int i = 0; i < 4; ++i)
+        if (lsc.find(kFactorKeys[i]).as_float() != factors[i])
+            throwMismatch(kFactorKeys[i]);
+    if (lsc.find("imageWidth").as_int() != dataWidth)
+        throwMismatch("imageWidth");
+    if (lsc.find("imageHeight").as_int() != dataHeight)
+        throwMismatch("imageHeight");
+}
+
+} // namespace
+
+void readConfigParam(const config_node& root, const config_node& data, ProcessingContext& context) {
+    if (context.image.empty())
+        throw std::runtime_error(config::msg::kImageNotSet);
+    const std::int32_t width = context.image.width();
+    const std::int32_t height = context.image.height();
+    const config_node& lsc = root.find("config").find("lsc");
+
+    if (anyInitialized(data, kLegacyKeys))
+        readLegacyGeometry(lsc, data, static_cast<float>(width), static_cast<float>(height),
+                           context);
+    else if (anyInitialized(data, kFactorKeys) || data.find("imageWidth").initialized() ||
+             data.find("imageHeight").initialized())
+        readFactorGeometry(lsc, data, width, height, context);
+
+    if (data.find("controlPointR").valid()) {
+        for (int channel = 0; channel < kChannels; ++channel) {
+            const config_node& grid = data.find(kControlPointKeys[channel]);
+            for (std::size_t n = 0; n < kGridPoints; ++n)
+                context.controlGrids[channel][n] = grid.find(n / 10).find(n % 10).as_float();
+        }
+    }
+    if (data.find("R").valid())
+        for (int channel = 0; channel < kChannels; ++channel)
+            context.whiteBalance[channel] =
+                static_cast<float>(data.find(kWhiteBalanceKeys[channel]).as_int());
+}
