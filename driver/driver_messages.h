@@ -23,4 +23,35 @@ inline constexpr char kInfoFileWrite[] = "ERROR: Unable to write information fil
 inline constexpr char kInfoFileOpen[] = "Unable to output information file.";
 inline constexpr char kInfoFileOpenHint[] = "Likely a file protection issue.";
 
+// Pipeline
+inline constexpr char kMedianTooLarge[] =
+    "The value of proc.median_filter_size in the configuration file is too large.";
+inline constexpr char kNoInput[] = "An input flat field image must be specified.";
+inline constexpr char kDimensionsPrefix[] = "Input image dimensions (";
+inline constexpr char kDimensionsMiddle[] = ") do not match expected dimensions for sensor (";
+inline constexpr char kPixelsWithin[] = "Image pixels within specified parameters.";
+inline constexpr char kIdentityMismatch[] =
+    "WARNING - Not all output image pixels match input image pixels.";
+
+// Headerless raw input
+inline constexpr char kDetailsUnreadable[] = "Unable to read headerless raw image details file.";
+inline constexpr char kDetailsUnreadableHint[] =
+    "Likely incorrect file name of headerless raw image details file specified.";
+inline constexpr char kSerialOdd[] = "Serial number must be an even number of characters: ";
+inline constexpr char kSerialTooLong[] = "Serial number cannot be more than 32 characters long: ";
+inline constexpr char kSerialNotHex[] =
+    "Serial number must consist of hexadecimal digits only: ";
+inline constexpr char kSerialHint[] =
+    "Likely incorrect serial number entered in headerless raw details file.";
+inline constexpr char kRawOpen[] = "Unable to open image file: ";
+inline constexpr char kRawOpenHint[] = "Likely file protection issues or the file doesn't exist.";
+inline constexpr char kRawShortRow[] = "Unable to read raw scan line.";
+inline constexpr char kRawShortRowHint[] =
+    "The number of bytes read in headerless raw file did not match the scan line size. File "
+    "likely truncated.";
+inline constexpr char kRawTooLong[] = "Invalid headerless raw file configuration.";
+inline constexpr char kRawTooLongHint[] =
+    "The number of pixels in the headerless raw file did not match the image size specified in "
+    "the headerless raw configuration file.";
+
 } // namespace msg

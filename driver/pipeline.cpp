@@ -1,16 +1,215 @@
 #include "driver/pipeline.h"
 
+#include "config/config_file.h"
+#include "config/parameter_table.h"
+#include "driver/driver_messages.h"
+#include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
+#include "driver/version.h"
+#include "prep/bayer_planes.h"
+#include "prep/image_checks.h"
+#include "prep/median_filter.h"
 
 #include <boost/date_time/posix_time/posix_time.hpp>
 
 #include <iostream>
+#include <stdexcept>
+
+namespace {
+
+std::ostream& out() {
+    return messageStream;
+}
+
+} // namespace
 
 Pipeline::Pipeline()
     : startTime_(boost::posix_time::microsec_clock::local_time()), timer_(startStageTimer()) {}
 
 int Pipeline::run(int argc, const char* const argv[]) {
     commandLine_ = CommandLine::parse(argc, argv, std::cout, std::cerr);
-    messageStream << "Completed." << std::endl;
+    readConfiguration();
+    openMessages();
+    loadInput();
+    decideBitDepth();
+    checkSettingsAgainstImage();
+    if (!settings_.sensorGuid.empty())
+        input_.setSensorGuid(settings_.sensorGuid);
+    inspectInput();
+    prepareImage();
+    checkPreparedImage();
+    writePreparedImage();
+    buildSampleSet();
+    finish();
     return 0;
+}
+
+void Pipeline::readConfiguration() {
+    root_ = std::make_shared<config_node_impl>("root");
+    config_ = &root_->child("config");
+    set_defaults(*config_);
+    read_config_file(commandLine_.value("config"), *config_);
+    validate(*config_);
+
+    settings_.debug = config_->find_path("proc.debug").as_bool() || commandLine_.given("debug");
+    timer_.enabled = settings_.debug;
+    if (settings_.debug)
+        out() << "Start: " << boost::posix_time::to_simple_string(startTime_) << std::endl;
+    timerLine(timer_, "Reading configuration: ", out());
+
+    // The median work area holds at most 100 distinct values of a window.
+    if (config_->find_path("proc.median_filter_size").as_int() > 10)
+        throw std::runtime_error(msg::kMedianTooLarge);
+    const bool debug = settings_.debug;
+    settings_ = readRunSettings(commandLine_, *config_);
+    settings_.debug = debug;
+}
+
+void Pipeline::openMessages() {
+    messageStream.setQuiet(settings_.quiet);
+    messageStream.openInfoFile(settings_.log);
+    out() << lscversion::versionLine() << std::endl;
+    if (settings_.input.empty())
+        throw std::runtime_error(msg::kNoInput);
+    timerLine(timer_, "Processes configuration: ", out());
+    out() << "Input file: " << settings_.input << std::endl;
+}
+
+void Pipeline::loadInput() {
+    if (settings_.raw.empty()) {
+        input_.read(settings_.input);
+    } else {
+        const int bits = settings_.bitRes == 0 ? 10 : settings_.bitRes;
+        loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
+                          settings_.legacyFormat);
+        if (!settings_.translate.empty())
+            input_.storeKqraw(settings_.translate);
+    }
+    timerLine(timer_, "Image load time: ", out());
+    if (!settings_.inputAsJpeg.empty()) {
+        out() << "Saving raw input file in jpeg format." << std::endl;
+        input_.storeJpeg(settings_.inputAsJpeg, settings_.jpegQuality);
+        timerLine(timer_, "JPEG image save time: ", out());
+    }
+    if (!settings_.inputAsBmp.empty()) {
+        out() << "Saving raw input file in bmp format." << std::endl;
+        input_.storeBmp(settings_.inputAsBmp);
+        timerLine(timer_, "BMP image save time: ", out());
+    }
+}
+
+void Pipeline::decideBitDepth() {
+    const int imageBits = input_.bitsPerSample();
+    depth_ = settings_.bitRes == 0 ? imageBits : settings_.bitRes;
+    if (settings_.bitRes != 0 && settings_.bitRes != imageBits)
+        out() << "WARNING - Bit depth of input image (" << imageBits
+              << ") is different than bit depth specified by shared.bit_res (" << settings_.bitRes
+              << ")." << std::endl;
+    fullScale_ = prep::fullScale(depth_);
+}
+
+void Pipeline::checkSettingsAgainstImage() {
+    const config_node& config = *config_;
+    const int width = input_.width();
+    const int height = input_.height();
+    if (!config.find_path("lsc.left_patch_width").is_default()) {
+        check_int_range(config, config.find_path("lsc.left_patch_width"), 0, width / 2);
+        check_int_range(config, config.find_path("lsc.center_patch_width"), 0, width);
+        check_int_range(config, config.find_path("lsc.top_patch_height"), 0, height / 2);
+        check_int_range(config, config.find_path("lsc.middle_patch_height"), 0, height);
+    }
+    check_int_range(config, config.find_path("lsc.awb_avg_filter_size"), 1, width / 4);
+
+    // The full scale of the configured depth bounds the pixel levels. (Taken
+    // as a signed 16-bit number it would be -1 for 16 bits and refuse every
+    // configuration.)
+    const int depth = settings_.bitRes != 0 ? settings_.bitRes : input_.bitsPerSample();
+    const int levelLimit = static_cast<int>(prep::fullScale(depth));
+    for (const char* key :
+         {"proc.black_level", "proc.min_pixel_val", "proc.max_pixel_val", "proc.peak_pixel_min"})
+        check_int_range(config, config.find_path(key), 0, levelLimit);
+
+    const config_node& sensorWidth = config.find_path("lsc.imageWidth");
+    const config_node& sensorHeight = config.find_path("lsc.imageHeight");
+    if (!sensorWidth.is_default() && !sensorHeight.is_default() &&
+        (width != sensorWidth.as_int() || height != sensorHeight.as_int()))
+        throw std::runtime_error(std::string(msg::kDimensionsPrefix) + std::to_string(width) + "x" +
+                                 std::to_string(height) + msg::kDimensionsMiddle +
+                                 std::to_string(sensorWidth.as_int()) + "x" +
+                                 std::to_string(sensorHeight.as_int()) + ").");
+}
+
+void Pipeline::inspectInput() {
+    if (settings_.debug) {
+        out() << "Input image data:" << std::endl;
+        prep::writeStatistics(input_, depth_, out());
+        out() << std::endl;
+    }
+    out().precision(3);
+    out() << "Exposure time = " << input_.exposureTime() << std::endl;
+    out() << "Sensor gain = { " << input_.channelGain(0) << ", " << input_.channelGain(1) << ", "
+          << input_.channelGain(2) << ", " << input_.channelGain(3) << " }" << std::endl;
+    timerLine(timer_, "Image inspection time: ", out());
+}
+
+void Pipeline::prepareImage() {
+    const BayerImage planes = prep::split(input_);
+    timerLine(timer_, "Bayer deinterweave time: ", out());
+
+    BayerImage reduced;
+    if (settings_.medianFilter)
+        prep::medianFilterDownsample(planes, settings_.medianFilterSize,
+                                     settings_.procSamplingFactor, reduced);
+    else
+        prep::downsample(planes, settings_.procSamplingFactor, reduced);
+    timerLine(timer_, "Median filter and down sampling time: ", out());
+
+    const ImageBuffer* image = input_.buffer();
+    const int pattern = prep::patternSize(image->cfa[0], image->cfa[1]);
+    prepared_ = prep::weave(reduced, pattern, image->cfa[0], image->cfa[1]);
+    // The prepared image keeps the input's capture data, so it is stored in
+    // the input's raw format.
+    prepared_.copyMetadata(input_);
+    timerLine(timer_, "Bayer interweave time: ", out());
+
+    out() << "Preprocessed image data:" << std::endl;
+    prep::writeStatistics(prepared_, depth_, out());
+    out() << std::endl;
+}
+
+void Pipeline::checkPreparedImage() {
+    prep::PixelLimits limits;
+    limits.minPixel = settings_.minPixel;
+    limits.maxPixel = settings_.maxPixel;
+    limits.peakMinimum = settings_.peakPixelMin;
+    prep::checkPixels(prepared_, limits, fullScale_, out());
+}
+
+void Pipeline::writePreparedImage() {
+    if (settings_.preproc.empty())
+        return;
+    out() << "Preprocessed image file: " << settings_.preproc << std::endl;
+    prepared_.storeKqraw(settings_.preproc);
+    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
+    if (settings_.debug && unfiltered && settings_.procSamplingFactor == 1) {
+        out() << "Performing identity test." << std::endl;
+        BayerImage stored;
+        stored.read(settings_.preproc);
+        if (!stored.samePixels(input_))
+            out() << msg::kIdentityMismatch << std::endl;
+    }
+}
+
+void Pipeline::buildSampleSet() {
+    context_.image.copy(prepared_);
+    timerLine(timer_, "Image checking time: ", out());
+}
+
+void Pipeline::finish() {
+    if (settings_.debug)
+        out() << "Execution time:"
+              << boost::posix_time::to_simple_string(
+                     boost::posix_time::microsec_clock::local_time() - startTime_)
+              << std::endl;
+    out() << "Completed." << std::endl;
 }

@@ -1,20 +1,57 @@
 #pragma once
-// The run driver's state and its stages, in their fixed order.
+// The run driver: its state for the whole run and its stages, each run once,
+// in a fixed order. Anything that ends the run early is thrown and reported
+// by the caller (driver/run.h).
 
+#include "config/config_node.h"
 #include "driver/command_line.h"
+#include "driver/run_settings.h"
 #include "driver/stage_timer.h"
+#include "image/bayer_image.h"
+#include "lsc/processing_context.h"
 
 #include <boost/date_time/posix_time/ptime.hpp>
+
+#include <cstdint>
+#include <memory>
 
 class Pipeline {
 public:
     Pipeline();
-    // Runs every stage once; returns the exit status of a completed run.
-    // Anything that ends the run early is thrown.
+    // Runs every stage; returns the exit status of a completed run.
     int run(int argc, const char* const argv[]);
 
 private:
+    void readConfiguration();
+    void openMessages();
+    void loadInput();
+    void decideBitDepth();
+    void checkSettingsAgainstImage();
+    void inspectInput();
+    void prepareImage();
+    void checkPreparedImage();
+    void writePreparedImage();
+    void buildSampleSet();
+    void obtainSamples();
+    void fitSurface();
+    void writeRegisterFile();
+    void writeBinaryData();
+    void correct();
+    void balanceWhite();
+    void measureColourError();
+    void writeFlattenedImages();
+    void finish();
+
     boost::posix_time::ptime startTime_;
     StageTimer timer_;
     CommandLine commandLine_;
+    RunSettings settings_;
+    std::shared_ptr<config_node_impl> root_;
+    config_node* config_ = nullptr;
+
+    int depth_ = 0;             // bit depth of the run
+    std::uint32_t fullScale_ = 0;  // 2^depth - 1
+    BayerImage input_;
+    BayerImage prepared_;
+    ProcessingContext context_;
 };
