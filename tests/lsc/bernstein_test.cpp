@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "lsc/apan_exception.h"
 #include "lsc/bernstein.h"
 #include "lsc/bernstein_surface.h"
@@ -66,16 +67,12 @@ TEST(BernsteinSurface, FewerSamplesThanControlPointsThrow220) {
     bernsteinSurface surface(3, 3, 0.0, 640.0, 0.0, 480.0);
     for (int i = 0; i < 8; ++i)
         surface.addSample(i * 80.0, i * 60.0, 1.0);
-    try {
-        surface.fit(1e-7);
-        FAIL() << "no exception";
-    } catch (const apan::exception& e) {
-        EXPECT_EQ(e.code(), 220);
-        EXPECT_STREQ(e.what(), "Under constrained fit being attempted. You must specify at least "
-                               "as many sample points as control points.");
-        EXPECT_EQ(e.hint(), "While it's possible to solve undercontrained linear least squares "
-                            "systems we don't support it.");
-    }
+    const apan::exception e = lsc_test::caught([&] { surface.fit(1e-7); });
+    EXPECT_EQ(e.code(), 220);
+    EXPECT_STREQ(e.what(), "Under constrained fit being attempted. You must specify at least as "
+                           "many sample points as control points.");
+    EXPECT_EQ(e.hint(), "While it's possible to solve undercontrained linear least squares "
+                        "systems we don't support it.");
 }
 
 } // namespace

@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "lsc/apan_exception.h"
 #include "lsc/lens_shading_fit.h"
 #include "lsc/sample_collection.h"
@@ -163,12 +164,7 @@ TEST_F(LensShadingFit, FewerSamplesThanControlPointsThrow220AndKeepTheGrids) {
     for (auto& grid : context.controlGrids)
         for (float& g : grid)
             g = 7.0f;
-    try {
-        fitLensShading(context, messages);
-        FAIL() << "no exception";
-    } catch (const apan::exception& e) {
-        EXPECT_EQ(e.code(), 220);
-    }
+    EXPECT_EQ(lsc_test::caught([&] { fitLensShading(context, messages); }).code(), 220);
     EXPECT_EQ(context.controlGrids[2][50], 7.0f);
 }
 

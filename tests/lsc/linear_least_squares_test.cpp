@@ -5,11 +5,14 @@
 
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "lsc/apan_exception.h"
 #include "lsc/dense_matrix.h"
 #include "lsc/linear_least_squares.h"
 
 namespace {
+
+using lsc_test::caught;
 
 // Least squares through the normal equations AᵀA x = Aᵀb, in long double with
 // partial pivoting: an independent reference for well-conditioned problems.
@@ -116,15 +119,11 @@ TEST(LinearLeastSquares, IdenticalColumnsThrow230) {
         b[r] = r;
     }
     apan::linearLeastSquares<double> system(&a, &x, &b);
-    try {
-        system.solve(1e-10);
-        FAIL() << "no exception";
-    } catch (const apan::exception& e) {
-        EXPECT_EQ(e.code(), 230);
-        EXPECT_STREQ(e.what(), "Warning: trying to solve a rank deficient system");
-        EXPECT_EQ(e.hint(), "Rank deficient matrices often occur whenyou have an ill-conditioned "
-                            "system of linear equations.");
-    }
+    const apan::exception e = caught([&] { system.solve(1e-10); });
+    EXPECT_EQ(e.code(), 230);
+    EXPECT_STREQ(e.what(), "Warning: trying to solve a rank deficient system");
+    EXPECT_EQ(e.hint(), "Rank deficient matrices often occur whenyou have an ill-conditioned "
+                        "system of linear equations.");
 }
 
 TEST(LinearLeastSquares, AZeroColumnIsRankDeficientNotNaN) {
@@ -133,12 +132,8 @@ TEST(LinearLeastSquares, AZeroColumnIsRankDeficientNotNaN) {
         a(r, 0) = r + 1.0;
         b[r] = 1.0;
     }
-    try {
-        apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
-        FAIL() << "no exception";
-    } catch (const apan::exception& e) {
-        EXPECT_EQ(e.code(), 230);
-    }
+    EXPECT_EQ(caught([&] { apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10); }).code(),
+              230);
 }
 
 TEST(LinearLeastSquares, UnderdeterminedProblemsAreRankDeficient) {
@@ -146,12 +141,8 @@ TEST(LinearLeastSquares, UnderdeterminedProblemsAreRankDeficient) {
     for (std::size_t i = 0; i < a.size(); ++i)
         a[i] = static_cast<double>(i * i + 1);
     b[0] = b[1] = 1.0;
-    try {
-        apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
-        FAIL() << "no exception";
-    } catch (const apan::exception& e) {
-        EXPECT_EQ(e.code(), 230);
-    }
+    EXPECT_EQ(caught([&] { apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10); }).code(),
+              230);
 }
 
 TEST(LinearLeastSquares, RefusesARightHandSideOfTheWrongLength) {

@@ -4,11 +4,14 @@
 
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "lsc/apan_exception.h"
 #include "lsc/dense_matrix.h"
 #include "lsc/linear_system.h"
 
 namespace {
+
+using lsc_test::caught;
 
 denseMatrix matrixOf(std::uint32_t rows, std::uint32_t columns,
                      std::initializer_list<double> values) {
@@ -17,17 +20,6 @@ denseMatrix matrixOf(std::uint32_t rows, std::uint32_t columns,
     for (double v : values)
         m[i++] = v;
     return m;
-}
-
-// Runs f and returns the apan::exception it throws (fails the test if none).
-template <typename F> apan::exception caught(F f) {
-    try {
-        f();
-    } catch (const apan::exception& e) {
-        return e;
-    }
-    ADD_FAILURE() << "no apan::exception";
-    return apan::exception(0, "", "");
 }
 
 TEST(DenseMatrix, StartsZeroedAndIndexesRowMajor) {

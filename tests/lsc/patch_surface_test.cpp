@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "lsc/apan_exception.h"
 #include "lsc/bernstein.h"
 #include "lsc/eval_patch.h"
@@ -111,14 +112,10 @@ TEST(PatchSurface, FewerConstraintsThanControlPointsThrow220) {
     patchSurface s(3, 3, kXBreaks, kYBreaks);
     for (int i = 0; i < 99; ++i)
         s.addValueConstraint(i * 10.0, i * 8.0, 1.0);
-    try {
-        s.fit(1e-10, std::cout);
-        FAIL() << "no exception";
-    } catch (const apan::exception& e) {
-        EXPECT_EQ(e.code(), 220);
-        EXPECT_STREQ(e.what(), "Under constrained fit being attempted. You must specify at least "
-                               "as many sample points as control points.");
-    }
+    const apan::exception e = lsc_test::caught([&] { s.fit(1e-10, std::cout); });
+    EXPECT_EQ(e.code(), 220);
+    EXPECT_STREQ(e.what(), "Under constrained fit being attempted. You must specify at least as "
+                           "many sample points as control points.");
 }
 
 TEST(FindPatch, PointsOnABorderBelongToTheLowerIndexedPatch) {
@@ -184,9 +181,9 @@ float powerForm(const float* g, std::uint32_t start, float u, float v) {
     float sum = 0.0f;
     for (std::uint32_t r = 0; r < 4; ++r) {
         const float* p = g + start + r * 10;
-        sum += weights[r] * (p[0] + 3.0f * (p[1] - p[0]) * u +
-                             3.0f * (p[0] - 2.0f * p[1] + p[2]) * (u * u) +
-                             (p[3] - p[0] + 3.0f * p[1] - 3.0f * p[2]) * (u * u * u));
+        sum += weights[r] *
+               (p[0] + 3.0f * (p[1] - p[0]) * u + 3.0f * (p[0] - 2.0f * p[1] + p[2]) * (u * u) +
+                (p[3] - p[0] + 3.0f * p[1] - 3.0f * p[2]) * (u * u * u));
     }
     return sum;
 }
