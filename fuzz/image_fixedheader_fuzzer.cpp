@@ -35,8 +35,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         return 0;
     }
     const std::size_t head = size < kFieldBytes ? size : kFieldBytes;
-    std::vector<std::uint8_t> file(kKqRawFixedHeaderSize - 4 + (size - head));
+    // One buffer for all runs: the bytes between the fields and the marker
+    // stay zero, so each run only rewrites its own head and tail.
+    static std::vector<std::uint8_t> file(kKqRawFixedHeaderSize);
+    std::memset(file.data(), 0, kFieldBytes);
     std::memcpy(file.data(), data, head);
+    file.resize(kKqRawFixedHeaderSize - 4 + (size - head));
     if (size > head)
         std::memcpy(file.data() + kKqRawFixedHeaderSize - 4, data + head, size - head);
     readBoth(file.data(), file.size());

@@ -2,6 +2,7 @@
 
 #include "image/image_result.h"
 #include "image/kqraw_container.h"
+#include "image/sample_memory.h"
 
 #include <cstdlib>
 #include <cstring>
@@ -133,7 +134,7 @@ ImageBuffer* imageCreate(std::int32_t width, std::int32_t height, std::uint16_t 
         *result = img::kNoMemory;
         return nullptr;
     }
-    image->data = std::malloc(static_cast<std::size_t>(bytes));
+    image->data = img::allocateSamples(static_cast<std::size_t>(bytes));
     if (!image->data) {
         *result = img::kNoMemory;
         return nullptr;

@@ -6,6 +6,7 @@
 #include "image/image_result.h"
 #include "image/image_warning.h"
 #include "image/raw_samples.h"
+#include "image/sample_memory.h"
 
 #include <cstdlib>
 #include <cstring>
@@ -304,7 +305,7 @@ int readPixels(img::ByteSource& source, KqRawBlock* block) {
         return img::kIoError;
     block->sampleCount = (block->size - kKqRawPixelLeadSize) / 2;
     const std::size_t bytes = static_cast<std::size_t>(block->sampleCount * 2);
-    block->samples = static_cast<std::uint16_t*>(std::malloc(bytes > 0 ? bytes : 1));
+    block->samples = static_cast<std::uint16_t*>(img::allocateSamples(bytes));
     if (!block->samples)
         return img::kNoMemory;
     return img::readSamplesLE(source, block->samples, block->sampleCount) ? img::kOk
