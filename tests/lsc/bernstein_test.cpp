@@ -56,13 +56,6 @@ TEST(BernsteinSurface, ControlPointsAreRowMajorWithRowsAlongY) {
     EXPECT_EQ(surface.value(100.0, 0.0), 0.0);
 }
 
-TEST(BernsteinSurface, SamplesCarryTheFixedWeight) {
-    bernsteinSurface surface(3, 3, 0.0, 1.0, 0.0, 1.0);
-    surface.addSample(0.5, 0.25, 2.0);
-    ASSERT_EQ(surface.samples().size(), 1u);
-    EXPECT_EQ(surface.samples()[0].weight, 1.0000000116860974e-7);
-}
-
 TEST(BernsteinSurface, FewerSamplesThanControlPointsThrow220) {
     bernsteinSurface surface(3, 3, 0.0, 640.0, 0.0, 480.0);
     for (int i = 0; i < 8; ++i)

@@ -73,16 +73,6 @@ TEST(LensShadingCorrection, StepReducesTheImageBlockByBlock) {
     EXPECT_NEAR(out[399 * 500 + 499], ramp(997, 797), 1e-3f);
 }
 
-TEST(LensShadingCorrection, OutputSizesRoundDownToEven) {
-    ProcessingContext context;
-    makeImage(context, 30, 22, kCfaRggb, ramp);
-    setGrids(context, kOnes);
-    context.applyStep = 4; // 7 x 5 blocks' worth, rounded to 6 x 4
-    applyLensShading(context);
-    EXPECT_EQ(context.corrected.width(), 6);
-    EXPECT_EQ(context.corrected.height(), 4);
-}
-
 class CorrectionChannels : public ::testing::TestWithParam<std::uint32_t> {};
 
 TEST_P(CorrectionChannels, EachPixelUsesItsChannelsGrid) {

@@ -7,17 +7,6 @@
 
 namespace {
 
-TEST(PatchBreakpoints, DefaultFractionsSplitAQuarterAHalfAQuarter) {
-    const PatchBreakpoints b = patchBreakpoints(1000, 800, 0.25, 0.5, 0.25, 0.5);
-    EXPECT_EQ(b.x[0], 0u);
-    EXPECT_EQ(b.x[1], 250u);
-    EXPECT_EQ(b.x[2], 750u);
-    EXPECT_EQ(b.x[3], 1000u);
-    EXPECT_EQ(b.y[1], 200u);
-    EXPECT_EQ(b.y[2], 600u);
-    EXPECT_EQ(b.y[3], 800u);
-}
-
 TEST(PatchBreakpoints, LeftTruncatesAndCentreRounds) {
     const PatchBreakpoints b = patchBreakpoints(1001, 1001, 0.25, 0.5, 0.25, 0.5);
     EXPECT_EQ(b.x[1], 250u); // 250.25 truncated
@@ -73,13 +62,6 @@ TEST(ExportedPatchSizes, RoundTheOuterPatchesAndTruncateTheCentre) {
     EXPECT_EQ(t.top, 12);
     EXPECT_EQ(t.middle, 24);
     EXPECT_EQ(t.bottom, 12);
-}
-
-TEST(ExportedPatchSizes, OversizedFactorsLeaveANegativeRemainder) {
-    const ExportedPatchSizes s = exportedPatchSizes(100, 100, 0.5, 0.75, 0.25, 0.5);
-    EXPECT_EQ(s.left, 50);
-    EXPECT_EQ(s.center, 75);
-    EXPECT_EQ(s.right, -25);
 }
 
 TEST(PatchStep, EncodesFourTimesTwoOverSizeInFixedPoint) {
