@@ -1,13 +1,12 @@
-#include "config/config_file.h"
-
-#include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
 #include <functional>
 #include <sstream>
 #include <stdexcept>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include "config/config_file.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -85,7 +84,8 @@ TEST_F(ConfigGrammarTest, IndexedKeysCreateTheMissingIndices) {
 }
 
 TEST_F(ConfigGrammarTest, IntegerListsFillIndexedChildren) {
-    parse_config_text("apply_lsc.delta_ab_blocks = {1, 2};\nm.pair = {+5,-7 ,  3000000000};", config);
+    parse_config_text("apply_lsc.delta_ab_blocks = {1, 2};\nm.pair = {+5,-7 ,  3000000000};",
+                      config);
     const config_node& blocks = config.find_path("apply_lsc.delta_ab_blocks");
     EXPECT_EQ(blocks.size(), 2u);
     EXPECT_FALSE(blocks.initialized());
@@ -98,7 +98,8 @@ TEST_F(ConfigGrammarTest, IntegerListsFillIndexedChildren) {
 }
 
 TEST_F(ConfigGrammarTest, FloatListsStoreSingleValuesAtSeventeenDigits) {
-    parse_config_text("a = {0.1};\nb = {1, 2.5, -3e2, .5, 4.};\nc = {nan, -inf, Infinity};", config);
+    parse_config_text("a = {0.1};\nb = {1, 2.5, -3e2, .5, 4.};\nc = {nan, -inf, Infinity};",
+                      config);
     EXPECT_EQ(value("a[0]"), "0.10000000149011612");
     EXPECT_EQ(value("b[0]"), "1");
     EXPECT_EQ(value("b[1]"), "2.5");
@@ -176,12 +177,13 @@ TEST_F(ConfigGrammarTest, TextNoRuleMatchesStopsTheParse) {
               "Failed to parse configuration file parameters.\nStopped at: \"= 2;\"\n");
     EXPECT_EQ(parseError("a = 1; @\r\nb = 2;"),
               "Failed to parse configuration file parameters.\nStopped at: \"@\"\n");
-    EXPECT_EQ(value("a"), "1");  // what came before the error stays
+    EXPECT_EQ(value("a"), "1"); // what came before the error stays
 }
 
 TEST_F(ConfigGrammarTest, NonAsciiLettersAreNotNames) {
-    EXPECT_EQ(parseError("\xc3\xa9t\xc3\xa9 = 1;"),
-              "Failed to parse configuration file parameters.\nStopped at: \"\xc3\xa9t\xc3\xa9 = 1;\"\n");
+    EXPECT_EQ(
+        parseError("\xc3\xa9t\xc3\xa9 = 1;"),
+        "Failed to parse configuration file parameters.\nStopped at: \"\xc3\xa9t\xc3\xa9 = 1;\"\n");
     EXPECT_EQ(parseError("a = \xc3\xa9;"),
               "Failed to parse configuration file parameters, expecting <value>:\na = ");
 }
@@ -200,17 +202,18 @@ TEST_F(ConfigGrammarTest, HugeIndexIsRefusedBeforeCreatingNodes) {
 
 TEST_F(ConfigGrammarTest, OverlongKeyIsRefused) {
     const std::string key(200, 'k');
-    parse_config_text(key + ".x[10] = 1;", config);  // 209 characters: fine
+    parse_config_text(key + ".x[10] = 1;", config); // 209 characters: fine
     const std::string message = parseError(key + "." + key + " = 1;");
-    EXPECT_EQ(message, "Failed to parse configuration file parameters, key longer than 256 characters:\n" +
-                           (key + "." + key).substr(0, 256));
+    EXPECT_EQ(message,
+              "Failed to parse configuration file parameters, key longer than 256 characters:\n" +
+                  (key + "." + key).substr(0, 256));
 }
 
 TEST_F(ConfigGrammarTest, ManyNewEntriesInOneTextAreRefused) {
     std::string text;
     for (int i = 0; i < 3; ++i)
-        text += "k" + std::to_string(i) + "[65535] = 1;\n";  // 65537 new entries each
-    text += "k3[65529] = 1;\n";  // 262141 in all
+        text += "k" + std::to_string(i) + "[65535] = 1;\n"; // 65537 new entries each
+    text += "k3[65529] = 1;\n";                             // 262141 in all
     EXPECT_EQ(parseError(text + "z[1] = 1;"),
               "Failed to parse configuration file parameters, more than 262144 new entries:\nz[1]");
     std::string list = "big = {0";

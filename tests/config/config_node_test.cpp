@@ -1,17 +1,18 @@
-#include "config/config_node.h"
-
-#include <boost/lexical_cast/bad_lexical_cast.hpp>
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <climits>
-#include <pthread.h>
 #include <cmath>
 #include <functional>
 #include <memory>
 #include <sstream>
 #include <stdexcept>
 #include <string>
+
+#include <boost/lexical_cast/bad_lexical_cast.hpp>
+#include <gtest/gtest.h>
+
+#include "config/config_node.h"
+
+#include <pthread.h>
 
 namespace {
 
@@ -75,8 +76,9 @@ TEST_F(ConfigNodeTest, CreatingAnIndexFillsTheGapsUninitialized) {
 
 TEST_F(ConfigNodeTest, HugeIndexIsRefusedWithoutCreatingNodes) {
     config_node& list = config.child("a");
-    EXPECT_EQ(messageOf([&] { list.child(4000000000u); }),
-              "Index 4000000000 of root.config.a is too large, the largest allowed index is 65535.");
+    EXPECT_EQ(
+        messageOf([&] { list.child(4000000000u); }),
+        "Index 4000000000 of root.config.a is too large, the largest allowed index is 65535.");
     EXPECT_THROW(list.child(65536), std::out_of_range);
     EXPECT_EQ(list.size(), 0u);
     EXPECT_EQ(list.child(65535).name(), "root.config.a[65535]");
@@ -87,7 +89,8 @@ TEST_F(ConfigNodeTest, PathsDescendByNameAndIndex) {
     EXPECT_EQ(cell.name(), "root.config.apply_lsc.ccm[1][2]");
     EXPECT_EQ(&config.find_path("apply_lsc.ccm[1][2]"), &cell);
     EXPECT_EQ(&root.find_path("config.apply_lsc"), &config.child("apply_lsc"));
-    EXPECT_EQ(&config.find("apply_lsc").find_path("ccm[1]"), &config.child_path("apply_lsc.ccm[1]"));
+    EXPECT_EQ(&config.find("apply_lsc").find_path("ccm[1]"),
+              &config.child_path("apply_lsc.ccm[1]"));
     EXPECT_FALSE(config.find_path("apply_lsc.ccm[3]").valid());
     EXPECT_FALSE(config.find_path("apply_lsc.ccm[99999999999999999999999]").valid());
     EXPECT_FALSE(config.find_path("nothing.here").valid());
@@ -147,8 +150,8 @@ TEST_F(ConfigNodeTest, IntegersConvertFromTheWholeText) {
     EXPECT_EQ(valued("2147483647").as_int(), INT_MAX);
     EXPECT_EQ(valued("007").as_int(), 7);
     EXPECT_EQ(valued("-0").as_int(), 0);
-    for (const char* bad : {"", " 42", "42 ", "4.2", "2147483648", "-2147483649", "+", "-",
-                            "+-1", "0x10", "1e3", "99999999999999999999"}) {
+    for (const char* bad : {"", " 42", "42 ", "4.2", "2147483648", "-2147483649", "+", "-", "+-1",
+                            "0x10", "1e3", "99999999999999999999"}) {
         EXPECT_THROW(valued(bad).as_int(), boost::bad_lexical_cast) << '"' << bad << '"';
     }
 }
@@ -220,18 +223,17 @@ TEST_F(ConfigNodeTest, PrintListsNamedThenIndexedChildrenMarkingDefaults) {
     config.child_path("apply_lsc.blocks.zeta").set("z");
     std::ostringstream out;
     root.print(out);
-    EXPECT_EQ(out.str(),
-              "root = <empty>\n"
-              "root.config = <empty>\n"
-              "root.config.apply_lsc = <empty>\n"
-              "root.config.apply_lsc.blocks = <empty>\n"
-              "root.config.apply_lsc.blocks.zeta = z\n"
-              "root.config.apply_lsc.blocks[0] = <empty>\n"
-              "root.config.apply_lsc.blocks[1] = 2\n"
-              "root.config.shared = <empty>\n"
-              "root.config.shared.block_name = reference\n"
-              "root.config.shared.cfg_file_date = <empty>\n"
-              "root.config.shared.jpeg_quality = *75\n");
+    EXPECT_EQ(out.str(), "root = <empty>\n"
+                         "root.config = <empty>\n"
+                         "root.config.apply_lsc = <empty>\n"
+                         "root.config.apply_lsc.blocks = <empty>\n"
+                         "root.config.apply_lsc.blocks.zeta = z\n"
+                         "root.config.apply_lsc.blocks[0] = <empty>\n"
+                         "root.config.apply_lsc.blocks[1] = 2\n"
+                         "root.config.shared = <empty>\n"
+                         "root.config.shared.block_name = reference\n"
+                         "root.config.shared.cfg_file_date = <empty>\n"
+                         "root.config.shared.jpeg_quality = *75\n");
 }
 
 TEST_F(ConfigNodeTest, NullNodePrintsItsName) {

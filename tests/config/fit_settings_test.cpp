@@ -1,13 +1,12 @@
-#include "config/fit_settings.h"
-
-#include "config/config_file.h"
-#include "config/parameter_table.h"
+#include <stdexcept>
+#include <string>
 
 #include <boost/lexical_cast/bad_lexical_cast.hpp>
 #include <gtest/gtest.h>
 
-#include <stdexcept>
-#include <string>
+#include "config/config_file.h"
+#include "config/fit_settings.h"
+#include "config/parameter_table.h"
 
 namespace {
 
@@ -68,10 +67,10 @@ TEST_F(FitSettingsTest, DefaultsConvertOnce) {
 }
 
 TEST_F(FitSettingsTest, ConfiguredValuesArrive) {
-    const ProcessingContext c =
-        load("lsc.falloff_factor = 50; lsc.green_balance = 1; lsc.avg_luma = 1;\n"
-             "lsc.sampling_margin = 20; apply_lsc.max_delta_ab = 4.5; lsc.awb_avg_filter_size = 7;\n"
-             "apply_lsc.ccm = {2, 0.5};\napply_lsc.ccm[2] = {0, -1, 3};");
+    const ProcessingContext c = load(
+        "lsc.falloff_factor = 50; lsc.green_balance = 1; lsc.avg_luma = 1;\n"
+        "lsc.sampling_margin = 20; apply_lsc.max_delta_ab = 4.5; lsc.awb_avg_filter_size = 7;\n"
+        "apply_lsc.ccm = {2, 0.5};\napply_lsc.ccm[2] = {0, -1, 3};");
     EXPECT_EQ(c.falloff, 0.5f);
     EXPECT_TRUE(c.greenBalance);
     EXPECT_TRUE(c.averageChannels);

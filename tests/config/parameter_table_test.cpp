@@ -1,15 +1,14 @@
-#include "config/parameter_table.h"
-
-#include "config/config_file.h"
-
-#include <boost/lexical_cast/bad_lexical_cast.hpp>
-#include <gtest/gtest.h>
-
 #include <cstdlib>
 #include <ctime>
 #include <sstream>
 #include <stdexcept>
 #include <string>
+
+#include <boost/lexical_cast/bad_lexical_cast.hpp>
+#include <gtest/gtest.h>
+
+#include "config/config_file.h"
+#include "config/parameter_table.h"
 
 namespace {
 
@@ -178,8 +177,9 @@ TEST_F(ParameterTableTest, RangeChecksNameThePathBelowConfig) {
         check_int_range(config, node, 0, 10);
         FAIL();
     } catch (const std::range_error& e) {
-        EXPECT_STREQ(e.what(),
-                     "Value specified for custom.limit is too high, value must be between 0 and 10.");
+        EXPECT_STREQ(
+            e.what(),
+            "Value specified for custom.limit is too high, value must be between 0 and 10.");
     }
     EXPECT_NO_THROW(check_int_range(config, node, 12, 12));
     EXPECT_NO_THROW(check_float_range(config, node, 11.5f, 12.0f));
@@ -241,7 +241,7 @@ TEST(ConfigDate, CarriesOverOutOfRangeFields) {
 TEST(ConfigDate, IgnoresTheMachineTimeZone) {
     const char* previous = std::getenv("TZ");
     const std::string saved = previous ? previous : "";
-    setenv("TZ", "EST5EDT,M3.2.0,M11.1.0", 1);  // POSIX rules: no zoneinfo needed
+    setenv("TZ", "EST5EDT,M3.2.0,M11.1.0", 1); // POSIX rules: no zoneinfo needed
     tzset();
     const std::int64_t eastern = config_date_seconds("2012-05-01T10:30");
     setenv("TZ", "IST-5:30", 1);
@@ -258,10 +258,10 @@ TEST(ConfigDate, IgnoresTheMachineTimeZone) {
 
 TEST(ConfigDate, RefusesOtherShapes) {
     const std::string message = "Invalid ISO 8601 date value (must be YYYY-MM-DDTHH:MM).";
-    for (const char* text : {"2012-05-01 10:30", "", "2012-05-01T10:30:00", "2012-05-01T10",
-                             "2012-05-01t10:30", " 2012-05-01T10:30", "2012-05-01T10:30 ",
-                             "2012/05/01T10:30", "-2012-05-01T10:30", "2012-05-01T10:-3",
-                             "1234567890-01-01T00:00", "10000-01-01T00:00"})
+    for (const char* text :
+         {"2012-05-01 10:30", "", "2012-05-01T10:30:00", "2012-05-01T10", "2012-05-01t10:30",
+          " 2012-05-01T10:30", "2012-05-01T10:30 ", "2012/05/01T10:30", "-2012-05-01T10:30",
+          "2012-05-01T10:-3", "1234567890-01-01T00:00", "10000-01-01T00:00"})
         EXPECT_EQ(dateError(text), message) << text;
 }
 

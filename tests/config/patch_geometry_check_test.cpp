@@ -1,13 +1,12 @@
-#include "config/patch_geometry_check.h"
-
-#include "config/config_file.h"
-#include "config/parameter_table.h"
+#include <stdexcept>
+#include <string>
 
 #include <boost/lexical_cast/bad_lexical_cast.hpp>
 #include <gtest/gtest.h>
 
-#include <stdexcept>
-#include <string>
+#include "config/config_file.h"
+#include "config/parameter_table.h"
+#include "config/patch_geometry_check.h"
 
 namespace {
 
@@ -167,8 +166,8 @@ TEST_F(PatchGeometryCheckTest, ControlPointsAndLevelsAreLoaded) {
     std::string points;
     for (const char* name : {"controlPointR", "controlPointGR", "controlPointGB", "controlPointB"})
         for (int i = 0; i < 10; ++i)
-            points += std::string(name) + "[" + std::to_string(i) + "] = {1, 2, 3, 4, 5, 6, 7, 8, 9, " +
-                      std::to_string(i) + ".5};\n";
+            points += std::string(name) + "[" + std::to_string(i) +
+                      "] = {1, 2, 3, 4, 5, 6, 7, 8, 9, " + std::to_string(i) + ".5};\n";
     EXPECT_EQ(check("", points + "R = 512; GR = 1023; GB = 1000; B = 700;"), "(accepted)");
     EXPECT_EQ(context.controlGrids[0][0], 1.0f);
     EXPECT_EQ(context.controlGrids[3][99], 9.5f);

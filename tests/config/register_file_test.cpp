@@ -1,17 +1,16 @@
-#include "config/register_file.h"
-
-#include "config/config_file.h"
-#include "config/parameter_table.h"
-#include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
 #include <cmath>
 #include <limits>
 #include <sstream>
 #include <stdexcept>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "config/config_file.h"
+#include "config/parameter_table.h"
+#include "config/register_file.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -20,10 +19,10 @@ protected:
     RegisterFileTest() {
         set_defaults(config);
         useImage(64, 48, "0123abcd");
-        fit.targetLevels[0] = 0.5f;   // R
-        fit.targetLevels[1] = 1.0f;   // GR
-        fit.targetLevels[2] = 0.25f;  // GB
-        fit.targetLevels[3] = 0.75f;  // B
+        fit.targetLevels[0] = 0.5f;  // R
+        fit.targetLevels[1] = 1.0f;  // GR
+        fit.targetLevels[2] = 0.25f; // GB
+        fit.targetLevels[3] = 0.75f; // B
         for (int channel = 0; channel < kChannels; ++channel)
             for (int n = 0; n < kGridPoints; ++n)
                 fit.controlGrids[channel][n] = 1.0f + 0.5f * static_cast<float>(channel);
@@ -185,17 +184,20 @@ TEST_F(RegisterFileTest, NonFiniteValuesAreRefused) {
 
 TEST_F(RegisterFileTest, GeometryWithoutRoomForEveryPatchIsRefused) {
     fit.leftFraction = 0.0;
-    EXPECT_EQ(error(), "Patch geometry of the 64x48 image gives patch sizes 0, 32, 32 x 12, 24, 12; "
-                       "every patch must be at least 2 pixels wide and high.");
+    EXPECT_EQ(error(),
+              "Patch geometry of the 64x48 image gives patch sizes 0, 32, 32 x 12, 24, 12; "
+              "every patch must be at least 2 pixels wide and high.");
     fit.leftFraction = 0.5;
-    EXPECT_EQ(error(), "Patch geometry of the 64x48 image gives patch sizes 32, 32, 0 x 12, 24, 12; "
-                       "every patch must be at least 2 pixels wide and high.");
+    EXPECT_EQ(error(),
+              "Patch geometry of the 64x48 image gives patch sizes 32, 32, 0 x 12, 24, 12; "
+              "every patch must be at least 2 pixels wide and high.");
     fit.leftFraction = 0.25;
     fit.middleFraction = std::numeric_limits<double>::quiet_NaN();
-    EXPECT_EQ(error(), "Patch geometry of the 64x48 image gives patch sizes 16, 32, 16 x 12, 0, 36; "
-                       "every patch must be at least 2 pixels wide and high.");
+    EXPECT_EQ(error(),
+              "Patch geometry of the 64x48 image gives patch sizes 16, 32, 16 x 12, 0, 36; "
+              "every patch must be at least 2 pixels wide and high.");
     fit.middleFraction = 0.5;
-    useImage(6, 48, "01");  // 1-pixel outer patches: a step of 8 does not fit 3 bits
+    useImage(6, 48, "01"); // 1-pixel outer patches: a step of 8 does not fit 3 bits
     EXPECT_EQ(error(), "Patch geometry of the 6x48 image gives patch sizes 2, 3, 1 x 12, 24, 12; "
                        "every patch must be at least 2 pixels wide and high.");
 }
@@ -225,11 +227,12 @@ TEST_F(RegisterFileTest, EveryVariantReadsBackThroughTheConfigurationReader) {
             set_defaults(cfg);
             parse_config_text(settings, cfg);
             useImage(64, 48, serial);
-            const std::string written = register_file_text(
-                cfg, "reference", ".ctrlPoints[1]", "-c\nx.cfg ", fit, image);
+            const std::string written =
+                register_file_text(cfg, "reference", ".ctrlPoints[1]", "-c\nx.cfg ", fit, image);
             config_node_impl back("root");
             ASSERT_NO_THROW(parse_config_text(written, back.child("config")))
-                << serial << " / " << settings << "\n" << written.substr(0, 400);
+                << serial << " / " << settings << "\n"
+                << written.substr(0, 400);
             const config_node& reference = back.find("config").find("reference");
             EXPECT_EQ(reference.find("serial_no").as_string(),
                       serial.empty() || serial.find_first_of(" \n;#") != std::string::npos

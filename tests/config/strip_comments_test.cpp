@@ -1,11 +1,11 @@
-#include "config/strip_comments.h"
+#include <sstream>
+#include <string>
 
 #include <boost/iostreams/copy.hpp>
 #include <boost/iostreams/filtering_stream.hpp>
 #include <gtest/gtest.h>
 
-#include <sstream>
-#include <string>
+#include "config/strip_comments.h"
 
 namespace {
 

@@ -1,9 +1,9 @@
-#include "config/value_text.h"
+#include <cmath>
+#include <limits>
 
 #include <gtest/gtest.h>
 
-#include <cmath>
-#include <limits>
+#include "config/value_text.h"
 
 namespace {
 

@@ -1,0 +1,23 @@
+#include "tests/e2e/e2e_fixture.h"
+
+#include <sstream>
+
+namespace e2e {
+
+std::vector<std::string> lines(const std::string& text) {
+    std::vector<std::string> result;
+    std::istringstream in(text);
+    std::string line;
+    while (std::getline(in, line))
+        result.push_back(line);
+    return result;
+}
+
+bool hasLine(const std::string& text, const std::string& needle) {
+    for (const std::string& line : lines(text))
+        if (line == needle)
+            return true;
+    return false;
+}
+
+} // namespace e2e

@@ -1,0 +1,68 @@
+#pragma once
+// A working directory with a generated flat field and a configuration file,
+// and a shorthand to run the tool in it.
+
+#include "tests/support/flat_field.h"
+#include "tests/support/temp_dir.h"
+#include "tests/support/tool_runner.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+namespace e2e {
+
+using testing_support::CaptureInfo;
+using testing_support::FlatField;
+using testing_support::FlatFieldSpec;
+using testing_support::ToolResult;
+
+// A small, clean 10-bit RGGB flat field that passes the default checks (the
+// default white-balance filter of 100 pixels needs a width of at least 400).
+inline FlatFieldSpec smallSpec() {
+    FlatFieldSpec spec;
+    spec.width = 480;
+    spec.height = 360;
+    return spec;
+}
+
+class ToolRun : public ::testing::Test {
+protected:
+    std::string path(const std::string& name) const { return dir_.file(name); }
+    std::string read(const std::string& name) const { return testing_support::readFile(path(name)); }
+    bool exists(const std::string& name) const { return testing_support::fileExists(path(name)); }
+    void write(const std::string& name, const std::string& bytes) const {
+        testing_support::writeFile(path(name), bytes);
+    }
+
+    // Writes "flat.kqraw" (a container of `spec`) and "lsc.cfg" with `config`.
+    void prepare(const std::string& config = "", const FlatFieldSpec& spec = smallSpec(),
+                 const CaptureInfo& capture = {}) {
+        field_ = testing_support::makeFlatField(spec);
+        write("flat.kqraw", testing_support::kqraw2FileBytes(field_, capture));
+        write("lsc.cfg", config);
+    }
+
+    // Runs the tool in the working directory.
+    ToolResult run(const std::vector<std::string>& args, const std::string& input = "") const {
+        return testing_support::runTool(args, dir_.path(), input);
+    }
+    // --config lsc.cfg --input flat.kqraw --calibrate cal.txt, then `extra`.
+    ToolResult calibrate(const std::vector<std::string>& extra = {}) const {
+        std::vector<std::string> args = {"--config", "lsc.cfg", "--input", "flat.kqraw",
+                                         "--calibrate", "cal.txt"};
+        args.insert(args.end(), extra.begin(), extra.end());
+        return run(args);
+    }
+
+    testing_support::TempDir dir_;
+    FlatField field_;
+};
+
+// The lines of a text, without their line ends.
+std::vector<std::string> lines(const std::string& text);
+// True when `needle` occurs in `text` as a whole line.
+bool hasLine(const std::string& text, const std::string& needle);
+
+} // namespace e2e
