@@ -30,6 +30,8 @@ inline constexpr char kNoInput[] = "An input flat field image must be specified.
 inline constexpr char kDimensionsPrefix[] = "Input image dimensions (";
 inline constexpr char kDimensionsMiddle[] = ") do not match expected dimensions for sensor (";
 inline constexpr char kPixelsWithin[] = "Image pixels within specified parameters.";
+inline constexpr char kNoGreenSignal[] =
+    "The green channels have no signal; the colour balance cannot be measured.";
 inline constexpr char kIdentityMismatch[] =
     "WARNING - Not all output image pixels match input image pixels.";
 

@@ -1,17 +1,28 @@
 #include "driver/pipeline.h"
 
 #include "config/config_file.h"
+#include "config/fit_settings.h"
 #include "config/parameter_table.h"
+#include "config/register_file.h"
 #include "driver/driver_messages.h"
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
 #include "driver/version.h"
+#include "lsc/lens_shading_correction.h"
+#include "lsc/lens_shading_fit.h"
+#include "lsc/sample_collection.h"
+#include "lsc/xtest_surface.h"
 #include "prep/bayer_planes.h"
+#include "prep/delta_ab.h"
+#include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
 #include "prep/median_filter.h"
+#include "prep/sample_file.h"
+#include "prep/white_balance.h"
 
 #include <boost/date_time/posix_time/posix_time.hpp>
 
+#include <algorithm>
 #include <iostream>
 #include <stdexcept>
 
@@ -19,6 +30,16 @@ namespace {
 
 std::ostream& out() {
     return messageStream;
+}
+
+// "<label>R/G" and "<label>B/G" with six significant digits; G is the larger green.
+void printColourRatios(const char* label, const float (&levels)[kChannels]) {
+    const float green = std::max(levels[1], levels[2]);
+    if (!(green > 0.0f))
+        throw std::runtime_error(msg::kNoGreenSignal);
+    out().precision(6);
+    out() << label << "R/G: " << levels[0] / green << std::endl;
+    out() << label << "B/G: " << levels[3] / green << std::endl;
 }
 
 } // namespace
@@ -40,6 +61,13 @@ int Pipeline::run(int argc, const char* const argv[]) {
     checkPreparedImage();
     writePreparedImage();
     buildSampleSet();
+    obtainSamples();
+    fitSurface();
+    writeRegisterFile();
+    correct();
+    balanceWhite();
+    measureColourError();
+    writeFlattenedImages();
     finish();
     return 0;
 }
@@ -202,7 +230,104 @@ void Pipeline::writePreparedImage() {
 
 void Pipeline::buildSampleSet() {
     context_.image.copy(prepared_);
+    load_fit_settings(*config_, input_, context_);
+    context_.quiet = settings_.quiet;
     timerLine(timer_, "Image checking time: ", out());
+}
+
+void Pipeline::obtainSamples() {
+    const std::uint32_t sampleScale = prep::sampleFullScale(depth_);
+    if (settings_.samples.empty()) {
+        out() << "Create samples from image." << std::endl;
+        collectSamples(context_, out());
+        if (!settings_.outSamples.empty())
+            prep::writeSampleFile(settings_.outSamples, context_, sampleScale);
+    } else {
+        out() << "Loading sample points from file." << std::endl;
+        prep::readSampleFile(settings_.samples, context_, sampleScale);
+    }
+}
+
+void Pipeline::fitSurface() {
+    out() << "Computing lens shading surface." << std::endl;
+    fitLensShading(context_, out());
+    printColourRatios("Measured ", context_.targetLevels);
+    if (settings_.xtest) {
+        out() << "X test mode specified." << std::endl;
+        out() << "Forcing lens shading surface to produce an X shaped color distortion."
+              << std::endl;
+        applyXTestSurface(context_);
+    }
+}
+
+void Pipeline::writeRegisterFile() {
+    if (!settings_.calibrate.empty()) {
+        out() << "Generating configuration file." << std::endl;
+        write_register_file(settings_.calibrate, *config_, settings_.blockName,
+                            settings_.controlPointInfix, commandLine_.argumentsText(), context_,
+                            input_);
+    }
+    timerLine(timer_, "Lens shading calculation time: ", out());
+}
+
+void Pipeline::correct() {
+    // The fit took the black level out of its copy; the correction starts
+    // again from the prepared image.
+    context_.image = std::move(prepared_);
+    out() << "Start correcting lens shading." << std::endl;
+    applyLensShading(context_);
+    timerLine(timer_, "Apply lens shading time: ", out());
+}
+
+void Pipeline::balanceWhite() {
+    out() << "Performing white balancing." << std::endl;
+    prep::whiteBalance(context_);
+    float levels[kChannels];
+    prep::measureLevels(levels, context_);
+    printColourRatios("Flattened image measured ", levels);
+    timerLine(timer_, "White balance time: ", out());
+}
+
+void Pipeline::measureColourError() {
+    if (settings_.avgLuma == 1 || settings_.noDelta || settings_.xtest)
+        return;
+    out() << "Calculating deltaAB." << std::endl;
+    out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x "
+          << context_.deltaAbBlocks[1] << std::endl;
+    prep::evaluateDeltaAb(context_);
+    if (!settings_.delta.empty()) {
+        out() << "Writing delta ab data." << std::endl;
+        prep::writeDeltaFile(settings_.delta, context_);
+    }
+    out().precision(6);
+    out() << "Maximum delta ab: " << context_.maxDelta << std::endl;
+    if (!settings_.stats.empty())
+        prep::writeStatsFile(settings_.stats, context_);
+    prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
+    timerLine(timer_, "Calculate delta ab time: ", out());
+}
+
+void Pipeline::writeFlattenedImages() {
+    // Built for --bmp as well: a BMP alone must still be written.
+    if (settings_.flat.empty() && settings_.jpeg.empty() && settings_.bmp.empty())
+        return;
+    BayerImage flattened = std::move(context_.corrected);
+    flattened.copyMetadata(input_);
+    if (!settings_.flat.empty()) {
+        out() << "Writing flattened image." << std::endl;
+        flattened.storeKqraw(settings_.flat);
+        timerLine(timer_, "Flattened raw image save time: ", out());
+    }
+    if (!settings_.jpeg.empty()) {
+        out() << "Writing flattened jpeg image." << std::endl;
+        flattened.storeJpeg(settings_.jpeg, settings_.jpegQuality);
+        timerLine(timer_, "Flattened JPEG image save time: ", out());
+    }
+    if (!settings_.bmp.empty()) {
+        out() << "Writing flattened bmp image." << std::endl;
+        flattened.storeBmp(settings_.bmp);
+        timerLine(timer_, "Flattened BMP image save time: ", out());
+    }
 }
 
 void Pipeline::finish() {
