@@ -35,6 +35,13 @@ inline constexpr char kNoGreenSignal[] =
 inline constexpr char kIdentityMismatch[] =
     "WARNING - Not all output image pixels match input image pixels.";
 
+// Binary calibration data
+inline constexpr char kBinaryNeedsCalibrate[] =
+    "Binary calibration data (--binary) can only be built with a calibration register file "
+    "(--calibrate).";
+inline constexpr char kCannotStoreBinary[] = "Cannot store binary calibration file.";
+inline constexpr char kCannotLoadBinary[] = "Cannot load binary calibration file.";
+
 // Headerless raw input
 inline constexpr char kDetailsUnreadable[] = "Unable to read headerless raw image details file.";
 inline constexpr char kDetailsUnreadableHint[] =

@@ -1,13 +1,18 @@
 #include "driver/pipeline.h"
 
+#include "blob/blob_dump.h"
+#include "blob/blob_parser.h"
+#include "blob/blob_writer.h"
 #include "config/config_file.h"
 #include "config/fit_settings.h"
 #include "config/parameter_table.h"
+#include "config/patch_geometry_check.h"
 #include "config/register_file.h"
 #include "driver/driver_messages.h"
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
 #include "driver/version.h"
+#include "image/output_file.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
 #include "lsc/sample_collection.h"
@@ -23,13 +28,34 @@
 #include <boost/date_time/posix_time/posix_time.hpp>
 
 #include <algorithm>
+#include <fstream>
 #include <iostream>
+#include <iterator>
 #include <stdexcept>
 
 namespace {
 
 std::ostream& out() {
     return messageStream;
+}
+
+// The binary data name the tool that wrote them with the program's own
+// version; the text dump of a freshly generated blob names its generator
+// component with that component's version.
+constexpr blob::ToolVersion kBlobToolVersion = {lscversion::kMajor, lscversion::kMinor,
+                                                lscversion::kPatch};
+constexpr char kBlobGeneratorName[] = "BlobGenerator";
+constexpr char kBlobGeneratorVersion[] = "1.7.2";
+
+std::vector<std::uint8_t> readWholeFile(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    if (!in)
+        throw std::runtime_error(msg::kCannotLoadBinary);
+    std::vector<std::uint8_t> bytes((std::istreambuf_iterator<char>(in)),
+                                    std::istreambuf_iterator<char>());
+    if (in.bad())
+        throw std::runtime_error(msg::kCannotLoadBinary);
+    return bytes;
 }
 
 // "<label>R/G" and "<label>B/G" with six significant digits; G is the larger green.
@@ -49,6 +75,10 @@ Pipeline::Pipeline()
 
 int Pipeline::run(int argc, const char* const argv[]) {
     commandLine_ = CommandLine::parse(argc, argv, std::cout, std::cerr);
+    // The binary data are built from the register file: without one there is
+    // nothing to build them from.
+    if (!commandLine_.value("binary").empty() && commandLine_.value("calibrate").empty())
+        throw std::runtime_error(msg::kBinaryNeedsCalibrate);
     readConfiguration();
     openMessages();
     loadInput();
@@ -64,6 +94,8 @@ int Pipeline::run(int argc, const char* const argv[]) {
     obtainSamples();
     fitSurface();
     writeRegisterFile();
+    if (!settings_.binary.empty())
+        writeBinaryData();
     correct();
     balanceWhite();
     measureColourError();
@@ -268,6 +300,44 @@ void Pipeline::writeRegisterFile() {
                             input_);
     }
     timerLine(timer_, "Lens shading calculation time: ", out());
+}
+
+void Pipeline::writeBinaryData() {
+    out() << "Reading calibration data." << std::endl;
+    read_config_file(settings_.calibrate, *config_);
+    if (!settings_.autofocus.empty()) {
+        out() << "Reading autofocus calibration data." << std::endl;
+        read_config_file(settings_.autofocus, *config_);
+    }
+    const blob::BlobSources sources = blob::blobSourcesFromConfig(*config_);
+    timerLine(timer_, "Read calibration time: ", out());
+
+    out() << "Generating binary calibration data." << std::endl;
+    const std::vector<std::uint8_t> bytes = blob::generateBlob(sources, kBlobToolVersion, out());
+    if (config_->find_path("blob.log_flag").as_bool()) {
+        config_node_impl scratch("root");
+        const blob::BlobVersions versions = blob::parseBlob(
+            bytes.data(), bytes.size(), scratch.child("calibration"), scratch.child("config"));
+        blob::writeCalibrationText(scratch.child("calibration"), settings_.blockName + ".",
+                                   scratch.child("config"), kBlobGeneratorName,
+                                   kBlobGeneratorVersion, versions, std::cout);
+    }
+    timerLine(timer_, "Binary data construction time: ", out());
+
+    if (!writeWholeFile(settings_.binary, bytes.data(), bytes.size()))
+        throw std::runtime_error(msg::kCannotStoreBinary);
+    timerLine(timer_, "Binary data save time: ", out());
+
+    out() << "Reading binary calibration data." << std::endl;
+    const std::vector<std::uint8_t> stored = readWholeFile(settings_.binary);
+    timerLine(timer_, "Binary data reading time: ", out());
+    config_node_impl storedRoot("root");
+    config_node& data = storedRoot.child("module").child("lsc");
+    blob::parseBlob(stored.data(), stored.size(), data, storedRoot.child("config"));
+    timerLine(timer_, "Binary data parsing time: ", out());
+    // From here on the correction uses the control points as stored.
+    readConfigParam(*root_, data, context_);
+    timerLine(timer_, "Binary data transfer time: ", out());
 }
 
 void Pipeline::correct() {
