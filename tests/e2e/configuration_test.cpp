@@ -150,11 +150,11 @@ TEST_F(Configuration, UnwritableLogEndsWith240) {
 }
 
 TEST_F(Configuration, SensorSizeMustMatchTheImage) {
-    prepare("lsc.imageWidth = 480; lsc.imageHeight = 359;");
+    prepare("lsc.imageWidth = 640; lsc.imageHeight = 479;");
     auto result = calibrate();
     EXPECT_EQ(result.status, 1);
-    EXPECT_TRUE(hasLine(result.out, "ERROR: Input image dimensions (480x360) do not match "
-                                    "expected dimensions for sensor (480x359)."))
+    EXPECT_TRUE(hasLine(result.out, "ERROR: Input image dimensions (640x480) do not match "
+                                    "expected dimensions for sensor (640x479)."))
         << result.out;
     // Only one of the two given: not compared.
     write("lsc.cfg", "lsc.imageWidth = 100;");
@@ -165,15 +165,15 @@ TEST_F(Configuration, SensorSizeMustMatchTheImage) {
 TEST_F(Configuration, SettingsAreCheckedAgainstTheImageSize) {
     prepare();
     const ErrorCase cases[] = {
-        {"lsc.left_patch_width = 241;",
+        {"lsc.left_patch_width = 321;",
          "ERROR: Value specified for lsc.left_patch_width is too high, value must be between 0 and "
-         "240."},
-        {"lsc.left_patch_width = 120; lsc.center_patch_width = 240; lsc.top_patch_height = 181;",
+         "320."},
+        {"lsc.left_patch_width = 160; lsc.center_patch_width = 320; lsc.top_patch_height = 241;",
          "ERROR: Value specified for lsc.top_patch_height is too high, value must be between 0 "
-         "and 180."},
-        {"lsc.awb_avg_filter_size = 121;",
+         "and 240."},
+        {"lsc.awb_avg_filter_size = 161;",
          "ERROR: Value specified for lsc.awb_avg_filter_size is too high, value must be between 1 "
-         "and 120."},
+         "and 160."},
         {"proc.black_level = 1024;",
          "ERROR: Value specified for proc.black_level is too high, value must be between 0 and "
          "1023."},

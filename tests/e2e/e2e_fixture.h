@@ -22,8 +22,8 @@ using testing_support::ToolResult;
 // default white-balance filter of 100 pixels needs a width of at least 400).
 inline FlatFieldSpec smallSpec() {
     FlatFieldSpec spec;
-    spec.width = 480;
-    spec.height = 360;
+    spec.width = 640;
+    spec.height = 480;
     return spec;
 }
 

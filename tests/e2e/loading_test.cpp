@@ -26,7 +26,7 @@ protected:
         return run(args);
     }
     static std::string details(const std::string& extra = "") {
-        return "image.width = 480\nimage.height = 360\n" + extra;
+        return "image.width = 640\nimage.height = 480\n" + extra;
     }
 };
 
@@ -63,7 +63,7 @@ TEST_F(Loading, RunPrintsEveryStageLineInOrder) {
         "Preprocessed image data:",
         "Minimum pixel value = 208",
         "Maximum pixel value = 818",
-        "Average pixel value = 514.72",
+        "Average pixel value = 514.85",
         "Image pixels within specified parameters.",
         "Image pixels within specified parameters.",
     };
@@ -156,7 +156,7 @@ TEST_F(Loading, HeaderlessRawReadsAndTranslates) {
     const auto result = calibrateHeaderless({"-z", "translated.kqraw"});
     ASSERT_EQ(result.status, 0) << result.out;
     EXPECT_TRUE(hasLine(result.out, "Exposure time = 20"));
-    EXPECT_TRUE(hasLine(result.out, "Average pixel value = 514.72"));
+    EXPECT_TRUE(hasLine(result.out, "Average pixel value = 514.85"));
     // The translated container holds the same image and capture data.
     const auto fromTranslation =
         run({"-c", "lsc.cfg", "-i", "translated.kqraw", "-l", "cal.txt"});
@@ -188,18 +188,18 @@ TEST_F(Loading, HeaderlessErrorsCarryTheirCodesAndHints) {
          "incorrect serial number entered in headerless raw details file.\n"},
         {details("image.bayer_order = rggb\n"), 1,
          "ERROR: Invalid image.bayer_order value 'rggb' in headerless raw details file.\n"},
-        {"image.height = 360\n", 1, "ERROR: Missing image.width in headerless raw details file.\n"},
-        {"image.width = -480\nimage.height = 360\n", 1,
-         "ERROR: Invalid image.width value -480 in headerless raw details file (must be 1 to "
+        {"image.height = 480\n", 1, "ERROR: Missing image.width in headerless raw details file.\n"},
+        {"image.width = -640\nimage.height = 480\n", 1,
+         "ERROR: Invalid image.width value -640 in headerless raw details file (must be 1 to "
          "65535).\n"},
         {details("image.bit_res = 0\n"), 1,
          "ERROR: Invalid image.bit_res value 0 in headerless raw details file (must be 1 to "
          "16).\n"},
-        {"image.width = 480\nimage.height = 359\n", 202,
+        {"image.width = 640\nimage.height = 479\n", 202,
          "ERROR(202): Invalid headerless raw file configuration.\nThe number of pixels in the "
          "headerless raw file did not match the image size specified in the headerless raw "
          "configuration file.\n"},
-        {"image.width = 480\nimage.height = 361\n", 202,
+        {"image.width = 640\nimage.height = 481\n", 202,
          "ERROR(202): Unable to read raw scan line.\nThe number of bytes read in headerless raw "
          "file did not match the scan line size. File likely truncated.\n"},
     };
