@@ -1,6 +1,14 @@
 // Loading a 12-megapixel 10-bit container: the whole load with normalisation
 // against the plain cost of reading the file into memory, plus its parts.
 
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <string>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+
 #include "image/bayer_image.h"
 #include "image/image_result.h"
 #include "image/raw_reader.h"
@@ -8,15 +16,8 @@
 #include "image/sample_scaling.h"
 #include "tests/support/flat_field.h"
 
-#include <benchmark/benchmark.h>
-
-#include <cstdio>
-#include <cstdlib>
-#include <fstream>
-#include <string>
 #include <sys/mman.h>
 #include <unistd.h>
-#include <vector>
 
 namespace {
 
@@ -40,8 +41,8 @@ public:
                                       .capture(33.0f, gains)
                                       .sensorInfo("", "0a1b2c3d", "")
                                       .bytes();
-        std::ofstream(path_, std::ios::binary).write(bytes.data(),
-                                                     static_cast<std::streamsize>(bytes.size()));
+        std::ofstream(path_, std::ios::binary)
+            .write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
         size_ = bytes.size();
     }
     ~ContainerFile() { std::remove(path_.c_str()); }

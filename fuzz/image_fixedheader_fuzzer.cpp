@@ -3,14 +3,14 @@
 // input is spread over one: its first 112 bytes are the named fields, the
 // rest lands at the end marker (+298668) and the pixels behind it.
 
+#include <cstdint>
+#include <cstring>
+#include <vector>
+
 #include "image/byte_source.h"
 #include "image/image_buffer.h"
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
-
-#include <cstdint>
-#include <cstring>
-#include <vector>
 
 namespace {
 

@@ -1,11 +1,11 @@
 // The chunked container parser on arbitrary bytes; what it accepts is copied
 // and written back, so the block forms are exercised end to end.
 
-#include "image/byte_source.h"
-#include "image/kqraw_container.h"
-
 #include <cstdint>
 #include <cstdio>
+
+#include "image/byte_source.h"
+#include "image/kqraw_container.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     img::MemorySource source(data, size, "fuzz");

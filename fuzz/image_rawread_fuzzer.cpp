@@ -1,13 +1,13 @@
 // The generic raw reader. An input whose first byte is odd also answers the
 // console questions: bytes 1-28 give the layout, the rest is the file.
 
+#include <cstdint>
+#include <cstring>
+
 #include "image/byte_source.h"
 #include "image/image_buffer.h"
 #include "image/raw_prompt.h"
 #include "image/raw_reader.h"
-
-#include <cstdint>
-#include <cstring>
 
 namespace {
 

@@ -3,9 +3,9 @@
 // word, first letter in the most significant byte (so the little-endian file
 // bytes of RGGB read "BGGR").
 
-#include "image/image_buffer.h"
-
 #include <cstdint>
+
+#include "image/image_buffer.h"
 
 namespace img {
 
@@ -17,22 +17,32 @@ constexpr std::uint32_t kBayerCodeGbrg = 0x47425247;
 // 0 for any pattern other than the four Bayer orders.
 inline std::uint32_t bayerCodeOfCfa(std::uint32_t cfa1) {
     switch (cfa1) {
-    case kCfaRggb: return kBayerCodeRggb;
-    case kCfaBggr: return kBayerCodeBggr;
-    case kCfaGrbg: return kBayerCodeGrbg;
-    case kCfaGbrg: return kBayerCodeGbrg;
-    default: return 0;
+    case kCfaRggb:
+        return kBayerCodeRggb;
+    case kCfaBggr:
+        return kBayerCodeBggr;
+    case kCfaGrbg:
+        return kBayerCodeGrbg;
+    case kCfaGbrg:
+        return kBayerCodeGbrg;
+    default:
+        return 0;
     }
 }
 
 // cfa 0 for any other code.
 inline std::uint32_t cfaOfBayerCode(std::uint32_t code) {
     switch (code) {
-    case kBayerCodeRggb: return kCfaRggb;
-    case kBayerCodeBggr: return kCfaBggr;
-    case kBayerCodeGrbg: return kCfaGrbg;
-    case kBayerCodeGbrg: return kCfaGbrg;
-    default: return 0;
+    case kBayerCodeRggb:
+        return kCfaRggb;
+    case kBayerCodeBggr:
+        return kCfaBggr;
+    case kBayerCodeGrbg:
+        return kCfaGrbg;
+    case kBayerCodeGbrg:
+        return kCfaGbrg;
+    default:
+        return 0;
     }
 }
 

@@ -1,5 +1,10 @@
 #include "image/bayer_image.h"
 
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <stdexcept>
+
 #include "image/hex_text.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
@@ -8,11 +13,6 @@
 #include "image/raw_metadata.h"
 #include "image/raw_reader.h"
 #include "image/sample_scaling.h"
-
-#include <cstdlib>
-#include <cstring>
-#include <memory>
-#include <stdexcept>
 
 namespace {
 
@@ -23,13 +23,16 @@ namespace {
 // Copy metadata with the object's messages for each failure.
 void copyMetadataOrThrow(ImageBuffer* target, const ImageBuffer* source) {
     switch (img::copyRawMetadata(target, source)) {
-    case img::MetadataCopy::kCopied: return;
-    case img::MetadataCopy::kTargetHasFileType: fail(img::msg::kAlreadyHasFileType);
-    case img::MetadataCopy::kCopyFailed: fail(img::msg::kCannotCopyMetadata);
-    case img::MetadataCopy::kOutOfMemory: fail(img::msg::kCannotAllocateMetadata);
+    case img::MetadataCopy::kCopied:
+        return;
+    case img::MetadataCopy::kTargetHasFileType:
+        fail(img::msg::kAlreadyHasFileType);
+    case img::MetadataCopy::kCopyFailed:
+        fail(img::msg::kCannotCopyMetadata);
+    case img::MetadataCopy::kOutOfMemory:
+        fail(img::msg::kCannotAllocateMetadata);
     }
 }
-
 
 // Capture data of a headerless raw file as a container: header block, capture
 // block and SENSORINFO with the serial number. Null when out of memory.
@@ -98,8 +101,8 @@ void BayerImage::createFromHeaderless(std::int32_t width, std::int32_t height, s
                                       const std::string& sensorGuid, bool fixedHeader) {
     buffer_.reset();
     int rc = img::kOk;
-    ImagePtr image(imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa,
-                               kDataReal32, &rc));
+    ImagePtr image(
+        imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
     if (!image)
         fail(img::msg::kCannotAllocateImage);
     if (fixedHeader) {
@@ -139,10 +142,9 @@ void BayerImage::copy(const BayerImage& source) {
         fail(img::msg::kCannotCopyImage);
     buffer_.reset();
     int rc = img::kOk;
-    ImagePtr image(imageCreate(from->width, from->height, from->bitsPerSample,
-                               from->samplesPerPixel, from->numberOfImages, from->cfa[0],
-                               from->cfa[1], from->pixelType, from->bufferType, from->dataType,
-                               &rc));
+    ImagePtr image(imageCreate(
+        from->width, from->height, from->bitsPerSample, from->samplesPerPixel, from->numberOfImages,
+        from->cfa[0], from->cfa[1], from->pixelType, from->bufferType, from->dataType, &rc));
     if (!image)
         fail(img::msg::kCannotCopyImage);
     if (from->data && image->data)

@@ -3,10 +3,10 @@
 // normalised so that 1.0 is the sensor's full scale, and turns the image
 // library's result codes into exceptions (std::runtime_error with a fixed text).
 
-#include "image/image_buffer.h"
-
 #include <cstdint>
 #include <string>
+
+#include "image/image_buffer.h"
 
 class BayerImage {
 public:
@@ -33,8 +33,8 @@ public:
                     std::uint16_t samplesPerPixel, std::uint32_t cfa0, std::uint32_t cfa1,
                     std::uint32_t pixelType, std::uint32_t bufferType);
 
-    void copy(const BayerImage& source);           // pixels and metadata
-    void copyMetadata(const BayerImage& source);   // metadata and raw header only
+    void copy(const BayerImage& source);         // pixels and metadata
+    void copyMetadata(const BayerImage& source); // metadata and raw header only
 
     // Rounds the samples back to the bit depth and writes them in the file
     // type the image carries: KQRAW2, KQRAW (also for an NKRAW image, whose

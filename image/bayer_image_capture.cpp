@@ -1,7 +1,6 @@
 // The capture data that a Bayer image carries in its raw header.
 
 #include "image/bayer_image.h"
-
 #include "image/hex_text.h"
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
@@ -65,8 +64,8 @@ std::string BayerImage::serialNumber(std::size_t maxLength) const {
     }
     if (const KqRawFixedHeader* header = fixedHeaderOf(buffer_.get())) {
         // The field holds 16 bytes; what lies behind it is not serial number.
-        const std::size_t bytes = maxLength / 2 < kqfix::kSerialSize ? maxLength / 2
-                                                                     : kqfix::kSerialSize;
+        const std::size_t bytes =
+            maxLength / 2 < kqfix::kSerialSize ? maxLength / 2 : kqfix::kSerialSize;
         return img::hexOfBytes(header->bytes + kqfix::kSerial, bytes);
     }
     return std::string();

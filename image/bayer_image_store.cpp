@@ -1,8 +1,9 @@
 // Writing a Bayer image out: as 16-bit raw samples (KQRAW files) or, through
 // the demosaic, as 8-bit RGB (JPEG and BMP).
 
-#include "image/bayer_image.h"
+#include <stdexcept>
 
+#include "image/bayer_image.h"
 #include "image/demosaic.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
@@ -10,8 +11,6 @@
 #include "image/raw_metadata.h"
 #include "image/raw_writer.h"
 #include "image/sample_scaling.h"
-
-#include <stdexcept>
 
 namespace {
 
@@ -40,8 +39,7 @@ void BayerImage::storeKqraw(const std::string& path) const {
     int rc = img::kOk;
     ImagePtr raw(imageCreate(image->width, image->height, image->bitsPerSample,
                              image->samplesPerPixel, image->numberOfImages, image->cfa[0],
-                             image->cfa[1], image->pixelType, image->bufferType, kDataUint16,
-                             &rc));
+                             image->cfa[1], image->pixelType, image->bufferType, kDataUint16, &rc));
     if (!raw)
         fail(img::msg::kCannotStoreKqraw);
     img::quantiseSamples(static_cast<const float*>(image->data), imageTotalSamples(image, -1),

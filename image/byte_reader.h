@@ -3,11 +3,11 @@
 // overrun ok() stays false and every further read gives 0, so a parser can
 // read a whole header and check once.
 
-#include "image/byte_order.h"
-
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+
+#include "image/byte_order.h"
 
 namespace img {
 

@@ -1,12 +1,13 @@
 #include "image/byte_source.h"
 
-#include "image/image_result.h"
-
 #include <cstdlib>
 #include <cstring>
 #include <limits>
 #include <memory>
 #include <new>
+
+#include "image/image_result.h"
+
 #include <sys/stat.h>
 #include <sys/types.h>
 

@@ -6,7 +6,8 @@ namespace img::msg {
 // Bayer image object: the texts of its runtime errors.
 inline constexpr char kCannotReadKqraw[] = "Cannot read kqraw image.";
 inline constexpr char kCannotAllocateImage[] = "Unable to allocate image memory.";
-inline constexpr char kCannotAllocateMetadataHeaderless[] = "Unable to allocate kqraw image metadata";
+inline constexpr char kCannotAllocateMetadataHeaderless[] =
+    "Unable to allocate kqraw image metadata";
 inline constexpr char kCannotAllocateMetadata[] = "Unable to allocate kqraw image metadata.";
 inline constexpr char kCannotCopyImage[] = "Unable to copy image.";
 inline constexpr char kAlreadyHasFileType[] = "Cannot copy metadata, image already has file type.";
@@ -14,7 +15,8 @@ inline constexpr char kCannotCopyMetadata[] = "Cannot copy image metadata.";
 inline constexpr char kCannotStoreKqraw[] = "Cannot store kqraw image.";
 inline constexpr char kCannotStoreJpeg[] = "Cannot store jpeg image.";
 inline constexpr char kCannotStoreBmp[] = "Cannot store BMP image.";
-inline constexpr char kNotStorableAsJpeg[] = "Image configuration cannot be stored as a jpeg image.";
+inline constexpr char kNotStorableAsJpeg[] =
+    "Image configuration cannot be stored as a jpeg image.";
 inline constexpr char kInvalidBayerPattern[] = "Invalid Bayer pattern in image file.";
 
 // Raw reader warnings on the error stream.
@@ -31,9 +33,8 @@ inline constexpr char kPromptIntro[] = "Read input file as RAW with or without h
 inline constexpr char kPromptWidth[] = "RAW Image Width = ";
 inline constexpr char kPromptHeight[] = "RAW Image Height= ";
 inline constexpr char kPromptBitDepth[] = "RAW Bit Depth (1-16) = ";
-inline constexpr char kPromptBitDepthError[] =
-    "ERROR: Bit Depth must be between 1 and 16 "
-    "inclusive\n";
+inline constexpr char kPromptBitDepthError[] = "ERROR: Bit Depth must be between 1 and 16 "
+                                               "inclusive\n";
 inline constexpr char kPromptBayer[] = "RAW Bayer Type (1=RGGB, 2=BGGR, 3=GRBG, 4=GBRG) = ";
 inline constexpr char kPromptBayerError[] = "ERROR: Invalid choice of RAW Bayer Type\n";
 inline constexpr char kPromptEndian[] = "Data in Little-Endian ? (Y/N) : ";

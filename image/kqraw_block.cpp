@@ -1,5 +1,9 @@
 #include "image/kqraw_block.h"
 
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+
 #include "image/byte_order.h"
 #include "image/byte_reader.h"
 #include "image/image_messages.h"
@@ -8,9 +12,6 @@
 #include "image/raw_samples.h"
 #include "image/sample_memory.h"
 
-#include <cstdlib>
-#include <cstring>
-#include <memory>
 #include <sys/time.h>
 
 namespace {
@@ -31,7 +32,8 @@ int stringCount(const KqRawBlock* block) {
 // The payload size that kqrawBlockWrite produces for the block's current content.
 std::uint64_t contentSize(const KqRawBlock* block) {
     switch (block->form) {
-    case KqRawForm::kPixels: return kKqRawPixelLeadSize + 2 * block->sampleCount;
+    case KqRawForm::kPixels:
+        return kKqRawPixelLeadSize + 2 * block->sampleCount;
     case KqRawForm::kText:
     case KqRawForm::kSensorInfo: {
         std::uint64_t size = block->form == KqRawForm::kSensorInfo ? 4 : 0;
@@ -39,7 +41,8 @@ std::uint64_t contentSize(const KqRawBlock* block) {
             size += 4 + std::uint64_t{block->strings[i].length};
         return size + block->tailSize;
     }
-    case KqRawForm::kOpaque: break;
+    case KqRawForm::kOpaque:
+        break;
     }
     return block->size;
 }
@@ -151,9 +154,9 @@ KqRawBlock* kqrawBlockClone(const KqRawBlock* source) noexcept {
     if (source->payload && !(block->payload = duplicateBytes(source->payload, source->size)))
         return nullptr;
     if (source->samples) {
-        block->samples = reinterpret_cast<std::uint16_t*>(duplicateBytes(
-            reinterpret_cast<const std::uint8_t*>(source->samples),
-            static_cast<std::size_t>(source->sampleCount * 2)));
+        block->samples = reinterpret_cast<std::uint16_t*>(
+            duplicateBytes(reinterpret_cast<const std::uint8_t*>(source->samples),
+                           static_cast<std::size_t>(source->sampleCount * 2)));
         if (!block->samples)
             return nullptr;
     }
@@ -222,7 +225,7 @@ bool kqrawBlockSetString(KqRawBlock* block, int index, const char* text) noexcep
     if (length > UINT32_MAX)
         return false;
     const KqRawString previous = block->strings[index];
-    block->strings[index].text = nullptr;  // copyString frees what it replaces
+    block->strings[index].text = nullptr; // copyString frees what it replaces
     if (!copyString(&block->strings[index], text ? text : "", length)) {
         block->strings[index] = previous;
         return false;
@@ -391,7 +394,8 @@ bool kqrawBlockWrite(const KqRawBlock* block, std::FILE* file) noexcept {
         !write32(file, block->size))
         return false;
     switch (block->form) {
-    case KqRawForm::kOpaque: return writeAll(file, block->payload, block->size);
+    case KqRawForm::kOpaque:
+        return writeAll(file, block->payload, block->size);
     case KqRawForm::kPixels:
         return writeAll(file, block->lead, kKqRawPixelLeadSize) &&
                img::writeSamplesLE(file, block->samples, block->sampleCount);

@@ -5,18 +5,18 @@
 // parsed strings and PIXELDATA as 16-bit samples in host order; every other
 // block keeps its payload byte for byte. Procedural and noexcept.
 
-#include "image/byte_source.h"
-
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <memory>
 
+#include "image/byte_source.h"
+
 constexpr std::size_t kKqRawTagSize = 16;
 constexpr std::size_t kKqRawBlockHeaderSize = 36;
 constexpr std::uint32_t kKqRawFileHeaderPayloadSize = 36;
 constexpr std::uint32_t kKqRawCapturePayloadSize = 56;
-constexpr std::uint32_t kKqRawPixelLeadSize = 8;  // the two words before the samples
+constexpr std::uint32_t kKqRawPixelLeadSize = 8; // the two words before the samples
 
 namespace kqtag {
 inline constexpr char kFileHeader[] = "KQRAWFILE_111107";
@@ -42,22 +42,22 @@ constexpr std::uint32_t kVersion = 0, kExposureTime = 4, kSecondValue = 8, kCarr
 enum class KqRawForm : std::uint8_t { kOpaque, kPixels, kText, kSensorInfo };
 
 struct KqRawString {
-    char* text;            // malloc'd, with a terminator added
-    std::uint32_t length;  // bytes in the file (the text may hold zero bytes)
+    char* text;           // malloc'd, with a terminator added
+    std::uint32_t length; // bytes in the file (the text may hold zero bytes)
 };
 
 struct KqRawBlock {
     std::uint8_t tag[kKqRawTagSize];
-    std::uint8_t reserved[16];  // zeros in new blocks; carried as read otherwise
-    std::uint32_t size;         // payload size; always what kqrawBlockWrite writes
+    std::uint8_t reserved[16]; // zeros in new blocks; carried as read otherwise
+    std::uint32_t size;        // payload size; always what kqrawBlockWrite writes
     KqRawForm form;
-    std::uint8_t* payload;      // kOpaque: `size` bytes
-    std::uint8_t lead[kKqRawPixelLeadSize];  // kPixels: payload +0 and +4
-    std::uint16_t* samples;     // kPixels: sampleCount samples, host order
+    std::uint8_t* payload;                  // kOpaque: `size` bytes
+    std::uint8_t lead[kKqRawPixelLeadSize]; // kPixels: payload +0 and +4
+    std::uint16_t* samples;                 // kPixels: sampleCount samples, host order
     std::uint64_t sampleCount;
-    std::uint32_t infoWord;     // kSensorInfo: payload +0
-    KqRawString strings[3];     // kText: [0]; kSensorInfo: all three
-    std::uint8_t* tail;         // kText, kSensorInfo: bytes behind the strings, carried
+    std::uint32_t infoWord; // kSensorInfo: payload +0
+    KqRawString strings[3]; // kText: [0]; kSensorInfo: all three
+    std::uint8_t* tail;     // kText, kSensorInfo: bytes behind the strings, carried
     std::uint32_t tailSize;
 };
 
@@ -71,10 +71,10 @@ KqRawBlock* kqrawBlockClone(const KqRawBlock* block) noexcept;
 
 // Constructors; null when out of memory (or, for pixels, when the samples do
 // not fit a 32-bit size field).
-KqRawBlock* kqrawBlockCreateHeader() noexcept;  // payload 36, creation time now
+KqRawBlock* kqrawBlockCreateHeader() noexcept; // payload 36, creation time now
 KqRawBlock* kqrawBlockCreatePixels(const std::uint16_t* samples, std::uint64_t count) noexcept;
-KqRawBlock* kqrawBlockCreateCapture() noexcept;     // payload 56, +0 = 2
-KqRawBlock* kqrawBlockCreateSensorInfo() noexcept;  // +0 = 1, three empty strings
+KqRawBlock* kqrawBlockCreateCapture() noexcept;    // payload 56, +0 = 2
+KqRawBlock* kqrawBlockCreateSensorInfo() noexcept; // +0 = 1, three empty strings
 KqRawBlock* kqrawBlockCreateComment(const char* text) noexcept;
 KqRawBlock* kqrawBlockCreateMakerNote(const char* text) noexcept;
 

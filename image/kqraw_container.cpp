@@ -1,15 +1,15 @@
 #include "image/kqraw_container.h"
 
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+
 #include "image/byte_order.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
 #include "image/image_warning.h"
 #include "image/kqraw_fixed_header.h"
 #include "image/output_file.h"
-
-#include <cstdlib>
-#include <cstring>
-#include <memory>
 
 namespace {
 
@@ -135,7 +135,7 @@ bool roomForOrdinaryBlock(const KqRawContainer* container) {
 int keepBlock(KqRawContainer* container, KqRawBlock* block, const char* sourceName) {
     if (kqrawBlockHasTag(block, kqtag::kFileHeader)) {
         if (!kqrawContainerSetHeader(container, block))
-            return img::kRawBadContainer;  // a header block of the wrong size
+            return img::kRawBadContainer; // a header block of the wrong size
         return img::kOk;
     }
     if (kqrawBlockHasTag(block, kqtag::kPixels))
@@ -178,8 +178,8 @@ KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result) noexce
         }
         if (rc != img::kOk) {
             // Blocks cut short or malformed: the file is a container, but a broken one.
-            *result = rc == img::kSizeMismatch || rc == img::kWrongFormat ? img::kRawBadContainer
-                                                                          : rc;
+            *result =
+                rc == img::kSizeMismatch || rc == img::kWrongFormat ? img::kRawBadContainer : rc;
             return nullptr;
         }
     }

@@ -3,17 +3,17 @@
 // blocks in list order, with the positions of the file header block and the
 // pixel block. Procedural and noexcept.
 
-#include "image/byte_source.h"
-#include "image/kqraw_block.h"
-
 #include <cstdint>
 #include <memory>
+
+#include "image/byte_source.h"
+#include "image/kqraw_block.h"
 
 constexpr int kKqRawMaxBlocks = 100;
 
 struct KqRawContainer {
-    int headerIndex;  // -1 = none
-    int pixelIndex;   // -1 = none
+    int headerIndex; // -1 = none
+    int pixelIndex;  // -1 = none
     int count;
     KqRawBlock* blocks[kKqRawMaxBlocks];
 };

@@ -1,21 +1,20 @@
 #include "image/kqraw_fixed_header.h"
 
-#include "image/bayer_code.h"
-#include "image/byte_order.h"
-#include "image/image_messages.h"
-#include "image/image_result.h"
-#include "image/malloc_ptr.h"
-#include "image/image_warning.h"
-#include "image/raw_samples.h"
-
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 
+#include "image/bayer_code.h"
+#include "image/byte_order.h"
+#include "image/image_messages.h"
+#include "image/image_result.h"
+#include "image/image_warning.h"
+#include "image/malloc_ptr.h"
+#include "image/raw_samples.h"
+
 namespace {
 
 using HeaderPtr = img::MallocPtr<KqRawFixedHeader>;
-
 
 // Reads the header from the start of the source. -4 when the source is shorter.
 int readHeader(img::ByteSource& source, HeaderPtr* header) {
@@ -103,7 +102,8 @@ KqRawBlock* captureBlockOf(const KqRawFixedHeader* header) {
     if (!capture)
         return nullptr;
     kqrawBlockSetFloat(capture, kqcap::kExposureTime,
-                       static_cast<float>(kqrawFixedGet32(header, kqfix::kExposureFixed)) / 65536.0f);
+                       static_cast<float>(kqrawFixedGet32(header, kqfix::kExposureFixed)) /
+                           65536.0f);
     kqrawBlockSetFloat(capture, kqcap::kSecondValue,
                        static_cast<float>(kqrawFixedGet32(header, kqfix::kSecondValue)) / 65536.0f);
     kqrawBlockSet32(capture, kqcap::kCarried1, kqrawFixedGet32(header, kqfix::kExposureFloat));
@@ -135,7 +135,7 @@ int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** out) noexcep
     if (width == 0 || height == 0 || !img::samplesFit(source.size(), pixelOffset, width, height))
         return img::kRawBadContainer;
     const std::uint64_t count = std::uint64_t{width} * height;
-    if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2)  // a pixel block size is 32 bits
+    if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2) // a pixel block size is 32 bits
         return img::kRawBadContainer;
 
     KqRawContainerPtr container(kqrawContainerCreate());

@@ -3,11 +3,11 @@
 // little-endian fields, then the pixels. In memory the header is kept as its
 // file bytes, so unnamed fields travel unchanged.
 
+#include <cstdint>
+
 #include "image/byte_source.h"
 #include "image/image_buffer.h"
 #include "image/kqraw_container.h"
-
-#include <cstdint>
 
 struct KqRawFixedHeader {
     std::uint8_t bytes[kKqRawFixedHeaderSize];

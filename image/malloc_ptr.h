@@ -10,7 +10,6 @@ namespace img {
 struct FreeDeleter {
     void operator()(void* p) const noexcept { std::free(p); }
 };
-template <typename T>
-using MallocPtr = std::unique_ptr<T, FreeDeleter>;
+template <typename T> using MallocPtr = std::unique_ptr<T, FreeDeleter>;
 
 } // namespace img

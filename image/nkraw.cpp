@@ -1,21 +1,20 @@
 #include "image/nkraw.h"
 
-#include "image/byte_order.h"
-#include "image/bayer_code.h"
-#include "image/image_result.h"
-#include "image/malloc_ptr.h"
-#include "image/raw_samples.h"
-
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+
+#include "image/bayer_code.h"
+#include "image/byte_order.h"
+#include "image/image_result.h"
+#include "image/malloc_ptr.h"
+#include "image/raw_samples.h"
 
 int nkrawRead(img::ByteSource& source, ImageBuffer** out) noexcept {
     *out = nullptr;
     if (source.size() < kNkRawHeaderSize)
         return img::kWrongFormat;
-    img::MallocPtr<std::uint8_t> header(
-        static_cast<std::uint8_t*>(std::malloc(kNkRawHeaderSize)));
+    img::MallocPtr<std::uint8_t> header(static_cast<std::uint8_t*>(std::malloc(kNkRawHeaderSize)));
     if (!header)
         return img::kNoMemory;
     if (!source.seek(0) || !source.read(header.get(), kNkRawHeaderSize))
@@ -45,12 +44,12 @@ void nkrawCaptureToFixedHeader(const std::uint8_t* nk, KqRawFixedHeader* header)
     kqrawFixedSet32(header, kqfix::kExposureFixed,
                     static_cast<std::uint32_t>((microseconds * 65536 + 500000) / 1000000));
     const std::int64_t gainStep = img::loadLE32(nk + nkraw::kGainStep);
-    kqrawFixedSet32(header, kqfix::kSecondValue, static_cast<std::uint32_t>((gainStep - 8) * 16384));
+    kqrawFixedSet32(header, kqfix::kSecondValue,
+                    static_cast<std::uint32_t>((gainStep - 8) * 16384));
     const std::uint32_t numerator = img::loadLE32(nk + nkraw::kGainNumerator);
     const std::uint32_t denominator = img::loadLE32(nk + nkraw::kGainDenominator);
-    const float gain = denominator == 0 ? 0.0f
-                                        : static_cast<float>(numerator) /
-                                              static_cast<float>(denominator);
+    const float gain =
+        denominator == 0 ? 0.0f : static_cast<float>(numerator) / static_cast<float>(denominator);
     for (std::uint32_t c = 0; c < 4; ++c)
         kqrawFixedSetFloat(header, kqfix::kGain0 + 4 * c, gain);
 }

@@ -14,11 +14,11 @@
 //   everything else up to +102572 is carried unread; then width x height
 //   16-bit samples and nothing behind them.
 
+#include <cstdint>
+
 #include "image/byte_source.h"
 #include "image/image_buffer.h"
 #include "image/kqraw_fixed_header.h"
-
-#include <cstdint>
 
 namespace nkraw {
 inline constexpr char kMagic[] = "NKRAWHDR";

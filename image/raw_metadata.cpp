@@ -1,10 +1,10 @@
 #include "image/raw_metadata.h"
 
-#include "image/image_result.h"
-#include "image/kqraw_container.h"
-
 #include <cstdlib>
 #include <memory>
+
+#include "image/image_result.h"
+#include "image/kqraw_container.h"
 
 namespace img {
 
@@ -27,7 +27,7 @@ MetadataCopy copyRawMetadata(ImageBuffer* target, const ImageBuffer* source) noe
         }
         if (kqrawContainerCopyBlocks(container.get(), blocks) != kOk)
             return MetadataCopy::kOutOfMemory;
-        std::free(target->rawHeader);  // without a file type it can only be a plain block
+        std::free(target->rawHeader); // without a file type it can only be a plain block
         target->rawHeader = container.release();
     }
     target->fileType = kFileKqRaw2;

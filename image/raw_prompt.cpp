@@ -1,10 +1,10 @@
 #include "image/raw_prompt.h"
 
+#include <cstring>
+
 #include "image/image_buffer.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
-
-#include <cstring>
 
 namespace img {
 namespace {
@@ -23,7 +23,7 @@ public:
         if (length > 0 && line_[length - 1] == '\n') {
             line_[length - 1] = '\0';
         } else if (!std::feof(in_)) {
-            int c;  // the rest of an overlong line belongs to this answer
+            int c; // the rest of an overlong line belongs to this answer
             while ((c = std::fgetc(in_)) != EOF && c != '\n') {
             }
         }
@@ -92,13 +92,15 @@ int askRawLayout(std::FILE* in, std::FILE* out, std::FILE* err, RawLayout* layou
         console.number(msg::kPromptHeight, UINT32_MAX, &height) &&
         console.choice(msg::kPromptBitDepth, msg::kPromptBitDepthError, 1, 16, &bits) &&
         console.choice(msg::kPromptBayer, msg::kPromptBayerError, 1, 4, &bayer) &&
-        console.answer(msg::kPromptEndian) && [&] {
+        console.answer(msg::kPromptEndian) &&
+        [&] {
             const char* text = console.line();
             while (*text == ' ' || *text == '\t')
                 ++text;
             layout->littleEndian = *text == 'Y' || *text == 'y';
             return true;
-        }() && console.number(msg::kPromptImages, UINT32_MAX, &images) &&
+        }() &&
+        console.number(msg::kPromptImages, UINT32_MAX, &images) &&
         console.number(msg::kPromptHeaderSize, UINT64_MAX, &header);
     if (!complete) {
         std::fputs("\n", out);

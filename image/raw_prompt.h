@@ -10,8 +10,8 @@ namespace img {
 struct RawLayout {
     std::uint32_t width = 0;
     std::uint32_t height = 0;
-    std::uint32_t bitDepth = 0;  // 1..16
-    std::uint32_t cfa = 0;       // second cfa word of the chosen Bayer order
+    std::uint32_t bitDepth = 0; // 1..16
+    std::uint32_t cfa = 0;      // second cfa word of the chosen Bayer order
     bool littleEndian = true;
     std::uint32_t images = 0;
     std::uint64_t headerSize = 0;

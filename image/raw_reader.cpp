@@ -1,5 +1,8 @@
 #include "image/raw_reader.h"
 
+#include <cstdlib>
+#include <memory>
+
 #include "image/bayer_code.h"
 #include "image/image_result.h"
 #include "image/kqraw_container.h"
@@ -7,9 +10,6 @@
 #include "image/nkraw.h"
 #include "image/raw_prompt.h"
 #include "image/raw_samples.h"
-
-#include <cstdlib>
-#include <memory>
 
 namespace img {
 namespace {
@@ -62,9 +62,8 @@ int askOnConsole(void*, RawLayout* layout) {
 
 // Bytes a pixel of the layout takes: 1 or 2 (one sample), 3 or 6 (three).
 int pixelBytes(ByteSource& source, const RawLayout& layout) {
-    if (layout.width == 0 || layout.height == 0 || layout.images == 0 ||
-        layout.width > INT32_MAX || layout.height > INT32_MAX ||
-        layout.headerSize > source.size())
+    if (layout.width == 0 || layout.height == 0 || layout.images == 0 || layout.width > INT32_MAX ||
+        layout.height > INT32_MAX || layout.headerSize > source.size())
         return 0;
     const std::uint64_t pixels = std::uint64_t{layout.width} * layout.height;
     const std::uint64_t body = source.size() - layout.headerSize;
@@ -89,21 +88,19 @@ int readWithLayout(ByteSource& source, const RawLayout& layout, ImageBuffer** ou
         return kRawBadLayout;
     const bool colour = bytes == 3 || bytes == 6;
     int rc = kOk;
-    ImagePtr image(imageCreate(static_cast<std::int32_t>(layout.width),
-                               static_cast<std::int32_t>(layout.height),
-                               static_cast<std::uint16_t>(layout.bitDepth), colour ? 3 : 1,
-                               layout.images, 0, layout.cfa, colour ? kPixelRgb : kPixelRaw,
-                               colour ? kBufferInterleaved : kBufferRawCfa,
-                               wide ? kDataUint16 : kDataUint8, &rc));
+    ImagePtr image(imageCreate(
+        static_cast<std::int32_t>(layout.width), static_cast<std::int32_t>(layout.height),
+        static_cast<std::uint16_t>(layout.bitDepth), colour ? 3 : 1, layout.images, 0, layout.cfa,
+        colour ? kPixelRgb : kPixelRaw, colour ? kBufferInterleaved : kBufferRawCfa,
+        wide ? kDataUint16 : kDataUint8, &rc));
     if (!image)
         return rc;
     const std::uint64_t samples = imageTotalSamples(image.get(), -1);
     if (!source.seek(layout.headerSize))
         return kIoError;
-    const bool read =
-        wide ? readSamples16(source, static_cast<std::uint16_t*>(image->data), samples,
-                             layout.littleEndian)
-             : source.read(image->data, static_cast<std::size_t>(samples));
+    const bool read = wide ? readSamples16(source, static_cast<std::uint16_t*>(image->data),
+                                           samples, layout.littleEndian)
+                           : source.read(image->data, static_cast<std::size_t>(samples));
     if (!read)
         return kIoError;
     // A dump carries no header, so the flattened image can go back out as a dump.

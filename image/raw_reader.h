@@ -3,11 +3,11 @@
 // KQRAW2 container, an NKRAW file, or (asked on the console) a raw dump of a
 // layout given by the user.
 
-#include "image/byte_source.h"
-#include "image/image_buffer.h"
-
 #include <cstddef>
 #include <cstdint>
+
+#include "image/byte_source.h"
+#include "image/image_buffer.h"
 
 // Returns a RAW/RAW_CFA/UINT16 image (or, for a raw dump, what its layout
 // holds), or null with *result set: -1 the file cannot be opened; -2 read

@@ -1,9 +1,9 @@
 #include "image/raw_samples.h"
 
+#include <cstdint>
+
 #include "image/byte_order.h"
 #include "image/image_result.h"
-
-#include <cstdint>
 
 namespace img {
 
@@ -56,8 +56,8 @@ std::uint16_t bitsForLargestSample(std::uint16_t largest) noexcept {
 }
 
 void applyLargestSampleDepth(ImageBuffer* image) noexcept {
-    const std::uint16_t bits = bitsForLargestSample(
-        largestSample(static_cast<const std::uint16_t*>(image->data), imageTotalSamples(image, -1)));
+    const std::uint16_t bits = bitsForLargestSample(largestSample(
+        static_cast<const std::uint16_t*>(image->data), imageTotalSamples(image, -1)));
     image->bitsPerSample = bits;
     const float white = static_cast<float>(1u << bits);
     for (int channel = 0; channel < 4; ++channel) {
@@ -89,9 +89,8 @@ int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
                                16, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataUint16, &rc));
     if (!image)
         return rc == kBadArgument ? kSizeMismatch : rc;
-    if (!source.seek(offset) ||
-        !readSamplesLE(source, static_cast<std::uint16_t*>(image->data),
-                       std::uint64_t{width} * height))
+    if (!source.seek(offset) || !readSamplesLE(source, static_cast<std::uint16_t*>(image->data),
+                                               std::uint64_t{width} * height))
         return kIoError;
     applyLargestSampleDepth(image.get());
     *out = image.release();

@@ -2,11 +2,11 @@
 // 16-bit raw samples: little-endian in files, host order in memory, and the
 // bit depth that the raw readers derive from the largest sample.
 
-#include "image/byte_source.h"
-#include "image/image_buffer.h"
-
 #include <cstdint>
 #include <cstdio>
+
+#include "image/byte_source.h"
+#include "image/image_buffer.h"
 
 namespace img {
 

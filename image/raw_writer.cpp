@@ -1,18 +1,18 @@
 #include "image/raw_writer.h"
 
-#include "image/bayer_code.h"
-#include "image/byte_order.h"
-#include "image/image_result.h"
-#include "image/malloc_ptr.h"
-#include "image/kqraw_container.h"
-#include "image/kqraw_fixed_header.h"
-#include "image/nkraw.h"
-#include "image/output_file.h"
-#include "image/raw_samples.h"
-
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+
+#include "image/bayer_code.h"
+#include "image/byte_order.h"
+#include "image/image_result.h"
+#include "image/kqraw_container.h"
+#include "image/kqraw_fixed_header.h"
+#include "image/malloc_ptr.h"
+#include "image/nkraw.h"
+#include "image/output_file.h"
+#include "image/raw_samples.h"
 
 namespace {
 
@@ -50,8 +50,7 @@ int writeKqRaw(std::FILE* file, const ImageBuffer* image) {
     if (image->fileType == kFileKqRaw && image->rawHeader) {
         std::memcpy(header.get(), image->rawHeader, sizeof(KqRawFixedHeader));
     } else if (image->fileType == kFileNkRaw && image->rawHeader) {
-        nkrawCaptureToFixedHeader(static_cast<const std::uint8_t*>(image->rawHeader),
-                                  header.get());
+        nkrawCaptureToFixedHeader(static_cast<const std::uint8_t*>(image->rawHeader), header.get());
     }
     kqrawFixedSet32(header.get(), kqfix::kWidth, static_cast<std::uint32_t>(image->width));
     kqrawFixedSet32(header.get(), kqfix::kHeight, static_cast<std::uint32_t>(image->height));
@@ -69,7 +68,7 @@ int writeKqRaw(std::FILE* file, const ImageBuffer* image) {
 
 int writeKqRaw2(std::FILE* file, const ImageBuffer* image) {
     const std::uint64_t count = pixelCount(image);
-    if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2)  // the block size field is 32 bits
+    if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2) // the block size field is 32 bits
         return img::kUnsupported;
     const KqRawContainer* own = image->fileType == kFileKqRaw2
                                     ? static_cast<const KqRawContainer*>(image->rawHeader)
@@ -83,9 +82,8 @@ int writeKqRaw2(std::FILE* file, const ImageBuffer* image) {
     }
     // The image's container is left as it is: the new header and pixel
     // blocks are written in place of its own.
-    KqRawBlockPtr header(
-        own->headerIndex >= 0 ? kqrawBlockClone(own->blocks[own->headerIndex])
-                              : kqrawBlockCreateHeader());
+    KqRawBlockPtr header(own->headerIndex >= 0 ? kqrawBlockClone(own->blocks[own->headerIndex])
+                                               : kqrawBlockCreateHeader());
     if (!header)
         return img::kNoMemory;
     kqrawBlockSet32(header.get(), kqhdr::kWidth, static_cast<std::uint32_t>(image->width));
@@ -104,8 +102,7 @@ int writeKqRaw2(std::FILE* file, const ImageBuffer* image) {
     pixels.samples = const_cast<std::uint16_t*>(samplesOf(image));
     pixels.sampleCount = count;
     pixels.size = static_cast<std::uint32_t>(kKqRawPixelLeadSize + 2 * count);
-    return kqrawContainerWriteStream(own, file, header.get(), &pixels) ? img::kOk
-                                                                       : img::kIoError;
+    return kqrawContainerWriteStream(own, file, header.get(), &pixels) ? img::kOk : img::kIoError;
 }
 
 } // namespace
@@ -122,7 +119,7 @@ int rawWrite(const char* path, const ImageBuffer* image, std::uint32_t fileType)
     OutputFile output;
     if (!path || !output.open(path))
         return img::kBadArgument;
-    int rc = fileType == kFileFixRaw ? writeFixRaw(output.stream(), image)
+    int rc = fileType == kFileFixRaw  ? writeFixRaw(output.stream(), image)
              : fileType == kFileKqRaw ? writeKqRaw(output.stream(), image)
                                       : writeKqRaw2(output.stream(), image);
     if (rc != img::kOk) {

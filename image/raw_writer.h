@@ -2,9 +2,9 @@
 // Writes a 16-bit raw sensor image as a file of the given type: FIXRAW (bare
 // samples), KQRAW (fixed header) or KQRAW2 (chunked container).
 
-#include "image/image_buffer.h"
-
 #include <cstdint>
+
+#include "image/image_buffer.h"
 
 // Result: 0; -1 the file cannot be opened; -2 a write failed; -3 no memory;
 // -4 a file type other than FIXRAW, KQRAW or KQRAW2; -5 null image or no

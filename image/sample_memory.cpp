@@ -1,6 +1,7 @@
 #include "image/sample_memory.h"
 
 #include <cstdlib>
+
 #include <sys/mman.h>
 
 namespace img {
@@ -16,7 +17,7 @@ void* allocateSamples(std::size_t bytes) noexcept {
         void* block = nullptr;
         if (posix_memalign(&block, kHugePage, bytes) != 0)
             return nullptr;
-        madvise(block, bytes & ~(kHugePage - 1), MADV_HUGEPAGE);  // advice only: failure is fine
+        madvise(block, bytes & ~(kHugePage - 1), MADV_HUGEPAGE); // advice only: failure is fine
         return block;
     }
 #endif

@@ -42,9 +42,7 @@ void quantiseSamples(const float* in, std::uint64_t count, unsigned bits,
     for (std::uint64_t i = 0; i < count; ++i) {
         const float v = in[i] * scale + 0.5f;
         // Written so that NaN fails the first test and lands on 0.
-        out[i] = !(v > 0.0f)       ? 0
-                 : v >= scale      ? largest
-                                   : static_cast<std::uint16_t>(v);
+        out[i] = !(v > 0.0f) ? 0 : v >= scale ? largest : static_cast<std::uint16_t>(v);
     }
 }
 

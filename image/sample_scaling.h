@@ -3,9 +3,9 @@
 // the Bayer image object holds (1.0 = full scale of the bit depth). Each runs
 // once over the data.
 
-#include "image/image_buffer.h"
-
 #include <cstdint>
+
+#include "image/image_buffer.h"
 
 namespace img {
 

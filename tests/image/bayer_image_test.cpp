@@ -1,14 +1,13 @@
-#include "image/bayer_image.h"
+#include <functional>
+#include <stdexcept>
 
+#include <gtest/gtest.h>
+
+#include "image/bayer_image.h"
 #include "image/kqraw_container.h"
 #include "raw_test_files.h"
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
-#include <functional>
-#include <stdexcept>
 
 namespace {
 
@@ -64,7 +63,7 @@ std::string tenBitContainer(const std::vector<std::uint16_t>& samples) {
 TEST_F(BayerImageTest, ReadNormalisesByTheBitDepth) {
     BayerImage image = load(tenBitContainer({0, 1023, 512, 0xFC00 | 1}));
     EXPECT_EQ(image.buffer()->dataType, kDataReal32);
-    EXPECT_EQ(image.bitsPerSample(), 16);  // 0xFC01 is a 16-bit sample
+    EXPECT_EQ(image.bitsPerSample(), 16); // 0xFC01 is a 16-bit sample
     image = load(tenBitContainer({0, 1023, 512, 700}));
     EXPECT_EQ(image.bitsPerSample(), 10);
     EXPECT_EQ(image.pixels()[0], 0.0f);
@@ -88,7 +87,7 @@ TEST_F(BayerImageTest, StoreRoundsAndClampsToTheBitDepth) {
     p[0] = 1.0f;
     p[1] = 1.2f;
     p[2] = -0.1f;
-    p[3] = 0.5f;  // 0.5 * 1023 + 0.5 = 512
+    p[3] = 0.5f; // 0.5 * 1023 + 0.5 = 512
     EXPECT_EQ(storedSamples(store(image)), (std::vector<std::uint16_t>{1023, 1023, 0, 512}));
 }
 
@@ -99,15 +98,15 @@ TEST_F(BayerImageTest, SixteenBitHalfStoresAs32768) {
 }
 
 TEST_F(BayerImageTest, ContainerInputIsStoredBackAsContainerWithItsBlocks) {
-    const std::string input = KqRawBuilder()
-                                  .header(2, 2, 0x52474742)
-                                  .pixels({10, 20, 30, 1000})
-                                  .capture(12.5f, kGains)
-                                  .block(std::string("CAMSTATE__120118", 16), "state", 5,
-                                         "RESERVED-BYTES!!")
-                                  .sensorInfo("model", "0a1b2c3d4e", "x")
-                                  .comment("a comment")
-                                  .bytes();
+    const std::string input =
+        KqRawBuilder()
+            .header(2, 2, 0x52474742)
+            .pixels({10, 20, 30, 1000})
+            .capture(12.5f, kGains)
+            .block(std::string("CAMSTATE__120118", 16), "state", 5, "RESERVED-BYTES!!")
+            .sensorInfo("model", "0a1b2c3d4e", "x")
+            .comment("a comment")
+            .bytes();
     BayerImage image = load(input);
     const std::string out = store(image);
     // Same blocks in the same order, pixel block now last; pixels equal.
@@ -213,15 +212,16 @@ TEST_F(BayerImageTest, HeaderlessDetailsGoIntoAContainer) {
 
 TEST_F(BayerImageTest, HeaderlessDetailsGoIntoAFixedHeader) {
     BayerImage image;
-    image.createFromHeaderless(1, 1, 10, kCfaRggb, 40.0f, 2.0f,
-                               "0123456789abcdef0123456789ABCDEF", "0x1122334455667788", true);
+    image.createFromHeaderless(1, 1, 10, kCfaRggb, 40.0f, 2.0f, "0123456789abcdef0123456789ABCDEF",
+                               "0x1122334455667788", true);
     const std::string out = store(image);
     ASSERT_EQ(out.size(), 298672u + 2);
     EXPECT_EQ(rawtest::getFloat(out, 36), 40.0f);
     EXPECT_EQ(rawtest::getFloat(out, 80), 2.0f);
     EXPECT_EQ(rawtest::getU32(out, 24), 0x55667788u);
     EXPECT_EQ(rawtest::getU32(out, 28), 0x11223344u);
-    EXPECT_EQ(out.substr(88, 16), "\x01\x23\x45\x67\x89\xab\xcd\xef\x01\x23\x45\x67\x89\xab\xcd\xef");
+    EXPECT_EQ(out.substr(88, 16),
+              "\x01\x23\x45\x67\x89\xab\xcd\xef\x01\x23\x45\x67\x89\xab\xcd\xef");
     EXPECT_EQ(image.serialNumber(32), "0123456789abcdef0123456789abcdef");
     image.setSensorGuid("abc");
     EXPECT_EQ(rawtest::getU32(store(image), 24), 0xABCu);

@@ -1,19 +1,18 @@
-#include "image/image_buffer.h"
-
-#include "image/image_result.h"
+#include <cstdio>
+#include <cstring>
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-#include <cstring>
+#include "image/image_buffer.h"
+#include "image/image_result.h"
 
 namespace {
 
 ImagePtr create(std::int32_t w, std::int32_t h, std::uint16_t bits, std::uint16_t spp,
                 std::uint32_t pixelType, std::uint32_t dataType, int* rc,
                 std::uint32_t images = 1) {
-    return ImagePtr(imageCreate(w, h, bits, spp, images, 0, kCfaRggb, pixelType, kBufferRawCfa,
-                                dataType, rc));
+    return ImagePtr(
+        imageCreate(w, h, bits, spp, images, 0, kCfaRggb, pixelType, kBufferRawCfa, dataType, rc));
 }
 
 TEST(ImageCreate, SixteenBitRawHasFullScaleLevelsOnAllChannels) {
@@ -63,8 +62,8 @@ TEST(ImageCreate, CutsBitsToTheDataTypeAndLevelsFollow) {
 
 TEST(ImageCreate, KeepsCfaOnlyForRawImages) {
     int rc = 0;
-    ImagePtr image(imageCreate(2, 2, 8, 1, 1, 5, kCfaGbrg, kPixelMono, kBufferRawCfa, kDataUint8,
-                               &rc));
+    ImagePtr image(
+        imageCreate(2, 2, 8, 1, 1, 5, kCfaGbrg, kPixelMono, kBufferRawCfa, kDataUint8, &rc));
     ASSERT_TRUE(image);
     EXPECT_EQ(image->cfa[0], 0u);
     EXPECT_EQ(image->cfa[1], 0u);
@@ -198,7 +197,7 @@ TEST(ImageStreamIo, ScalarsRoundTripInBothByteOrders) {
     std::rewind(file);
     unsigned char first[2];
     ASSERT_EQ(std::fread(first, 1, 2, file), 2u);
-    EXPECT_EQ(first[0], 0x12);  // big-endian: most significant byte first
+    EXPECT_EQ(first[0], 0x12); // big-endian: most significant byte first
     std::rewind(file);
     std::uint16_t v16 = 0;
     std::uint32_t v32 = 0;

@@ -1,14 +1,13 @@
-#include "image/kqraw_container.h"
-
-#include "image/image_result.h"
-#include "raw_test_files.h"
-#include "tests/support/flat_field.h"
-#include "tests/support/temp_dir.h"
+#include <memory>
+#include <string>
 
 #include <gtest/gtest.h>
 
-#include <memory>
-#include <string>
+#include "image/image_result.h"
+#include "image/kqraw_container.h"
+#include "raw_test_files.h"
+#include "tests/support/flat_field.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -79,15 +78,15 @@ TEST(KqRawContainerParse, RefusesBlockSizeRunningPastTheEndBeforeAllocating) {
     EXPECT_FALSE(parse(minimal().block(tag("OPAQUE__________"), "abc", 0xFFFFFFF0u).bytes(), &rc));
     EXPECT_EQ(rc, -21);
     std::string cut = minimal().bytes();
-    cut.resize(cut.size() - 1);  // pixel block one byte short
+    cut.resize(cut.size() - 1); // pixel block one byte short
     EXPECT_FALSE(parse(cut, &rc));
     EXPECT_EQ(rc, -21);
 }
 
 TEST(KqRawContainerParse, RefusesPixelBlockWithoutWholeSamples) {
     int rc = 0;
-    EXPECT_FALSE(parse(KqRawBuilder().header(1, 1, 0).block(tag(kqtag::kPixels), "1234567").bytes(),
-                       &rc));
+    EXPECT_FALSE(
+        parse(KqRawBuilder().header(1, 1, 0).block(tag(kqtag::kPixels), "1234567").bytes(), &rc));
     EXPECT_EQ(rc, -21);
     EXPECT_FALSE(parse(
         KqRawBuilder().header(1, 1, 0).block(tag(kqtag::kPixels), std::string(11, '\0')).bytes(),
@@ -171,8 +170,8 @@ TEST(KqRawContainerParse, BytesBehindTheStringsAreCarried) {
 
 TEST(KqRawContainerParse, ConvertsAFixedHeaderFileWhoseMarkerIsEarly) {
     std::string bytes = rawtest::fixedHeaderFile(2, 1, {}, 1);
-    rawtest::putU32(bytes, 298668, 0);           // not at the end...
-    rawtest::putU32(bytes, 200, 0xCAFEFEED);     // ...but here: pixels follow at 204
+    rawtest::putU32(bytes, 298668, 0);       // not at the end...
+    rawtest::putU32(bytes, 200, 0xCAFEFEED); // ...but here: pixels follow at 204
     rawtest::putU32(bytes, 32, 33 * 65536);
     rawtest::putU32(bytes, 36, 0x11223344);
     rawtest::putU32(bytes, 40, 65536 / 2);
@@ -212,7 +211,7 @@ TEST(KqRawContainerParse, FixedHeaderPixelsBehindTheMarkerAreCheckedAgainstTheSi
     int rc = 0;
     EXPECT_FALSE(parse(bytes, &rc));
     EXPECT_EQ(rc, -21);
-    rawtest::putU32(bytes, 4, 5);  // revision 5: not a fixed-header file at all
+    rawtest::putU32(bytes, 4, 5); // revision 5: not a fixed-header file at all
     EXPECT_FALSE(parse(bytes, &rc));
     EXPECT_EQ(rc, -4);
 }

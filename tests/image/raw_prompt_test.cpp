@@ -1,11 +1,10 @@
-#include "image/raw_prompt.h"
-
-#include "image/image_buffer.h"
+#include <cstdio>
+#include <string>
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-#include <string>
+#include "image/image_buffer.h"
+#include "image/raw_prompt.h"
 
 namespace {
 

@@ -1,15 +1,14 @@
-#include "image/raw_reader.h"
+#include <gtest/gtest.h>
 
 #include "image/byte_source.h"
 #include "image/image_result.h"
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
 #include "image/raw_prompt.h"
+#include "image/raw_reader.h"
 #include "raw_test_files.h"
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
 
 namespace {
 
@@ -118,8 +117,8 @@ class RawReadDepth : public testing::TestWithParam<DepthCase> {};
 TEST_P(RawReadDepth, ComesFromTheLargestSampleWithTenAsTheFloor) {
     const DepthCase c = GetParam();
     int rc = 0;
-    for (const std::string& bytes : {container(2, 1, {3, c.largest}),
-                                     rawtest::fixedHeaderFile(2, 1, {c.largest, 3})}) {
+    for (const std::string& bytes :
+         {container(2, 1, {3, c.largest}), rawtest::fixedHeaderFile(2, 1, {c.largest, 3})}) {
         ImagePtr image = readBytes(bytes, &rc);
         ASSERT_TRUE(image);
         EXPECT_EQ(image->bitsPerSample, c.bits);
@@ -133,9 +132,9 @@ TEST_P(RawReadDepth, ComesFromTheLargestSampleWithTenAsTheFloor) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Samples, RawReadDepth,
-                         testing::Values(DepthCase{0, 10}, DepthCase{700, 10},
-                                         DepthCase{1023, 10}, DepthCase{1024, 11},
-                                         DepthCase{4000, 12}, DepthCase{65535, 16}));
+                         testing::Values(DepthCase{0, 10}, DepthCase{700, 10}, DepthCase{1023, 10},
+                                         DepthCase{1024, 11}, DepthCase{4000, 12},
+                                         DepthCase{65535, 16}));
 
 // --- NKRAW -------------------------------------------------------------------
 
@@ -238,14 +237,14 @@ TEST(RawReadLayout, MismatchesGiveMinus23) {
     int rc = 0;
     EXPECT_FALSE(readWith(std::string(5, 'x'), layout(2, 2, 8), &rc));
     EXPECT_EQ(rc, -23);
-    EXPECT_FALSE(readWith(std::string(4, 'x'), layout(2, 2, 10), &rc));  // 10 bits in a byte
+    EXPECT_FALSE(readWith(std::string(4, 'x'), layout(2, 2, 10), &rc)); // 10 bits in a byte
     EXPECT_EQ(rc, -23);
-    EXPECT_FALSE(readWith(std::string(4, 'x'), layout(2, 2, 8, 9), &rc));  // header too big
+    EXPECT_FALSE(readWith(std::string(4, 'x'), layout(2, 2, 8, 9), &rc)); // header too big
     EXPECT_EQ(rc, -23);
     EXPECT_FALSE(readWith(std::string(4, 'x'), layout(0, 2, 8), &rc));
     EXPECT_EQ(rc, -23);
-    EXPECT_FALSE(readWith(std::string(4, 'x'), layout(0xFFFFFFFFu, 0xFFFFFFFFu, 8, 0, 0xFFFFFFFFu),
-                          &rc));
+    EXPECT_FALSE(
+        readWith(std::string(4, 'x'), layout(0xFFFFFFFFu, 0xFFFFFFFFu, 8, 0, 0xFFFFFFFFu), &rc));
     EXPECT_EQ(rc, -23);
 }
 

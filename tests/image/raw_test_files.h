@@ -2,13 +2,13 @@
 // Small builders for the raw reader tests: whole files as byte strings, so
 // each case shows the bytes it feeds in.
 
-#include "image/image_buffer.h"
-#include "image/raw_reader.h"
-
 #include <cstdint>
 #include <cstring>
 #include <string>
 #include <vector>
+
+#include "image/image_buffer.h"
+#include "image/raw_reader.h"
 
 namespace rawtest {
 
@@ -61,7 +61,7 @@ inline std::string fixedHeaderFile(std::uint32_t width, std::uint32_t height,
     putU32(bytes, 4, revision);
     putU32(bytes, 8, width);
     putU32(bytes, 12, height);
-    putU32(bytes, 16, 0x52474742);  // RGGB
+    putU32(bytes, 16, 0x52474742); // RGGB
     putU32(bytes, 104, 0xDEADBEEF);
     putU32(bytes, 298668, 0xCAFEFEED);
     return bytes + samplesLE(samples);
@@ -74,9 +74,9 @@ inline std::string nkrawFile(std::uint32_t width, std::uint32_t height,
     bytes.replace(0, 8, "NKRAWHDR");
     putU32(bytes, 8, width);
     putU32(bytes, 12, height);
-    putU32(bytes, 16, 0x47524247);  // GRBG
-    putU32(bytes, 20, 33000);       // exposure, microseconds
-    putU32(bytes, 24, 12);          // gain step
+    putU32(bytes, 16, 0x47524247); // GRBG
+    putU32(bytes, 20, 33000);      // exposure, microseconds
+    putU32(bytes, 24, 12);         // gain step
     putU32(bytes, 28, 3);
     putU32(bytes, 32, 2);
     return bytes + samplesLE(samples);

@@ -1,12 +1,11 @@
-#include "image/raw_writer.h"
+#include <gtest/gtest.h>
 
 #include "image/image_result.h"
 #include "image/kqraw_container.h"
+#include "image/raw_writer.h"
 #include "raw_test_files.h"
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
 
 namespace {
 
@@ -17,15 +16,15 @@ using testing_support::TempDir;
 ImagePtr rawImage(std::int32_t w, std::int32_t h, std::uint16_t bits,
                   const std::vector<std::uint16_t>& samples) {
     int rc = 0;
-    ImagePtr image(imageCreate(w, h, bits, 1, 1, 0, kCfaGbrg, kPixelRaw, kBufferRawCfa,
-                               kDataUint16, &rc));
+    ImagePtr image(
+        imageCreate(w, h, bits, 1, 1, 0, kCfaGbrg, kPixelRaw, kBufferRawCfa, kDataUint16, &rc));
     std::copy(samples.begin(), samples.end(), static_cast<std::uint16_t*>(image->data));
     return image;
 }
 
 TEST(RawWriteFixRaw, WritesBareLittleEndianSamples) {
     TempDir dir;
-    ImagePtr image = rawImage(2, 1, 8, {0x0102, 0x00FF});  // white 256 is enough for FIXRAW
+    ImagePtr image = rawImage(2, 1, 8, {0x0102, 0x00FF}); // white 256 is enough for FIXRAW
     EXPECT_EQ(rawWrite(dir.file("a.raw").c_str(), image.get(), kFileFixRaw), 0);
     EXPECT_EQ(readFile(dir.file("a.raw")), std::string("\x02\x01\xFF\x00", 4));
 }
@@ -40,7 +39,7 @@ TEST(RawWriteKqRaw, FreshHeaderGetsGeometryVersionRevisionAndCode) {
     EXPECT_EQ(rawtest::getU32(bytes, 4), 1u);
     EXPECT_EQ(rawtest::getU32(bytes, 8), 2u);
     EXPECT_EQ(rawtest::getU32(bytes, 12), 1u);
-    EXPECT_EQ(rawtest::getU32(bytes, 16), 0x47425247u);  // GBRG
+    EXPECT_EQ(rawtest::getU32(bytes, 16), 0x47425247u); // GBRG
     EXPECT_EQ(rawtest::getU32(bytes, 104), 0xDEADBEEFu);
     EXPECT_EQ(rawtest::getU32(bytes, 298668), 0xCAFEFEEDu);
     EXPECT_EQ(bytes.substr(298672), rawtest::samplesLE({7, 1023}));
@@ -49,7 +48,7 @@ TEST(RawWriteKqRaw, FreshHeaderGetsGeometryVersionRevisionAndCode) {
 TEST(RawWriteKqRaw, FixedHeaderInputIsStoredBackUnchanged) {
     std::string input = rawtest::fixedHeaderFile(3, 1, {1, 2, 3000});
     for (std::size_t at = 108; at < 16492; at += 997)
-        input[at] = static_cast<char>(at);  // unnamed fields travel unchanged
+        input[at] = static_cast<char>(at); // unnamed fields travel unchanged
     int rc = 0;
     ImagePtr image = rawtest::readBytes(input, &rc);
     ASSERT_TRUE(image);
@@ -99,10 +98,10 @@ TEST(RawWriteKqRaw2, ContainerInputIsStoredAsContainerWithItsBlocks) {
     ASSERT_EQ(rawWrite(dir.file("d.kqraw").c_str(), image.get(), kFileKqRaw2), 0);
     const std::string out = readFile(dir.file("d.kqraw"));
     ASSERT_EQ(out.size(), input.size());
-    EXPECT_EQ(rawtest::getU32(out, 36 + 12), 11u);  // bits of the image
+    EXPECT_EQ(rawtest::getU32(out, 36 + 12), 11u); // bits of the image
     EXPECT_EQ(out.substr(72, 16), "PIXELDATA_111107");
     EXPECT_EQ(out.substr(72 + 44, 4), rawtest::samplesLE({99, 2000}));
-    EXPECT_EQ(out.substr(72 + 48), input.substr(72 + 48));  // later blocks byte for byte
+    EXPECT_EQ(out.substr(72 + 48), input.substr(72 + 48)); // later blocks byte for byte
     // The image's own container is left as it was.
     const auto* c = static_cast<const KqRawContainer*>(image->rawHeader);
     std::uint32_t bits = 0;
@@ -120,8 +119,8 @@ TEST(RawWriteKqRaw2, ImageWithoutContainerGetsHeaderAndPixelBlocks) {
     EXPECT_EQ(rawtest::getU32(out, 32), 36u);
     EXPECT_EQ(rawtest::getU32(out, 36), 1u);
     EXPECT_EQ(rawtest::getU32(out, 40), 2u);
-    EXPECT_EQ(rawtest::getU32(out, 44), 0x47425247u);  // GBRG
-    EXPECT_EQ(rawtest::getU32(out, 72 + 32), 12u);  // pixel block size
+    EXPECT_EQ(rawtest::getU32(out, 44), 0x47425247u); // GBRG
+    EXPECT_EQ(rawtest::getU32(out, 72 + 32), 12u);    // pixel block size
     EXPECT_EQ(rawtest::getU32(out, 72 + 36), 1u);
     EXPECT_EQ(rawtest::getU32(out, 72 + 40), 0u);
 }
