@@ -1,7 +1,9 @@
 #pragma once
-// Bounds-checked big-endian reads from memory. Non-owning. After the first
-// read past the end ok() stays false and every further read gives 0, so a
-// block can be read whole and checked once.
+// Bounds-checked big-endian reads from memory, on top of the image library's
+// reader: after the first read past the end ok() stays false and every
+// further read gives 0, so a block can be read whole and checked once.
+
+#include "image/byte_reader.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -10,28 +12,31 @@ namespace blob {
 
 class ByteReader {
 public:
-    ByteReader(const std::uint8_t* data, std::size_t size) : data_(data), size_(size) {}
+    ByteReader(const std::uint8_t* data, std::size_t size) : in_(data, size) {}
 
-    bool ok() const { return ok_; }
-    std::size_t position() const { return pos_; }
-    std::size_t remaining() const { return ok_ ? size_ - pos_ : 0; }
+    bool ok() const { return in_.ok(); }
+    std::size_t position() const { return in_.position(); }
+    std::size_t remaining() const { return in_.remaining(); }
 
-    std::uint8_t u8() { return static_cast<std::uint8_t>(take(1)); }
-    std::uint16_t u16() { return static_cast<std::uint16_t>(take(2)); }
-    std::uint32_t u32() { return static_cast<std::uint32_t>(take(4)); }
-    std::uint64_t u64() { return take(8); }
+    std::uint8_t u8() { return in_.u8(); }
+    std::uint16_t u16() { return static_cast<std::uint16_t>(bigEndian(2)); }
+    std::uint32_t u32() { return static_cast<std::uint32_t>(bigEndian(4)); }
+    std::uint64_t u64() { return bigEndian(8); }
 
     // The next `count` bytes, stepped over; nullptr (and ok() false) when
     // fewer remain.
-    const std::uint8_t* bytes(std::size_t count);
+    const std::uint8_t* bytes(std::size_t count) { return in_.take(count); }
 
 private:
-    std::uint64_t take(std::size_t count);
+    std::uint64_t bigEndian(std::size_t count) {
+        const std::uint8_t* p = in_.take(count);
+        std::uint64_t value = 0;
+        for (std::size_t i = 0; p && i < count; ++i)
+            value = value << 8 | p[i];
+        return value;
+    }
 
-    const std::uint8_t* data_;
-    std::size_t size_;
-    std::size_t pos_ = 0;
-    bool ok_ = true;
+    img::ByteReader in_;
 };
 
 // True when [offset, offset + count) lies inside a buffer of `size` bytes;
