@@ -1,13 +1,13 @@
 // Parsing speed of the configuration reader on a large file, and of printing
 // the tree it builds.
 
-#include "config/config_file.h"
-#include "config/parameter_table.h"
+#include <sstream>
+#include <string>
 
 #include <benchmark/benchmark.h>
 
-#include <sstream>
-#include <string>
+#include "config/config_file.h"
+#include "config/parameter_table.h"
 
 namespace {
 
@@ -26,8 +26,8 @@ std::string largeConfiguration() {
                     std::to_string(i / 10 % 10) + "]  = 1.10000002384;   # point\n";
             break;
         case 2:
-            text += "af.set[" + std::to_string(i % 8) + "].FDN_dist_pair[" + std::to_string(i % 40) +
-                    "] = { " + n + ", 2 };\n";
+            text += "af.set[" + std::to_string(i % 8) + "].FDN_dist_pair[" +
+                    std::to_string(i % 40) + "] = { " + n + ", 2 };\n";
             break;
         case 3:
             text += "apply_lsc.ccm_" + n + " = {0.5, -1.25, 3e-2};\n";

@@ -3,10 +3,10 @@
 // into the configuration tree. Every accepted setting is stored under the
 // given "config" node; settings applied before an error stay there.
 
-#include "config/config_node.h"
-
 #include <string>
 #include <string_view>
+
+#include "config/config_node.h"
 
 // Reads the whole file and parses it. Throws std::invalid_argument when the
 // file cannot be read, std::runtime_error when its text does not parse.

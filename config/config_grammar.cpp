@@ -2,16 +2,6 @@
 // slow to compile. No skipper: white space is accepted only where a rule says
 // so, and every character class is plain ASCII.
 
-#include "config/config_file.h"
-#include "config/config_messages.h"
-#include "config/value_text.h"
-
-#include <boost/phoenix/bind/bind_function.hpp>
-#include <boost/phoenix/bind/bind_member_function.hpp>
-#include <boost/phoenix/core.hpp>
-#include <boost/spirit/include/qi.hpp>
-#include <boost/variant.hpp>
-
 #include <cstdint>
 #include <cstdio>
 #include <memory>
@@ -19,6 +9,16 @@
 #include <stdexcept>
 #include <string>
 #include <vector>
+
+#include <boost/phoenix/bind/bind_function.hpp>
+#include <boost/phoenix/bind/bind_member_function.hpp>
+#include <boost/phoenix/core.hpp>
+#include <boost/spirit/include/qi.hpp>
+#include <boost/variant.hpp>
+
+#include "config/config_file.h"
+#include "config/config_messages.h"
+#include "config/value_text.h"
 
 namespace {
 
@@ -33,7 +33,7 @@ using Value = boost::variant<std::string, std::vector<std::int32_t>, std::vector
 // every node's name holds its whole key, so long keys multiply memory.
 constexpr std::ptrdiff_t kMaxKeyLength = 256;
 constexpr std::uint64_t kMaxIndex = 65535;
-constexpr std::size_t kMaxNewEntries = 262144;  // nodes one text may add
+constexpr std::size_t kMaxNewEntries = 262144; // nodes one text may add
 
 // Files beyond this are not configuration files (and /dev/zero must not hang).
 constexpr std::size_t kMaxFileSize = 64u << 20;
@@ -56,7 +56,8 @@ void convertFloat(const Range& text, double& value, bool& pass) {
 
 class ConfigGrammar : public qi::grammar<Iterator> {
 public:
-    explicit ConfigGrammar(config_node& config) : ConfigGrammar::base_type(settings_), config_(config) {
+    explicit ConfigGrammar(config_node& config)
+        : ConfigGrammar::base_type(settings_), config_(config) {
         using qi::char_;
         const auto digit = char_("0-9");
         const auto separator = qi::copy(-spaces_ >> ',' >> -spaces_);
@@ -64,21 +65,22 @@ public:
         spaces_ = +char_(" \t");
         comment_ = '#' >> *(char_ - char_("\r\n")) >> (qi::eol | qi::eoi);
         name_ = qi::raw[char_("a-zA-Z") >> *char_("a-zA-Z0-9_")];
-        identifier_ = qi::raw[name_][phx::bind(&ConfigGrammar::navigate_first_impl, this, qi::_1)] >>
-                      *(qi::raw['[' >> +digit >> ']']
-                                [phx::bind(&ConfigGrammar::navigate_index_impl, this, qi::_1)] |
-                        qi::raw['.' >> name_]
-                                [phx::bind(&ConfigGrammar::navigate_node_impl, this, qi::_1)]);
+        identifier_ =
+            qi::raw[name_][phx::bind(&ConfigGrammar::navigate_first_impl, this, qi::_1)] >>
+            *(qi::raw['[' >> +digit >> ']']
+                     [phx::bind(&ConfigGrammar::navigate_index_impl, this, qi::_1)] |
+              qi::raw['.' >> name_][phx::bind(&ConfigGrammar::navigate_node_impl, this, qi::_1)]);
         string_ = qi::raw['"' >> *(char_ - '"') >> '"'];
         parameter_ = qi::raw[+(char_("a-zA-Z0-9") | char_('_') | char_('/') | char_('\\') |
                                char_(':') | char_('-') | char_('.'))];
         character_ = qi::raw['\'' >> (char_ - '\'') >> '\''];
         integerList_ = '{' >> -spaces_ >> (qi::int_ % separator) >> -spaces_ >> '}';
-        floatSyntax_ = -char_("+-") >>
-                       (qi::no_case["infinity"] | qi::no_case["inf"] | qi::no_case["nan"] |
-                        ((+digit >> -('.' >> *digit) | '.' >> +digit) >>
-                         -(char_("eE") >> -char_("+-") >> +digit)));
-        floatElement_ = qi::raw[floatSyntax_][phx::bind(&convertFloat, qi::_1, qi::_val, qi::_pass)];
+        floatSyntax_ =
+            -char_("+-") >> (qi::no_case["infinity"] | qi::no_case["inf"] | qi::no_case["nan"] |
+                             ((+digit >> -('.' >> *digit) | '.' >> +digit) >>
+                              -(char_("eE") >> -char_("+-") >> +digit)));
+        floatElement_ =
+            qi::raw[floatSyntax_][phx::bind(&convertFloat, qi::_1, qi::_val, qi::_pass)];
         floatList_ = '{' >> -spaces_ >> (floatElement_ % separator) >> -spaces_ >> '}';
         value_ = string_ | parameter_ | name_ | character_ | integerList_ | floatList_;
         setting_ = (identifier_ > -spaces_ > '=' > -spaces_ > value_ > -spaces_ >
@@ -98,8 +100,8 @@ public:
         comment_.name("comment");
         spaces_.name("spaces");
 
-        qi::on_error<qi::fail>(setting_, phx::bind(&ConfigGrammar::error_handler_impl, this,
-                                                   qi::_1, qi::_3, qi::_4));
+        qi::on_error<qi::fail>(
+            setting_, phx::bind(&ConfigGrammar::error_handler_impl, this, qi::_1, qi::_3, qi::_4));
     }
 
 private:

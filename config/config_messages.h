@@ -18,7 +18,8 @@ inline constexpr char kCannotOpenConfig[] = "Unable to open configuration file."
 inline constexpr char kConfigTooLarge[] = "Configuration file is larger than 64 MiB.";
 inline constexpr char kParseStopped[] = "Failed to parse configuration file parameters.";
 inline constexpr char kStoppedAt[] = "Stopped at: ";
-inline constexpr char kParseExpecting[] = "Failed to parse configuration file parameters, expecting ";
+inline constexpr char kParseExpecting[] =
+    "Failed to parse configuration file parameters, expecting ";
 inline constexpr char kKeyTooLong[] =
     "Failed to parse configuration file parameters, key longer than 256 characters:";
 inline constexpr char kKeyIndexTooLarge[] =

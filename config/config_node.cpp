@@ -1,14 +1,14 @@
 #include "config/config_node.h"
 
-#include "config/config_messages.h"
-#include "config/value_text.h"
-
-#include <boost/lexical_cast/bad_lexical_cast.hpp>
-
 #include <cstdint>
 #include <stdexcept>
 #include <typeinfo>
 #include <utility>
+
+#include <boost/lexical_cast/bad_lexical_cast.hpp>
+
+#include "config/config_messages.h"
+#include "config/value_text.h"
 
 namespace {
 
@@ -39,8 +39,7 @@ struct PathStep {
 }
 
 bool isNameChar(char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
-           c == '_';
+    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_';
 }
 
 // Reads the next step at `pos`; false at the end of the path.
@@ -57,7 +56,8 @@ bool nextStep(const std::string& path, std::size_t& pos, PathStep& step) {
             if (path[i] < '0' || path[i] > '9')
                 throwBadPath(path);
             // Saturate: anything this large is refused by child() or not found by find().
-            index = index > kMaxIndex ? index : index * 10 + static_cast<std::size_t>(path[i] - '0');
+            index =
+                index > kMaxIndex ? index : index * 10 + static_cast<std::size_t>(path[i] - '0');
         }
         step.isIndex = true;
         step.index = index;
@@ -79,35 +79,39 @@ bool nextStep(const std::string& path, std::size_t& pos, PathStep& step) {
     return true;
 }
 
+template <typename Node, typename Descend>
+Node& walkPath(Node& start, const std::string& path, Descend descend) {
+    if (path.empty())
+        throwBadPath(path);
+    Node* node = &start;
+    std::size_t pos = 0;
+    PathStep step;
+    while (nextStep(path, pos, step))
+        node = &descend(*node, step);
+    return *node;
+}
+
 } // namespace
 
 // ---- config_node ----------------------------------------------------------
 
 const config_node& config_node::find_path(const std::string& path) const {
-    const config_node* node = this;
-    std::size_t pos = 0;
-    PathStep step;
-    if (path.empty())
-        throwBadPath(path);
-    while (nextStep(path, pos, step))
-        node = step.isIndex ? &node->find(step.index) : &node->find(step.name);
-    return *node;
+    return walkPath(*this, path,
+                    [](const config_node& node, const PathStep& step) -> const config_node& {
+                        return step.isIndex ? node.find(step.index) : node.find(step.name);
+                    });
 }
 
 config_node& config_node::child_path(const std::string& path) {
-    config_node* node = this;
-    std::size_t pos = 0;
-    PathStep step;
-    if (path.empty())
-        throwBadPath(path);
-    while (nextStep(path, pos, step))
-        node = step.isIndex ? &node->child(step.index) : &node->child(step.name);
-    return *node;
+    return walkPath(*this, path, [](config_node& node, const PathStep& step) -> config_node& {
+        return step.isIndex ? node.child(step.index) : node.child(step.name);
+    });
 }
 
 // ---- config_node_impl -----------------------------------------------------
 
-config_node_impl::config_node_impl(std::string name) : name_(std::move(name)) {}
+config_node_impl::config_node_impl(std::string name) : name_(std::move(name)) {
+}
 
 // Releases the subtree without recursion, so that however deep a tree grows,
 // destroying it cannot overflow the stack.
@@ -187,8 +191,8 @@ config_node& config_node_impl::child(std::size_t index) {
         // No exact reserve here: lists grow one index at a time, and
         // push_back's geometric growth keeps that linear.
         for (std::size_t i = indexed_.size(); i <= index; ++i)
-            indexed_.push_back(std::make_shared<config_node_impl>(
-                name_ + "[" + std::to_string(i) + "]"));
+            indexed_.push_back(
+                std::make_shared<config_node_impl>(name_ + "[" + std::to_string(i) + "]"));
     }
     return *indexed_[index];
 }

@@ -1,12 +1,12 @@
 #include "config/fit_settings.h"
 
-#include "config/config_messages.h"
-#include "config/parameter_table.h"
-#include "config/value_text.h"
-
 #include <cmath>
 #include <cstdint>
 #include <stdexcept>
+
+#include "config/config_messages.h"
+#include "config/parameter_table.h"
+#include "config/value_text.h"
 
 namespace {
 
@@ -72,7 +72,8 @@ void load_fit_settings(const config_node& config, const BayerImage& image,
     loadPatchFractions(config, width, height, context);
     context.sampleAngleStep = setting(config, "lsc", "sampling_factor").as_int();
     context.sampleMargin = setting(config, "lsc", "sampling_margin").as_int();
-    context.falloff = static_cast<float>(setting(config, "lsc", "falloff_factor").as_int()) / 100.0f;
+    context.falloff =
+        static_cast<float>(setting(config, "lsc", "falloff_factor").as_int()) / 100.0f;
     context.greenBalance = setting(config, "lsc", "green_balance").as_int() != 0;
     context.applyStep =
         static_cast<unsigned>(setting(config, "apply_lsc", "sampling_factor").as_int());

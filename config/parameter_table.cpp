@@ -1,11 +1,11 @@
 #include "config/parameter_table.h"
 
-#include "config/config_messages.h"
-#include "config/value_text.h"
-
 #include <charconv>
 #include <cmath>
 #include <stdexcept>
+
+#include "config/config_messages.h"
+#include "config/value_text.h"
 
 namespace {
 
@@ -25,13 +25,13 @@ struct Parameter {
 // before apply_lsc.luma_normalize_factor.
 constexpr Parameter kTable[] = {
     {"shared", "light_source", "0", Check::Int, -1, 255},
-    {"shared", "block_name", "reference", Check::None, 0, 0},  // block-name rule
+    {"shared", "block_name", "reference", Check::None, 0, 0}, // block-name rule
     {"shared", "block_num_flag", "0", Check::Int, 0, 1},
     {"shared", "block_num", "0", Check::Int, 0, 255},
     {"shared", "program_number", "0", Check::Int, 0, 255},
-    {"shared", "cfg_file_date", "", Check::None, 0, 0},  // date rule when used
+    {"shared", "cfg_file_date", "", Check::None, 0, 0}, // date rule when used
     {"shared", "proc_sampling_factor", "4", Check::Int, 1, 100},
-    {"shared", "bit_res", "0", Check::Int, 4, 15},  // checked only when not 0
+    {"shared", "bit_res", "0", Check::Int, 4, 15}, // checked only when not 0
     {"shared", "fuse_id_bytes", "0", Check::Int, 0, 16},
     {"shared", "jpeg_quality", "75", Check::Int, 0, 100},
     {"shared", "sensor_guid", "", Check::None, 0, 0},
@@ -83,7 +83,8 @@ const config_node& settingOf(const config_node& config, const Parameter& paramet
 
 const Parameter& entry(const char* section, const char* key) {
     for (const Parameter& parameter : kTable)
-        if (std::string_view(parameter.section) == section && std::string_view(parameter.key) == key)
+        if (std::string_view(parameter.section) == section &&
+            std::string_view(parameter.key) == key)
             return parameter;
     throw std::logic_error(std::string("unknown parameter ") + section + "." + key);
 }
@@ -178,8 +179,8 @@ void validate(const config_node& config) {
     const Parameter& bitResolution = entry("shared", "bit_res");
     if (settingOf(config, bitResolution).as_int() != 0)
         checkEntry(config, bitResolution);
-    for (const char* key : {"light_source", "fuse_id_bytes", "jpeg_quality", "block_num_flag",
-                            "block_num"})
+    for (const char* key :
+         {"light_source", "fuse_id_bytes", "jpeg_quality", "block_num_flag", "block_num"})
         checkEntry(config, entry("shared", key));
     checkBlockName(config.find("shared").find("block_name").as_string());
     checkEntry(config, entry("shared", "program_number"));
@@ -223,7 +224,7 @@ std::int64_t config_date_seconds(const std::string& text) {
                     readNumber(text, pos, minute) && pos == text.size();
     if (!ok)
         throw std::invalid_argument(config::msg::kInvalidDate);
-    const std::int64_t monthIndex = month - 1;  // may be -1
+    const std::int64_t monthIndex = month - 1; // may be -1
     year += monthIndex >= 0 ? monthIndex / 12 : -1;
     month = (monthIndex % 12 + 12) % 12 + 1;
     const std::int64_t seconds =

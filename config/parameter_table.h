@@ -2,10 +2,10 @@
 // The settings the program knows: their defaults, their allowed ranges, and
 // the values derived from them for the output writers.
 
-#include "config/config_node.h"
-
 #include <cstdint>
 #include <string>
+
+#include "config/config_node.h"
 
 // Writes every default (marked as default) under the "config" node.
 void set_defaults(config_node& config);

@@ -1,10 +1,10 @@
 #include "config/patch_geometry_check.h"
 
-#include "config/config_messages.h"
-#include "config/value_text.h"
-
 #include <stdexcept>
 #include <string>
+
+#include "config/config_messages.h"
+#include "config/value_text.h"
 
 namespace {
 
@@ -55,9 +55,9 @@ void readLegacyGeometry(const config_node& lsc, const config_node& data, float w
     int sizes[4];
     for (int i = 0; i < 4; ++i)
         sizes[i] = data.find(kLegacyKeys[i]).as_int();
-    setFractions(context, {static_cast<float>(sizes[0]) / width, static_cast<float>(sizes[1]) / width,
-                           static_cast<float>(sizes[2]) / height,
-                           static_cast<float>(sizes[3]) / height});
+    setFractions(context,
+                 {static_cast<float>(sizes[0]) / width, static_cast<float>(sizes[1]) / width,
+                  static_cast<float>(sizes[2]) / height, static_cast<float>(sizes[3]) / height});
     if (lsc.find("left_patch_width").is_default()) {
         if (!lsc.find("leftPatchFactor").is_default())
             throw std::runtime_error(config::msg::kConfigWithoutLegacyDataWithLegacy);

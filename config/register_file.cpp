@@ -1,16 +1,16 @@
 #include "config/register_file.h"
 
-#include "config/config_messages.h"
-#include "config/value_text.h"
-#include "image/output_file.h"
-#include "lsc/patch_geometry.h"
-
 #include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <cstdint>
 #include <cstdio>
 #include <stdexcept>
+
+#include "config/config_messages.h"
+#include "config/value_text.h"
+#include "image/output_file.h"
+#include "lsc/patch_geometry.h"
 
 namespace {
 
@@ -50,12 +50,12 @@ private:
 void checkExportedSizes(const ExportedPatchSizes& s, std::int32_t width, std::int32_t height) {
     if (std::min({s.left, s.center, s.right, s.top, s.middle, s.bottom}) >= 2)
         return;
-    throw std::runtime_error(
-        config::msg::kBadExportedGeometryPrefix + integerText(width) + "x" + integerText(height) +
-        config::msg::kBadExportedGeometryMiddle + integerText(s.left) + ", " +
-        integerText(s.center) + ", " + integerText(s.right) + " x " + integerText(s.top) + ", " +
-        integerText(s.middle) + ", " + integerText(s.bottom) +
-        config::msg::kBadExportedGeometrySuffix);
+    throw std::runtime_error(config::msg::kBadExportedGeometryPrefix + integerText(width) + "x" +
+                             integerText(height) + config::msg::kBadExportedGeometryMiddle +
+                             integerText(s.left) + ", " + integerText(s.center) + ", " +
+                             integerText(s.right) + " x " + integerText(s.top) + ", " +
+                             integerText(s.middle) + ", " + integerText(s.bottom) +
+                             config::msg::kBadExportedGeometrySuffix);
 }
 
 void writeGeometry(RegisterText& out, const config_node& lsc, const ExportedPatchSizes& sizes,
@@ -175,10 +175,9 @@ std::string register_file_text(const config_node& config, const std::string& blo
                                const BayerImage& image) {
     const std::int32_t width = image.width();
     const std::int32_t height = image.height();
-    const ExportedPatchSizes sizes =
-        exportedPatchSizes(static_cast<std::uint32_t>(width), static_cast<std::uint32_t>(height),
-                           fit.leftFraction, fit.centerFraction, fit.topFraction,
-                           fit.middleFraction);
+    const ExportedPatchSizes sizes = exportedPatchSizes(
+        static_cast<std::uint32_t>(width), static_cast<std::uint32_t>(height), fit.leftFraction,
+        fit.centerFraction, fit.topFraction, fit.middleFraction);
     checkExportedSizes(sizes, width, height);
     const config_node& shared = config.find("shared");
 
@@ -194,8 +193,9 @@ std::string register_file_text(const config_node& config, const std::string& blo
     if (config.find("lsc").find("wb_avgs_flag").as_bool())
         writeWhiteBalance(out, config, fit, image);
     const int fuseIdBytes = shared.find("fuse_id_bytes").as_int();
-    out.assign("serial_no            ",
-               serialValue(image.serialNumber(2 * static_cast<std::size_t>(std::max(fuseIdBytes, 0)))));
+    out.assign(
+        "serial_no            ",
+        serialValue(image.serialNumber(2 * static_cast<std::size_t>(std::max(fuseIdBytes, 0)))));
     writeDeltas(out, sizes);
     writeControlPoints(out, controlPointInfix, fit);
     return out.text();

@@ -3,11 +3,11 @@
 // syntax (patch geometry, fixed-point patch steps, white-balance levels, the
 // module serial number and four 10 x 10 control-point grids).
 
+#include <string>
+
 #include "config/config_node.h"
 #include "image/bayer_image.h"
 #include "lsc/processing_context.h"
-
-#include <string>
 
 // Builds the whole text first, so that a geometry or value the file cannot
 // hold is refused before anything is written, then writes it through a

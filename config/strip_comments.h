@@ -3,9 +3,9 @@
 // character standing outside double quotes. Filters stack: the headerless raw
 // details reader pushes one for ";" and one for "#".
 
-#include <boost/iostreams/filter/line.hpp>
-
 #include <string>
+
+#include <boost/iostreams/filter/line.hpp>
 
 class strip_comments : public boost::iostreams::line_filter {
 public:

@@ -94,11 +94,12 @@ bool parseFloatText(std::string_view text, float& value) {
         if (pos != text.size())
             return false;
         const char* end = text.data() + text.size();
-        const auto result = std::from_chars(text.data(), end, magnitude, std::chars_format::general);
+        const auto result =
+            std::from_chars(text.data(), end, magnitude, std::chars_format::general);
         if (result.ec == std::errc::result_out_of_range) {
             if (decimalMagnitude(mantissa, exponent) >= 0)
-                return false;  // beyond the largest float
-            double small = 0.0;  // underflow: the nearest float, possibly subnormal
+                return false;   // beyond the largest float
+            double small = 0.0; // underflow: the nearest float, possibly subnormal
             const auto again = std::from_chars(text.data(), end, small, std::chars_format::general);
             magnitude = again.ec == std::errc() ? static_cast<float>(small) : 0.0f;
         } else if (result.ec != std::errc() || result.ptr != end) {

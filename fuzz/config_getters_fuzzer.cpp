@@ -3,12 +3,6 @@
 // conversion. Checks that numbers written by the writers' helpers read back
 // to the same value.
 
-#include "config/config_node.h"
-#include "config/parameter_table.h"
-#include "config/value_text.h"
-
-#include <boost/lexical_cast/bad_lexical_cast.hpp>
-
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
@@ -17,10 +11,15 @@
 #include <stdexcept>
 #include <string>
 
+#include <boost/lexical_cast/bad_lexical_cast.hpp>
+
+#include "config/config_node.h"
+#include "config/parameter_table.h"
+#include "config/value_text.h"
+
 namespace {
 
-template <typename Action>
-void tolerate(Action action) {
+template <typename Action> void tolerate(Action action) {
     try {
         action();
     } catch (const boost::bad_lexical_cast&) {
