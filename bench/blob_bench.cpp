@@ -1,14 +1,14 @@
 // Building and reading back a full blob: serial number, tool block, 400
 // control points, white balance and two focus sets.
 
-#include "blob/blob_parser.h"
-#include "blob/blob_writer.h"
-#include "config/config_node.h"
+#include <sstream>
+#include <string>
 
 #include <benchmark/benchmark.h>
 
-#include <sstream>
-#include <string>
+#include "blob/blob_parser.h"
+#include "blob/blob_writer.h"
+#include "config/config_node.h"
 
 namespace {
 
@@ -66,8 +66,8 @@ void BM_ParseBlob(benchmark::State& state) {
         blob::generateBlob(blob::blobSourcesFromConfig(config), {1, 7, 2}, warnings);
     for (auto _ : state) {
         config_node_impl back("root");
-        benchmark::DoNotOptimize(
-            blob::parseBlob(bytes.data(), bytes.size(), back.child("calibration"), back.child("config")));
+        benchmark::DoNotOptimize(blob::parseBlob(bytes.data(), bytes.size(),
+                                                 back.child("calibration"), back.child("config")));
     }
 }
 BENCHMARK(BM_ParseBlob)->Unit(benchmark::kMicrosecond);

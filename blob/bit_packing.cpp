@@ -9,7 +9,7 @@ std::uint64_t packedSize(std::uint64_t count, unsigned bits) {
 void packCodes(const std::vector<std::uint32_t>& codes, unsigned bits,
                std::vector<std::uint8_t>& out) {
     const std::uint64_t mask = (std::uint64_t{1} << bits) - 1;
-    std::uint64_t pending = 0;  // bits not yet written, right-aligned
+    std::uint64_t pending = 0; // bits not yet written, right-aligned
     unsigned pendingBits = 0;
     out.reserve(out.size() + packedSize(codes.size(), bits));
     for (std::uint32_t code : codes) {

@@ -1,8 +1,8 @@
 #include "blob/blob_dump.h"
 
-#include "blob/blob_layout.h"
-
 #include <algorithm>
+
+#include "blob/blob_layout.h"
 
 namespace blob {
 
@@ -58,8 +58,8 @@ void writeLensShading(const config_node& calibration, const std::string& prefix,
     out << "\n# -------------------- LSC block --------------------\n";
     out << "# " << prefix << "light_id = " << textOf(config.find("shared").find("light_source"))
         << ";\n";
-    out << "# " << prefix << "compression_res = "
-        << textOf(config.find("blob").find("compression_res")) << ";\n";
+    out << "# " << prefix
+        << "compression_res = " << textOf(config.find("blob").find("compression_res")) << ";\n";
     for (const char* name : kControlPointNames) {
         const config_node& grid = calibration.find(name);
         for (std::size_t i = 0; i < kGridSide; ++i)

@@ -4,11 +4,11 @@
 // Settings that are not calibration values (light source, value format, tool
 // block) are written as comments.
 
-#include "blob/blob_parser.h"
-#include "config/config_node.h"
-
 #include <ostream>
 #include <string>
+
+#include "blob/blob_parser.h"
+#include "config/config_node.h"
 
 namespace blob {
 

@@ -14,9 +14,9 @@ inline constexpr std::uint8_t kMinorVersion = 4;
 // Minor versions below this one store focus values in 16 bits.
 inline constexpr std::uint8_t kWideFocusMinorVersion = 4;
 
-inline constexpr std::size_t kHeaderSize = 8;      // magic, version, minor, two zero bytes
-inline constexpr std::size_t kTableEntrySize = 4;  // 16-bit type, 16-bit offset
-inline constexpr std::size_t kMaxOffset = 0xFFFF;  // offsets are 16-bit
+inline constexpr std::size_t kHeaderSize = 8;     // magic, version, minor, two zero bytes
+inline constexpr std::size_t kTableEntrySize = 4; // 16-bit type, 16-bit offset
+inline constexpr std::size_t kMaxOffset = 0xFFFF; // offsets are 16-bit
 
 enum BlockType : std::uint16_t {
     kTrackingBlock = 0x0001,
@@ -40,8 +40,8 @@ inline constexpr int kGridSide = 10;
 inline constexpr int kGridPointsPerChannel = kGridSide * kGridSide;
 inline constexpr int kLscChannels = 4;
 inline constexpr int kLscCodeCount = kLscChannels * kGridPointsPerChannel;
-inline constexpr const char* kControlPointNames[kLscChannels] = {
-    "controlPointR", "controlPointGR", "controlPointGB", "controlPointB"};
+inline constexpr const char* kControlPointNames[kLscChannels] = {"controlPointR", "controlPointGR",
+                                                                 "controlPointGB", "controlPointB"};
 
 // White balance: light source and the averages R, GR, GB, B, 16 bits each.
 inline constexpr std::size_t kAwbBlockSize = 10;

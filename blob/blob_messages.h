@@ -11,7 +11,7 @@ inline constexpr char kWrongVersion[] = "Wrong blob version.";
 inline constexpr char kLightSourceMismatch[] = "Two different light sources in lens shading data.";
 inline constexpr char kBadDigest[] = "Bad CRC value";
 inline constexpr char kUnknownBlock[] = "Unknown header type found.";
-inline constexpr char kInvalidDate[] = "Invalid config file date: ";  // + the number
+inline constexpr char kInvalidDate[] = "Invalid config file date: "; // + the number
 inline constexpr char kCodeTooWideToRead[] =
     "Compressed data values larger than 32 bits are not supported.";
 
@@ -28,10 +28,11 @@ inline constexpr char kNoDateWarning[] =
 inline constexpr char kOnlyCompressed[] = "Only compressed LSC data is supported.";
 inline constexpr char kInvalidCompressionFormat[] =
     "Invalid compression format in configuration file.";
-inline constexpr char kCodeTooWide[] = "Compressed data values larger than 16 bits are not supported.";
+inline constexpr char kCodeTooWide[] =
+    "Compressed data values larger than 16 bits are not supported.";
 inline constexpr char kPointCountNotSupported[] =
     "Specifying the number of control points is not is not supported.";
-inline constexpr char kValueOutOfRangeStart[] = "Lens shading value (";  // + value
+inline constexpr char kValueOutOfRangeStart[] = "Lens shading value ("; // + value
 inline constexpr char kValueOutOfRangeEnd[] =
     ") is outside of the range allowed for the lensShading.compression_res value specified in "
     "the configuration file.\n"
@@ -44,7 +45,7 @@ inline constexpr char kToleranceExceeded[] =
 inline constexpr char kValueFor[] = "Value for ";
 inline constexpr char kNotWholeNumber[] = " is not a whole number.";
 inline constexpr char kDoesNotFitStart[] =
-    " does not fit in the binary calibration data, value must be between ";  // lo " and " hi "."
+    " does not fit in the binary calibration data, value must be between "; // lo " and " hi "."
 inline constexpr char kInvalidSerial[] =
     " is not a valid serial number, it must be an even number of hexadecimal digits.";
 inline constexpr char kSerialTooLong[] = " is too long for the binary calibration data.";

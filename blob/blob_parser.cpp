@@ -1,5 +1,10 @@
 #include "blob/blob_parser.h"
 
+#include <algorithm>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
 #include "blob/bit_packing.h"
 #include "blob/blob_layout.h"
 #include "blob/blob_messages.h"
@@ -9,18 +14,17 @@
 #include "blob/value_code.h"
 #include "config/value_text.h"
 
-#include <algorithm>
-#include <stdexcept>
-#include <string>
-#include <vector>
-
 namespace blob {
 
 namespace {
 
-[[noreturn]] void fail(const char* message) { throw std::runtime_error(message); }
+[[noreturn]] void fail(const char* message) {
+    throw std::runtime_error(message);
+}
 
-void store(config_node& node, const std::string& text) { node.set(text, false); }
+void store(config_node& node, const std::string& text) {
+    node.set(text, false);
+}
 
 // A light source as a block stores it: 8 bits in the lens-shading block, 16
 // in the white-balance block. The configuration's -1 ("none") has all bits
@@ -100,13 +104,26 @@ BlobVersions BlobParser::parse() {
         if (offset > size_)
             fail(msg::kCorruptOrTruncated);
         switch (type) {
-        case kLscBlock: readLensShading(offset); break;
-        case kAwbBlock: readWhiteBalance(offset); break;
-        case kFocusBlock: readFocus(offset); break;
-        case kTrackingBlock: readTracking(offset); break;
-        case kToolBlock: readTool(offset); break;
-        case kDigestBlock: checkDigest(offset); return versions_;
-        default: fail(msg::kUnknownBlock);
+        case kLscBlock:
+            readLensShading(offset);
+            break;
+        case kAwbBlock:
+            readWhiteBalance(offset);
+            break;
+        case kFocusBlock:
+            readFocus(offset);
+            break;
+        case kTrackingBlock:
+            readTracking(offset);
+            break;
+        case kToolBlock:
+            readTool(offset);
+            break;
+        case kDigestBlock:
+            checkDigest(offset);
+            return versions_;
+        default:
+            fail(msg::kUnknownBlock);
         }
     }
 }
@@ -125,7 +142,7 @@ void BlobParser::checkLightSource(const StoredLightSource& light) {
         if (!sameLightSource(lightSource_, light))
             fail(msg::kLightSourceMismatch);
         if (light.bits <= lightSource_.bits)
-            return;  // a wider field tells -1 from 255; keep its reading
+            return; // a wider field tells -1 from 255; keep its reading
     }
     haveLightSource_ = true;
     lightSource_ = light;
@@ -136,7 +153,7 @@ void BlobParser::readTracking(std::size_t offset) {
     ByteReader block = blockAt(offset);
     const std::uint16_t length = block.u16();
     requireComplete(block);
-    if (length < kTrackingLengthSize)  // the length counts itself
+    if (length < kTrackingLengthSize) // the length counts itself
         fail(msg::kCorrupt);
     const std::uint8_t* serial = block.bytes(length - kTrackingLengthSize);
     requireComplete(block);
@@ -153,7 +170,7 @@ void BlobParser::readTracking(std::size_t offset) {
 
 void BlobParser::readTool(std::size_t offset) {
     ByteReader block = blockAt(offset);
-    block.u8();  // the block size, not checked
+    block.u8(); // the block size, not checked
     const std::array<std::uint8_t, 3> version = {block.u8(), block.u8(), block.u8()};
     const auto seconds = static_cast<std::int64_t>(block.u64());
     const std::uint8_t program = block.u8();

@@ -1,17 +1,17 @@
 #pragma once
 // Reads binary calibration data back into configuration trees.
 
-#include "config/config_node.h"
-
 #include <array>
 #include <cstddef>
 #include <cstdint>
 
+#include "config/config_node.h"
+
 namespace blob {
 
 struct BlobVersions {
-    std::array<std::uint8_t, 3> blob{};  // bytes 4, 5 and 6 of the header
-    std::array<std::uint8_t, 3> tool{};  // from the tool block; zero without one
+    std::array<std::uint8_t, 3> blob{}; // bytes 4, 5 and 6 of the header
+    std::array<std::uint8_t, 3> tool{}; // from the tool block; zero without one
 };
 
 // Checks the header, walks the table up to the digest entry and stores every

@@ -7,10 +7,10 @@
 namespace blob {
 
 struct BlobSources {
-    const config_node& registers;      // <block_name>: serial_no, R, GR, GB, B
-    const config_node& controlPoints;  // controlPointR ... controlPointB
-    const config_node& module;         // module: serial_no, af.set[i]
-    const config_node& config;         // the "config" node: shared.*, blob.*
+    const config_node& registers;     // <block_name>: serial_no, R, GR, GB, B
+    const config_node& controlPoints; // controlPointR ... controlPointB
+    const config_node& module;        // module: serial_no, af.set[i]
+    const config_node& config;        // the "config" node: shared.*, blob.*
 };
 
 // The nodes as the register file lays them out under the "config" node:

@@ -1,5 +1,12 @@
 #include "blob/blob_writer.h"
 
+#include <cmath>
+#include <limits>
+#include <locale>
+#include <sstream>
+#include <stdexcept>
+#include <string>
+
 #include "blob/bit_packing.h"
 #include "blob/blob_layout.h"
 #include "blob/blob_messages.h"
@@ -8,13 +15,6 @@
 #include "blob/md5.h"
 #include "blob/value_code.h"
 #include "config/parameter_table.h"
-
-#include <cmath>
-#include <limits>
-#include <locale>
-#include <sstream>
-#include <stdexcept>
-#include <string>
 
 namespace blob {
 
@@ -65,7 +65,7 @@ std::uint64_t configurationDate(const config_node& config, std::ostream& warning
     } catch (const std::invalid_argument&) {
         throw std::runtime_error(msg::kInvalidDateSetting);
     }
-    return static_cast<std::uint64_t>(seconds);  // two's complement before 1970
+    return static_cast<std::uint64_t>(seconds); // two's complement before 1970
 }
 
 Block toolBlock(const BlobSources& in, const ToolVersion& version, std::ostream& warnings) {
@@ -112,7 +112,7 @@ std::string numberText(float value) {
 
 std::uint32_t controlPointCode(float value, const ValueFormat& format) {
     const double maximum = valueFormatMaximum(format);
-    if (!(std::fabs(value) <= maximum))  // NaN is outside every range
+    if (!(std::fabs(value) <= maximum)) // NaN is outside every range
         throw std::range_error(msg::kValueOutOfRangeStart + numberText(value) +
                                msg::kValueOutOfRangeEnd);
     const std::uint32_t code = encodeValue(value, format);
@@ -147,8 +147,8 @@ Block awbBlock(const BlobSources& in) {
     ByteWriter out(block.bytes);
     out.u16(static_cast<std::uint16_t>(lightSource(in.config)));
     for (const char* name : kAwbNames)
-        out.u16(static_cast<std::uint16_t>(
-            fieldValue(in.config, in.registers.find(name), 0, kMaxU16)));
+        out.u16(
+            static_cast<std::uint16_t>(fieldValue(in.config, in.registers.find(name), 0, kMaxU16)));
     return block;
 }
 
@@ -184,7 +184,7 @@ Block focusBlock(const config_node& config, const config_node& set) {
 }
 
 std::vector<std::uint8_t> assemble(const std::vector<Block>& blocks) {
-    const std::size_t entries = blocks.size() + 1;  // and the digest
+    const std::size_t entries = blocks.size() + 1; // and the digest
     std::vector<std::size_t> offsets;
     offsets.reserve(entries);
     std::uint64_t offset = kHeaderSize + std::uint64_t{kTableEntrySize} * entries;
@@ -192,7 +192,7 @@ std::vector<std::uint8_t> assemble(const std::vector<Block>& blocks) {
         offsets.push_back(static_cast<std::size_t>(offset));
         offset += block.bytes.size();
     }
-    if (offset > kMaxOffset)  // the digest's offset is the largest
+    if (offset > kMaxOffset) // the digest's offset is the largest
         throw std::runtime_error(msg::kTooLarge);
 
     std::vector<std::uint8_t> bytes;

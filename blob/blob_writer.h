@@ -2,16 +2,16 @@
 // Builds the binary calibration data from the calibration values held in the
 // configuration tree.
 
-#include "blob/blob_sources.h"
-
 #include <array>
 #include <cstdint>
 #include <ostream>
 #include <vector>
 
+#include "blob/blob_sources.h"
+
 namespace blob {
 
-using ToolVersion = std::array<std::uint8_t, 3>;  // major, minor, patch
+using ToolVersion = std::array<std::uint8_t, 3>; // major, minor, patch
 
 // Lays out tracking (when there is a non-empty serial number), tool, lens
 // shading (when there are control points), white balance (when there are

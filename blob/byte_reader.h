@@ -3,10 +3,10 @@
 // reader: after the first read past the end ok() stays false and every
 // further read gives 0, so a block can be read whole and checked once.
 
-#include "image/byte_reader.h"
-
 #include <cstddef>
 #include <cstdint>
+
+#include "image/byte_reader.h"
 
 namespace blob {
 

@@ -1,16 +1,17 @@
 #include "blob/field_values.h"
 
+#include <stdexcept>
+
 #include "blob/blob_layout.h"
 #include "blob/blob_messages.h"
 #include "config/value_text.h"
-
-#include <stdexcept>
 
 namespace blob {
 
 namespace {
 
-[[noreturn]] void refuse(const config_node& config, const config_node& node, const std::string& why) {
+[[noreturn]] void refuse(const config_node& config, const config_node& node,
+                         const std::string& why) {
     throw std::runtime_error(msg::kValueFor + config_relative_path(config, node) + why);
 }
 

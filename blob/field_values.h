@@ -4,11 +4,11 @@
 // Missing nodes raise the configuration tree's own errors; values are named
 // in messages by their path below the "config" node.
 
-#include "config/config_node.h"
-
 #include <cstdint>
 #include <string>
 #include <vector>
+
+#include "config/config_node.h"
 
 namespace blob {
 

@@ -1,9 +1,9 @@
 #include "blob/md5.h"
 
-#include "blob/blob_messages.h"
-
 #include <memory>
 #include <stdexcept>
+
+#include "blob/blob_messages.h"
 
 #include <openssl/evp.h>
 
@@ -24,8 +24,7 @@ Md5Digest md5(const std::uint8_t* data, std::size_t size) {
     unsigned length = 0;
     if (!context || EVP_DigestInit_ex(context.get(), EVP_md5(), nullptr) != 1 ||
         EVP_DigestUpdate(context.get(), data, size) != 1 ||
-        EVP_DigestFinal_ex(context.get(), digest.data(), &length) != 1 ||
-        length != digest.size())
+        EVP_DigestFinal_ex(context.get(), digest.data(), &length) != 1 || length != digest.size())
         throw std::runtime_error(msg::kDigestFailed);
     return digest;
 }

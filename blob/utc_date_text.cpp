@@ -24,15 +24,16 @@ struct CivilDate {
 // Proleptic Gregorian date of a day count from 1970-01-01 (Howard Hinnant's
 // days-to-civil algorithm, eras of 400 years).
 CivilDate civilFromDays(std::int64_t days) {
-    days += 719468;  // shift the epoch to 0000-03-01
+    days += 719468; // shift the epoch to 0000-03-01
     const std::int64_t era = floorDivide(days, 146097);
     const std::int64_t dayOfEra = days - era * 146097;
     const std::int64_t yearOfEra =
         (dayOfEra - dayOfEra / 1460 + dayOfEra / 36524 - dayOfEra / 146096) / 365;
     const std::int64_t dayOfYear = dayOfEra - (365 * yearOfEra + yearOfEra / 4 - yearOfEra / 100);
-    const std::int64_t shiftedMonth = (5 * dayOfYear + 2) / 153;  // March = 0
+    const std::int64_t shiftedMonth = (5 * dayOfYear + 2) / 153; // March = 0
     const unsigned day = static_cast<unsigned>(dayOfYear - (153 * shiftedMonth + 2) / 5 + 1);
-    const unsigned month = static_cast<unsigned>(shiftedMonth < 10 ? shiftedMonth + 3 : shiftedMonth - 9);
+    const unsigned month =
+        static_cast<unsigned>(shiftedMonth < 10 ? shiftedMonth + 3 : shiftedMonth - 9);
     const std::int64_t year = yearOfEra + era * 400 + (month <= 2 ? 1 : 0);
     return {year, month, day};
 }

@@ -1,9 +1,9 @@
 #include "blob/value_code.h"
 
-#include "blob/blob_messages.h"
-
 #include <cmath>
 #include <stdexcept>
+
+#include "blob/blob_messages.h"
 
 namespace blob {
 
@@ -11,7 +11,9 @@ namespace {
 
 constexpr unsigned kSaturatedBits = 0xFFFF;
 
-bool isDigit(char c) { return c >= '0' && c <= '9'; }
+bool isDigit(char c) {
+    return c >= '0' && c <= '9';
+}
 
 // Reads a run of digits starting at `pos`, saturating; returns the count read.
 std::size_t readDigits(const std::string& text, std::size_t pos, unsigned* value) {
@@ -69,7 +71,7 @@ std::uint32_t encodeValue(double value, const ValueFormat& format) {
     double integer = std::floor(magnitude);
     const double scaled = std::ldexp(magnitude - integer, fracBits);
     double fraction = std::floor(scaled);
-    if (scaled - fraction > 0.5)  // a tie stays on the lower value
+    if (scaled - fraction > 0.5) // a tie stays on the lower value
         fraction += 1.0;
     if (fraction >= std::ldexp(1.0, fracBits)) {
         integer += 1.0;

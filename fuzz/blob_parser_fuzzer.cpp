@@ -1,14 +1,14 @@
 // Feeds arbitrary bytes to the calibration data parser and dumps whatever it
 // accepts. The parser reports bad data only as std::runtime_error.
 
-#include "blob/blob_dump.h"
-#include "blob/blob_parser.h"
-#include "config/config_node.h"
-
 #include <cstddef>
 #include <cstdint>
 #include <sstream>
 #include <stdexcept>
+
+#include "blob/blob_dump.h"
+#include "blob/blob_parser.h"
+#include "config/config_node.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     config_node_impl root("root");

@@ -1,8 +1,8 @@
-#include "blob/bit_packing.h"
+#include <vector>
 
 #include <gtest/gtest.h>
 
-#include <vector>
+#include "blob/bit_packing.h"
 
 namespace blob {
 namespace {
@@ -15,7 +15,7 @@ TEST(BitPacking, PacksMostSignificantBitFirstWithoutGaps) {
 
 TEST(BitPacking, FillsTheLastByteWithZeroBits) {
     std::vector<std::uint8_t> bytes;
-    packCodes({0x7, 0x7, 0x7}, 3, bytes);  // 9 bits
+    packCodes({0x7, 0x7, 0x7}, 3, bytes); // 9 bits
     EXPECT_EQ(bytes, (std::vector<std::uint8_t>{0xFF, 0x80}));
     EXPECT_EQ(packedSize(3, 3), 2u);
 }
@@ -53,7 +53,7 @@ TEST(BitUnpacking, ReadsBackWhatWasPackedForEveryWidth) {
 }
 
 TEST(BitUnpacking, RefusesDataShorterThanTheCodesNeed) {
-    const std::vector<std::uint8_t> bytes(599);  // 400 codes of 12 bits need 600
+    const std::vector<std::uint8_t> bytes(599); // 400 codes of 12 bits need 600
     std::vector<std::uint32_t> codes;
     EXPECT_FALSE(unpackCodes(bytes.data(), bytes.size(), 12, 400, codes));
     EXPECT_TRUE(codes.empty());

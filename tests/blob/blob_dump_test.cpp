@@ -1,12 +1,11 @@
-#include "blob/blob_dump.h"
-
-#include "blob/blob_parser.h"
-#include "blob_test_builder.h"
+#include <sstream>
+#include <string>
 
 #include <gtest/gtest.h>
 
-#include <sstream>
-#include <string>
+#include "blob/blob_dump.h"
+#include "blob/blob_parser.h"
+#include "blob_test_builder.h"
 
 namespace blob {
 namespace {
@@ -61,11 +60,11 @@ TEST_F(BlobDump, WritesEveryBlockInItsFixedForm) {
     for (const char* name : {"controlPointR", "controlPointGR", "controlPointGB", "controlPointB"})
         for (int i = 0; i < 10; ++i)
             for (int j = 0; j < 10; ++j)
-                expected += std::string("reference.") + name + "[" + std::to_string(i) + "][" +
-                            std::to_string(j) + "] = " +
-                            (std::string(name) == "controlPointR" && i == 0 && j == 0 ? "1.25"
-                                                                                       : "1") +
-                            ";\n";
+                expected +=
+                    std::string("reference.") + name + "[" + std::to_string(i) + "][" +
+                    std::to_string(j) + "] = " +
+                    (std::string(name) == "controlPointR" && i == 0 && j == 0 ? "1.25" : "1") +
+                    ";\n";
     expected += "\n# -------------------- AWB block --------------------\n"
                 "reference.light_source = 0;\n"
                 "reference.R = 512;\n"
@@ -107,7 +106,8 @@ TEST_F(BlobDump, WithoutAToolBlockTheToolLinesStayEmpty) {
 }
 
 TEST_F(BlobDump, EmptySerialIsQuotedSoTheLineReadsBack) {
-    const std::string text = dump(BlobBuilder().block(kTrackingBlock, test::trackingBlock({})).build());
+    const std::string text =
+        dump(BlobBuilder().block(kTrackingBlock, test::trackingBlock({})).build());
     EXPECT_NE(text.find("\nreference.serial_no = \"\";\n"), std::string::npos) << text;
 }
 

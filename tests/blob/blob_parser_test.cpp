@@ -1,11 +1,10 @@
-#include "blob/blob_parser.h"
-
-#include "blob_test_builder.h"
+#include <stdexcept>
+#include <string>
 
 #include <gtest/gtest.h>
 
-#include <stdexcept>
-#include <string>
+#include "blob/blob_parser.h"
+#include "blob_test_builder.h"
 
 namespace blob {
 namespace {
@@ -83,7 +82,7 @@ TEST_F(BlobParser, DigestAloneIsValid) {
 TEST_F(BlobParser, EntryPointingIntoTheTableIsCorrupt) {
     Bytes blob = BlobBuilder().block(kToolBlock, tool()).build();
     blob[10] = 0;
-    blob[11] = 11;  // the tool entry at 8..11 points at 11
+    blob[11] = 11; // the tool entry at 8..11 points at 11
     EXPECT_EQ(failure(blob), "Binary calibration data is corrupt.");
 }
 
@@ -97,7 +96,7 @@ TEST_F(BlobParser, EntryJustBehindItselfIsAllowed) {
 
 TEST_F(BlobParser, BlockRunningPastTheEndIsTruncated) {
     Bytes blob = BlobBuilder().block(kToolBlock, tool()).build();
-    blob.resize(blob.size() - 16 - 2);  // no digest, tool block cut short
+    blob.resize(blob.size() - 16 - 2); // no digest, tool block cut short
     EXPECT_EQ(failure(blob), "Binary calibration data is corrupt or truncated.");
 }
 
@@ -152,8 +151,9 @@ TEST_F(BlobParser, TableThatReusesOneBlockManyTimesIsCorrupt) {
     const std::uint16_t offset = static_cast<std::uint16_t>(16 + shift);
     for (std::size_t i = 0; i <= copies; ++i)
         test::put(grown, (std::uint32_t{kFocusBlock} << 16) | offset, 4);
-    test::put(grown, (std::uint32_t{kDigestBlock} << 16) |
-                         static_cast<std::uint16_t>(offset + (blob.size() - 16 - 16)),
+    test::put(grown,
+              (std::uint32_t{kDigestBlock} << 16) |
+                  static_cast<std::uint16_t>(offset + (blob.size() - 16 - 16)),
               4);
     grown.insert(grown.end(), blob.begin() + 16, blob.end() - 16);
     grown.resize(grown.size() + 16);
@@ -229,7 +229,7 @@ TEST_F(BlobParser, LensShadingCodesBecomeControlPoints) {
 }
 
 TEST_F(BlobParser, ChannelsFollowEachOtherInOrder) {
-    const auto code = [](int n) { return (n / 100 + 1) << 8; };  // channel c holds c + 1
+    const auto code = [](int n) { return (n / 100 + 1) << 8; }; // channel c holds c + 1
     parse(BlobBuilder().block(kLscBlock, test::lscBlock(0, 3, 8, code)).build());
     EXPECT_EQ(value(calibration, "controlPointR[5][5]"), "1");
     EXPECT_EQ(value(calibration, "controlPointGR[5][5]"), "2");
@@ -240,7 +240,7 @@ TEST_F(BlobParser, ChannelsFollowEachOtherInOrder) {
 TEST_F(BlobParser, PackedCodesShorterThanFourHundredAreTruncated) {
     Bytes blob =
         BlobBuilder().block(kLscBlock, test::lscBlock(0, 3, 8, [](int) { return 0; })).build();
-    blob.resize(blob.size() - 16 - 1);  // no digest, and the last code byte missing
+    blob.resize(blob.size() - 16 - 1); // no digest, and the last code byte missing
     EXPECT_EQ(failure(blob), "Binary calibration data is corrupt or truncated.");
     EXPECT_FALSE(calibration.find("controlPointR").valid());
     EXPECT_FALSE(config.find("shared").find("light_source").valid());
@@ -252,7 +252,7 @@ TEST_F(BlobParser, CodesWiderThan32BitsAreRefused) {
 }
 
 TEST_F(BlobParser, ReadsThirtyTwoBitCodes) {
-    const auto code = [](int) { return 0x00018000u; };  // 1.5 in s15.16
+    const auto code = [](int) { return 0x00018000u; }; // 1.5 in s15.16
     parse(BlobBuilder().block(kLscBlock, test::lscBlock(0, 15, 16, code)).build());
     EXPECT_EQ(value(calibration, "controlPointB[9][9]"), "1.5");
     EXPECT_EQ(value(config, "blob.compression_res"), "s15.16");
@@ -355,7 +355,7 @@ TEST_F(BlobParser, PairCountRunningPastTheBlobIsTruncated) {
     Focus focus;
     focus.pairs = {{1, 2}};
     Bytes block = test::focusBlock(focus);
-    block[17] = 200;  // claims 200 pairs, holds one
+    block[17] = 200; // claims 200 pairs, holds one
     EXPECT_EQ(failure(BlobBuilder().block(kFocusBlock, block).build()),
               "Binary calibration data is corrupt or truncated.");
     EXPECT_FALSE(calibration.find("module").valid());

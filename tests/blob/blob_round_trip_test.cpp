@@ -1,15 +1,15 @@
 // Calibration data survives the whole way: configuration text -> blob ->
 // trees -> text dump -> configuration text -> the same blob.
 
+#include <sstream>
+#include <string>
+
+#include <gtest/gtest.h>
+
 #include "blob/blob_dump.h"
 #include "blob/blob_parser.h"
 #include "blob/blob_writer.h"
 #include "config/config_file.h"
-
-#include <gtest/gtest.h>
-
-#include <sstream>
-#include <string>
 
 namespace blob {
 namespace {
@@ -41,8 +41,9 @@ std::string calibrationText(const std::string& controlPointPrefix) {
                 // negative value that rounds to zero.
                 std::ostringstream value;
                 value.precision(12);
-                value << (c == 2 && i == 0 && j == 0 ? -0.001f
-                                                     : 1.1f + 0.0371f * (c + i * j) - (i == 9 ? 3.0f : 0.0f));
+                value << (c == 2 && i == 0 && j == 0
+                              ? -0.001f
+                              : 1.1f + 0.0371f * (c + i * j) - (i == 9 ? 3.0f : 0.0f));
                 text += controlPointPrefix + ".controlPoint" + names[c] + "[" + std::to_string(i) +
                         "][" + std::to_string(j) + "]  = " + value.str() + ";\n";
             }
@@ -107,7 +108,7 @@ TEST(BlobRoundTrip, ValuesSurviveTheTrip) {
              "reference.light_source = -1;\n",
              "# reference.light_id = -1;\n",
              "reference.GB = 1001;\n",
-             "reference.controlPointR[0][0] = 1.1015625;\n",  // 1.1 to the nearest 1/256
+             "reference.controlPointR[0][0] = 1.1015625;\n", // 1.1 to the nearest 1/256
              "reference.controlPointGB[0][0] = -0;\n",
              "module.af.set[0].macro = 4000000000;\n",
              "module.af.set[0].settle_time = 65535;\n",
@@ -130,7 +131,7 @@ TEST(BlobRoundTrip, QuotedEmptySerialGivesNoTrackingBlock) {
     std::string text = calibrationText("reference");
     text.replace(text.find("0a1b2c"), 6, "\"\"");
     const Bytes blob = generateFromText(kSettings, text);
-    EXPECT_EQ(blob[8] << 8 | blob[9], 0x0003);  // the table starts with the tool block
+    EXPECT_EQ(blob[8] << 8 | blob[9], 0x0003); // the table starts with the tool block
     EXPECT_EQ(dumpOf(blob).find("serial_no"), std::string::npos);
 }
 
@@ -145,15 +146,14 @@ TEST(BlobRoundTrip, EveryChangedByteOfAWrittenBlobIsAcceptedOrRefusedCleanly) {
             ADD_FAILURE() << "byte " << i << " changed, yet the digest matched";
         } catch (const std::runtime_error& e) {
             const std::string message = e.what();
-            EXPECT_TRUE(message == "Bad CRC value" ||
-                        message == "Binary calibration data is corrupt." ||
-                        message == "Binary calibration data is corrupt or truncated." ||
-                        message == "Magic number does not match." ||
-                        message == "Wrong blob version." ||
-                        message == "Unknown header type found." ||
-                        message == "Two different light sources in lens shading data." ||
-                        message == "Compressed data values larger than 32 bits are not supported." ||
-                        message.rfind("Invalid config file date: ", 0) == 0)
+            EXPECT_TRUE(
+                message == "Bad CRC value" || message == "Binary calibration data is corrupt." ||
+                message == "Binary calibration data is corrupt or truncated." ||
+                message == "Magic number does not match." || message == "Wrong blob version." ||
+                message == "Unknown header type found." ||
+                message == "Two different light sources in lens shading data." ||
+                message == "Compressed data values larger than 32 bits are not supported." ||
+                message.rfind("Invalid config file date: ", 0) == 0)
                 << "byte " << i << ": " << message;
         }
     }

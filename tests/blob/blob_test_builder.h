@@ -2,13 +2,13 @@
 // Builds binary calibration data byte by byte for the tests, so each case
 // shows the bytes it feeds the parser.
 
-#include "blob/blob_layout.h"
-#include "blob/md5.h"
-
 #include <cstdint>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include "blob/blob_layout.h"
+#include "blob/md5.h"
 
 namespace blob::test {
 

@@ -1,17 +1,16 @@
-#include "blob/blob_writer.h"
-
-#include "blob/blob_layout.h"
-#include "blob/blob_parser.h"
-#include "blob_test_builder.h"
-#include "reference_md5.h"
-
-#include <gtest/gtest.h>
-
 #include <cmath>
 #include <functional>
 #include <sstream>
 #include <stdexcept>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include "blob/blob_layout.h"
+#include "blob/blob_parser.h"
+#include "blob/blob_writer.h"
+#include "blob_test_builder.h"
+#include "reference_md5.h"
 
 namespace blob {
 namespace {
@@ -105,10 +104,9 @@ protected:
 TEST_F(BlobWriter, BareCalibrationDataGivesToolAndDigestOnly) {
     const Bytes blob = generate();
     ASSERT_EQ(blob.size(), 8u + 2 * 4 + 13 + 16);
-    EXPECT_EQ(Bytes(blob.begin(), blob.begin() + 8),
-              (Bytes{0xCA, 0x1B, 0xA7, 0xED, 1, 4, 0, 0}));
-    EXPECT_EQ(table(blob), (std::vector<std::pair<std::uint16_t, std::uint16_t>>{
-                               {0x0003, 16}, {0xB10B, 29}}));
+    EXPECT_EQ(Bytes(blob.begin(), blob.begin() + 8), (Bytes{0xCA, 0x1B, 0xA7, 0xED, 1, 4, 0, 0}));
+    EXPECT_EQ(table(blob),
+              (std::vector<std::pair<std::uint16_t, std::uint16_t>>{{0x0003, 16}, {0xB10B, 29}}));
     EXPECT_EQ(Bytes(blob.begin() + 16, blob.begin() + 29),
               (Bytes{13, 1, 7, 2, 0, 0, 0, 0, 0x4F, 0x9F, 0xBB, 0x28, 0}));
     EXPECT_TRUE(warnings.str().empty());
@@ -132,7 +130,8 @@ TEST_F(BlobWriter, ProgramNumberIsTheLastToolByte) {
 TEST_F(BlobWriter, MissingDateWarnsOnceAndWritesZero) {
     set("shared.cfg_file_date", "");
     const Bytes blob = generate();
-    EXPECT_EQ(warnings.str(), "WARNING: No shared.cfg_file_date attribute specified in config file.\n");
+    EXPECT_EQ(warnings.str(),
+              "WARNING: No shared.cfg_file_date attribute specified in config file.\n");
     EXPECT_EQ(readBig(blob, 16 + 4, 8), 0u);
 }
 
@@ -142,7 +141,8 @@ TEST_F(BlobWriter, AbsentDateKeyWarnsToo) {
     for (const char* key : {"block_name", "block_num_flag", "block_num", "program_number"})
         other.child("shared").child(key).set(config.find("shared").find(key).as_string());
     generateBlob(blobSourcesFromConfig(other), version, warnings);
-    EXPECT_EQ(warnings.str(), "WARNING: No shared.cfg_file_date attribute specified in config file.\n");
+    EXPECT_EQ(warnings.str(),
+              "WARNING: No shared.cfg_file_date attribute specified in config file.\n");
 }
 
 TEST_F(BlobWriter, MalformedDateIsRefused) {
@@ -174,9 +174,10 @@ TEST_F(BlobWriter, BlocksFollowTheTableInFixedOrder) {
 }
 
 TEST_F(BlobWriter, OffsetsThatWouldWrapAreRefused) {
-    for (int s = 0; s < 32; ++s)  // 32 sets of 255 pairs: about 66 KB
+    for (int s = 0; s < 32; ++s) // 32 sets of 255 pairs: about 66 KB
         setFocus(s, "H", 255);
-    EXPECT_EQ(failure(), "Binary calibration data too large: block offsets must stay below 64 KiB.");
+    EXPECT_EQ(failure(),
+              "Binary calibration data too large: block offsets must stay below 64 KiB.");
 }
 
 // ---- Tracking data ----
@@ -227,7 +228,7 @@ TEST_F(BlobWriter, ControlPointsArePackedInChannelAndRowOrder) {
     const Bytes blob = generate();
     const std::size_t at = blockOffset(blob, kLscBlock);
     EXPECT_EQ(Bytes(blob.begin() + at, blob.begin() + at + 6), (Bytes{2, 3, 8, 0, 0x18, 0x00}));
-    EXPECT_EQ(blob[at + 4 + 598], 0x09);  // last code 0x980
+    EXPECT_EQ(blob[at + 4 + 598], 0x09); // last code 0x980
     EXPECT_EQ(blob[at + 4 + 599], 0x80);
 }
 
@@ -247,7 +248,7 @@ TEST_F(BlobWriter, ControlPointsUnderTheBlockNumber) {
     setGrids("reference.ctrlPoints[2].", [](int, int, int) { return 0.5f; });
     const Bytes blob = generate();
     const std::size_t at = blockOffset(blob, kLscBlock);
-    EXPECT_EQ(readBig(blob, at + 4, 2), 0x0800u);  // two codes of 0x080
+    EXPECT_EQ(readBig(blob, at + 4, 2), 0x0800u); // two codes of 0x080
 }
 
 TEST_F(BlobWriter, UncompressedDataIsNotSupported) {
@@ -278,7 +279,8 @@ TEST_F(BlobWriter, ControlPointCountMayNotBeGiven) {
 }
 
 TEST_F(BlobWriter, ControlPointOutsideTheFormatRange) {
-    setGrids("reference.", [](int c, int i, int j) { return c == 1 && i == 4 && j == 4 ? 8.0f : 1.0f; });
+    setGrids("reference.",
+             [](int c, int i, int j) { return c == 1 && i == 4 && j == 4 ? 8.0f : 1.0f; });
     const std::string expected =
         "Lens shading value (8) is outside of the range allowed for the "
         "lensShading.compression_res value specified in the configuration file.\n"
@@ -336,8 +338,8 @@ TEST_F(BlobWriter, FocusSetInTheWideLayout) {
     set("module.af.set[0].macro", "4294967295");
     const Bytes blob = generate();
     const std::size_t at = blockOffset(blob, kFocusBlock);
-    const Bytes expected = {'H',  0xFF, 0xFF, 0xFF, 0xFF, 0, 0, 0, 200, 0, 0, 1, 44, 0, 40, 0, 5,
-                            2,    0,    0,    0,    0,    0, 0, 0, 0,   0, 0, 0, 1,  0, 0,  0, 10};
+    const Bytes expected = {'H', 0xFF, 0xFF, 0xFF, 0xFF, 0, 0, 0, 200, 0, 0, 1, 44, 0, 40, 0, 5,
+                            2,   0,    0,    0,    0,    0, 0, 0, 0,   0, 0, 0, 1,  0, 0,  0, 10};
     EXPECT_EQ(Bytes(blob.begin() + at, blob.begin() + at + expected.size()), expected);
 }
 
@@ -364,7 +366,7 @@ TEST_F(BlobWriter, PairCountBeyondThePairsRaisesTheTreeError) {
 
 TEST_F(BlobWriter, SetsEndAtTheFirstMissingPosture) {
     setFocus(0, "H", 0);
-    setFocus(2, "H", 0);  // set[1] exists only as a gap
+    setFocus(2, "H", 0); // set[1] exists only as a gap
     std::size_t focusBlocks = 0;
     for (const auto& entry : table(generate()))
         focusBlocks += entry.first == kFocusBlock;
@@ -401,7 +403,7 @@ TEST_F(BlobWriter, FocusValuesWiderThanTheirFieldsAreRefused) {
         setFocus(0, "H", 1);
         set(std::string("module.af.set[0].") + c.key, c.value);
         EXPECT_EQ(failure(), c.message) << c.key;
-        set(std::string("module.af.set[0].") + c.key, "1");  // restore a valid value
+        set(std::string("module.af.set[0].") + c.key, "1"); // restore a valid value
     }
 }
 

@@ -1,11 +1,11 @@
-#include "blob/byte_reader.h"
-#include "blob/byte_writer.h"
-
-#include <gtest/gtest.h>
-
 #include <cstdint>
 #include <limits>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "blob/byte_reader.h"
+#include "blob/byte_writer.h"
 
 namespace blob {
 namespace {
@@ -19,8 +19,8 @@ TEST(ByteWriter, WritesBigEndian) {
     out.u64(0x08090A0B0C0D0E0Full);
     const std::uint8_t tail[] = {0xAA, 0xBB};
     out.bytes(tail, 2);
-    const std::vector<std::uint8_t> expected = {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11,
-                                                12, 13, 14, 15, 0xAA, 0xBB};
+    const std::vector<std::uint8_t> expected = {1,  2,  3,  4,  5,  6,  7,    8,   9,
+                                                10, 11, 12, 13, 14, 15, 0xAA, 0xBB};
     EXPECT_EQ(bytes, expected);
     EXPECT_EQ(out.size(), expected.size());
 }
@@ -40,9 +40,9 @@ TEST(ByteReader, OverrunFailsAndStaysFailed) {
     const std::uint8_t data[] = {0xFF, 0xFF, 0xFF};
     ByteReader in(data, sizeof data);
     EXPECT_EQ(in.u16(), 0xFFFF);
-    EXPECT_EQ(in.u16(), 0);  // one byte left: nothing of it is used
+    EXPECT_EQ(in.u16(), 0); // one byte left: nothing of it is used
     EXPECT_FALSE(in.ok());
-    EXPECT_EQ(in.u8(), 0);  // would fit, but the reader stays failed
+    EXPECT_EQ(in.u8(), 0); // would fit, but the reader stays failed
     EXPECT_EQ(in.remaining(), 0u);
 }
 

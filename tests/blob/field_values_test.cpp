@@ -1,10 +1,10 @@
-#include "blob/field_values.h"
-
-#include <gtest/gtest.h>
-
 #include <functional>
 #include <stdexcept>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include "blob/field_values.h"
 
 namespace blob {
 namespace {

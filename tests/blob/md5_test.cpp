@@ -1,13 +1,12 @@
-#include "blob/md5.h"
-
-#include "reference_md5.h"
-
-#include <gtest/gtest.h>
-
 #include <cstdio>
 #include <cstring>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "blob/md5.h"
+#include "reference_md5.h"
 
 namespace blob {
 namespace {

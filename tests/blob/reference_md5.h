@@ -16,7 +16,8 @@ inline std::array<std::uint8_t, 16> referenceMd5(const std::vector<std::uint8_t>
                                         6, 10, 15, 21, 6, 10, 15, 21, 6, 10, 15, 21, 6, 10, 15, 21};
     std::uint32_t table[64];
     for (int i = 0; i < 64; ++i)
-        table[i] = static_cast<std::uint32_t>(std::floor(std::fabs(std::sin(i + 1.0)) * 4294967296.0));
+        table[i] =
+            static_cast<std::uint32_t>(std::floor(std::fabs(std::sin(i + 1.0)) * 4294967296.0));
 
     std::vector<std::uint8_t> message = input;
     const std::uint64_t bitLength = std::uint64_t{input.size()} * 8;

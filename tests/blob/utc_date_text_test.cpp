@@ -1,11 +1,11 @@
-#include "blob/utc_date_text.h"
+#include <cstdlib>
+#include <ctime>
+#include <limits>
+#include <string>
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
-#include <ctime>
-#include <string>
-#include <limits>
+#include "blob/utc_date_text.h"
 
 namespace blob {
 namespace {
@@ -13,7 +13,7 @@ namespace {
 TEST(UtcDateText, FormatsSecondsAsMinutes) {
     EXPECT_EQ(utcDateText(0), "1970-01-01T00:00");
     EXPECT_EQ(utcDateText(1335868200), "2012-05-01T10:30");
-    EXPECT_EQ(utcDateText(1335868259), "2012-05-01T10:30");  // seconds dropped
+    EXPECT_EQ(utcDateText(1335868259), "2012-05-01T10:30"); // seconds dropped
     EXPECT_EQ(utcDateText(951782400), "2000-02-29T00:00");
     EXPECT_EQ(utcDateText(2147483647), "2038-01-19T03:14");
 }

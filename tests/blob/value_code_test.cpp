@@ -1,8 +1,8 @@
-#include "blob/value_code.h"
+#include <stdexcept>
 
 #include <gtest/gtest.h>
 
-#include <stdexcept>
+#include "blob/value_code.h"
 
 namespace blob {
 namespace {
@@ -34,7 +34,8 @@ TEST(ValueFormatText, MissingNumbersReadAsZero) {
 }
 
 TEST(ValueFormatText, RejectsMalformedTexts) {
-    for (const char* text : {"x3.8", "s3.8a", "s38", "", "S3.8", "s3.8.1", "s-3.8", "s3,8", " s3.8"}) {
+    for (const char* text :
+         {"x3.8", "s3.8a", "s38", "", "S3.8", "s3.8.1", "s-3.8", "s3,8", " s3.8"}) {
         try {
             parseValueFormat(text);
             ADD_FAILURE() << text << " was accepted";
@@ -78,7 +79,7 @@ TEST(ValueCode, FractionRoundingCarriesIntoTheIntegerPart) {
 }
 
 TEST(ValueCode, TiesGoToTheLowerStep) {
-    const ValueFormat f = format(3, 2);  // steps of 0.25
+    const ValueFormat f = format(3, 2); // steps of 0.25
     EXPECT_EQ(encodeValue(0.125, f), 0x0u);
     EXPECT_EQ(encodeValue(0.375, f), 0x1u);
     EXPECT_EQ(encodeValue(0.376, f), 0x2u);
@@ -101,14 +102,14 @@ TEST(ValueCode, DecodesEveryCodeOfAFormatBackToItself) {
     const ValueFormat f = format(3, 8);
     for (std::uint32_t code = 0; code < (1u << f.codeBits()); ++code) {
         if (code == 0x800u)
-            continue;  // -0 is the only value with two codes
+            continue; // -0 is the only value with two codes
         const double value = decodeValue(code, f);
         ASSERT_EQ(encodeValue(value, f), code) << value;
     }
 }
 
 TEST(ValueCode, DecodesTheWidestCodes) {
-    const ValueFormat f = format(15, 16);  // 32 bits
+    const ValueFormat f = format(15, 16); // 32 bits
     EXPECT_DOUBLE_EQ(decodeValue(0xFFFFFFFFu, f), -(32768.0 - 1.0 / 65536));
     EXPECT_DOUBLE_EQ(decodeValue(0x00018000u, f), 1.5);
     EXPECT_EQ(encodeValue(-(32768.0 - 1.0 / 65536), f), 0xFFFFFFFFu);
