@@ -44,17 +44,6 @@ TEST_F(ParameterTableTest, DefaultsAreMarkedAndValid) {
     EXPECT_EQ(block_prefix(root), "reference.");
 }
 
-TEST_F(ParameterTableTest, SharedKeyNamesKeepTheirOwnSectionDefaults) {
-    EXPECT_EQ(config.find_path("proc.median_filter_flag").as_string(), "1");
-    EXPECT_EQ(config.find_path("proc.median_filter_size").as_string(), "3");
-    EXPECT_EQ(config.find_path("lsc.median_filter_flag").as_string(), "0");
-    EXPECT_EQ(config.find_path("lsc.median_filter_size").as_string(), "1");
-    EXPECT_EQ(config.find_path("lsc.sampling_factor").as_string(), "8");
-    EXPECT_EQ(config.find_path("apply_lsc.sampling_factor").as_string(), "4");
-    EXPECT_EQ(config.find_path("lsc.left_patch_width").as_string(), "-1");
-    EXPECT_EQ(config.find_path("blob.compression_res").as_string(), "s3.8");
-}
-
 TEST_F(ParameterTableTest, ColourMatrixDefaultsToIdentityAndBlockCountsToZero) {
     for (int r = 0; r < 3; ++r)
         for (int c = 0; c < 3; ++c)
@@ -62,27 +51,6 @@ TEST_F(ParameterTableTest, ColourMatrixDefaultsToIdentityAndBlockCountsToZero) {
                       r == c ? "1.0" : "0.0");
     EXPECT_EQ(config.find_path("apply_lsc.delta_ab_blocks[0]").as_string(), "0");
     EXPECT_EQ(config.find_path("apply_lsc.delta_ab_blocks[1]").as_string(), "0");
-}
-
-TEST_F(ParameterTableTest, DefaultsPrintDepthFirst) {
-    std::ostringstream out;
-    config.find("apply_lsc").print(out);
-    std::string expected = "root.config.apply_lsc = <empty>\n"
-                           "root.config.apply_lsc.ccm = <empty>\n";
-    for (int r = 0; r < 3; ++r) {
-        const std::string row = "root.config.apply_lsc.ccm[" + std::to_string(r) + "]";
-        expected += row + " = <empty>\n";
-        for (int c = 0; c < 3; ++c)
-            expected += row + "[" + std::to_string(c) + "] = *" + (r == c ? "1.0\n" : "0.0\n");
-    }
-    expected += "root.config.apply_lsc.delta_ab_blocks = <empty>\n"
-                "root.config.apply_lsc.delta_ab_blocks[0] = *0\n"
-                "root.config.apply_lsc.delta_ab_blocks[1] = *0\n"
-                "root.config.apply_lsc.luma_normalize_factor = *0.75\n"
-                "root.config.apply_lsc.max_delta_ab = *10.0\n"
-                "root.config.apply_lsc.sampling_factor = *4\n"
-                "root.config.apply_lsc.test_max_delta_ab = *0.0\n";
-    EXPECT_EQ(out.str(), expected);
 }
 
 // ---- range checks -----------------------------------------------------------
