@@ -43,6 +43,7 @@ inline constexpr char kToleranceExceeded[] =
 
 // Writing: values the fields cannot hold. Each starts "Value for " + path.
 inline constexpr char kValueFor[] = "Value for ";
+inline constexpr char kMissingValue[] = "Missing value for "; // + path + "."
 inline constexpr char kNotWholeNumber[] = " is not a whole number.";
 inline constexpr char kDoesNotFitStart[] =
     " does not fit in the binary calibration data, value must be between "; // lo " and " hi "."

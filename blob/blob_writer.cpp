@@ -147,8 +147,8 @@ Block awbBlock(const BlobSources& in) {
     ByteWriter out(block.bytes);
     out.u16(static_cast<std::uint16_t>(lightSource(in.config)));
     for (const char* name : kAwbNames)
-        out.u16(
-            static_cast<std::uint16_t>(fieldValue(in.config, in.registers.find(name), 0, kMaxU16)));
+        out.u16(static_cast<std::uint16_t>(
+            fieldValue(in.config, requiredChild(in.config, in.registers, name), 0, kMaxU16)));
     return block;
 }
 
@@ -170,16 +170,18 @@ Block focusBlock(const config_node& config, const config_node& set) {
     ByteWriter out(block.bytes);
     out.u8(static_cast<std::uint8_t>(postureCharacter(config, set.find("posture"))));
     for (const char* name : {"macro", "hyper", "inf"})
-        out.u32(static_cast<std::uint32_t>(fieldValue(config, set.find(name), 0, kMaxU32)));
+        out.u32(static_cast<std::uint32_t>(
+            fieldValue(config, requiredChild(config, set, name), 0, kMaxU32)));
     for (const char* name : {"settle_time", "hysteresis"})
-        out.u16(static_cast<std::uint16_t>(fieldValue(config, set.find(name), 0, kMaxU16)));
+        out.u16(static_cast<std::uint16_t>(
+            fieldValue(config, requiredChild(config, set, name), 0, kMaxU16)));
     const std::size_t count = focusPairCount(config, set);
     out.u8(static_cast<std::uint8_t>(count));
     const config_node& pairs = set.find("FDN_dist_pair");
     for (std::size_t k = 0; k < count; ++k)
         for (std::size_t half = 0; half < 2; ++half)
-            out.u32(static_cast<std::uint32_t>(
-                fieldValue(config, pairs.find(k).find(half), 0, kMaxU32)));
+            out.u32(static_cast<std::uint32_t>(fieldValue(
+                config, requiredChild(config, requiredChild(config, pairs, k), half), 0, kMaxU32)));
     return block;
 }
 

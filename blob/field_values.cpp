@@ -61,6 +61,24 @@ std::int64_t fieldValue(const config_node& config, const config_node& node, std:
     return value;
 }
 
+const config_node& requiredChild(const config_node& config, const config_node& parent,
+                                 const std::string& name) {
+    const config_node& child = parent.find(name);
+    if (!child.valid())
+        throw std::runtime_error(msg::kMissingValue + config_relative_path(config, parent) + "." +
+                                 name + ".");
+    return child;
+}
+
+const config_node& requiredChild(const config_node& config, const config_node& parent,
+                                 std::size_t index) {
+    const config_node& child = parent.find(index);
+    if (!child.valid())
+        throw std::runtime_error(msg::kMissingValue + config_relative_path(config, parent) + "[" +
+                                 std::to_string(index) + "].");
+    return child;
+}
+
 std::string unquoted(const std::string& text) {
     if (text.size() >= 2 && text.front() == '"' && text.back() == '"')
         return text.substr(1, text.size() - 2);

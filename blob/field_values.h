@@ -19,6 +19,14 @@ namespace blob {
 std::int64_t fieldValue(const config_node& config, const config_node& node, std::int64_t low,
                         std::int64_t high);
 
+// The child `name` (or `index`) of `parent`; throws std::runtime_error
+// "Missing value for <path>." when the calibration data do not hold it, so
+// the operator learns which entry is missing.
+const config_node& requiredChild(const config_node& config, const config_node& parent,
+                                 const std::string& name);
+const config_node& requiredChild(const config_node& config, const config_node& parent,
+                                 std::size_t index);
+
 // The text without one pair of surrounding double quotes: the register file
 // quotes a value that is empty or not a plain token.
 std::string unquoted(const std::string& text);

@@ -41,6 +41,8 @@ inline constexpr char kBinaryNeedsCalibrate[] =
     "(--calibrate).";
 inline constexpr char kCannotStoreBinary[] = "Cannot store binary calibration file.";
 inline constexpr char kCannotLoadBinary[] = "Cannot load binary calibration file.";
+inline constexpr char kCannotWriteDump[] =
+    "Cannot write the text of the binary calibration data to standard output.";
 
 // Headerless raw input
 inline constexpr char kDetailsUnreadable[] = "Unable to read headerless raw image details file.";

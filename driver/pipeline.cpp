@@ -321,6 +321,8 @@ void Pipeline::writeBinaryData() {
         blob::writeCalibrationText(scratch.child("calibration"), settings_.blockName + ".",
                                    scratch.child("config"), kBlobGeneratorName,
                                    kBlobGeneratorVersion, versions, std::cout);
+        if (!std::cout)
+            throw std::runtime_error(msg::kCannotWriteDump);
     }
     timerLine(timer_, "Binary data construction time: ", out());
 

@@ -358,10 +358,16 @@ TEST_F(BlobWriter, GivenPairCountIsUsed) {
     EXPECT_EQ(blockOffset(blob, kDigestBlock), at + 18 + 8);
 }
 
-TEST_F(BlobWriter, PairCountBeyondThePairsRaisesTheTreeError) {
+TEST_F(BlobWriter, PairCountBeyondThePairsNamesTheMissingPair) {
     setFocus(0, "H", 1);
     set("module.af.set[0].num_pairs", "2");
-    EXPECT_THROW(generate(), std::invalid_argument);
+    EXPECT_EQ(failure(), "Missing value for module.af.set[0].FDN_dist_pair[1].");
+}
+
+TEST_F(BlobWriter, MissingFocusValueIsNamed) {
+    set("module.af.set[0].posture", "'H'");
+    set("module.af.set[0].macro", "1");
+    EXPECT_EQ(failure(), "Missing value for module.af.set[0].hyper.");
 }
 
 TEST_F(BlobWriter, SetsEndAtTheFirstMissingPosture) {
