@@ -1,0 +1,15 @@
+#pragma once
+// How whatever ended a run is reported: the text, where it goes and the exit
+// status. One place, so the printed error and the report's verdict agree.
+
+#include <exception>
+#include <string>
+
+struct FailureText {
+    int status = 1;
+    std::string text;              // the lines to print, without the final line end
+    bool standardError = false;    // printed on standard error, not the message stream
+};
+
+// `failure` must hold an exception. A `notice` gives status 0 and its text.
+FailureText describeFailure(std::exception_ptr failure);
