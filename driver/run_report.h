@@ -65,4 +65,8 @@ struct RunReport {
     int deltaColumns = 0, deltaRows = 0;
     std::vector<float> delta;
     float threshold = 0.0f, maxDelta = 0.0f, meanChroma = 0.0f, deltaStdDev = 0.0f;
+
+    // How "Exposure time = " and "Sensor gain = " were printed: in debug mode
+    // the input statistics come first and leave the messages in fixed notation.
+    bool inspectionInFixedNotation = false;
 };
