@@ -68,7 +68,8 @@ po::options_description advancedOptions() {
          "Ignore HW limits warnings and continue. The default is to stop writing the output "
          "configuration mid-stream upon encountering a HW limit and return error code 257.")
         ("quiet,q", "Suppress warning and informational messages.")
-        ("verbose,v", "Output detailed information during processing.");
+        ("verbose,v", "Output detailed information during processing.")
+        ("report", fileName(), "Output calibration report filename (HTML format).");
     return options;
 }
 

@@ -8,7 +8,11 @@
 #include "config/parameter_table.h"
 #include "config/patch_geometry_check.h"
 #include "config/register_file.h"
+#include "driver/changed_settings.h"
 #include "driver/driver_messages.h"
+#include "driver/failure_text.h"
+#include "driver/report_data.h"
+#include "driver/run_report_html.h"
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
 #include "driver/version.h"
@@ -28,6 +32,7 @@
 #include <boost/date_time/posix_time/posix_time.hpp>
 
 #include <algorithm>
+#include <cmath>
 #include <fstream>
 #include <iostream>
 #include <iterator>
@@ -58,14 +63,24 @@ std::vector<std::uint8_t> readWholeFile(const std::string& path) {
     return bytes;
 }
 
-// "<label>R/G" and "<label>B/G" with six significant digits; G is the larger green.
-void printColourRatios(const char* label, const float (&levels)[kChannels]) {
+// Prints "<label>R/G" and "<label>B/G" with six significant digits (G is the
+// larger green) and returns the two ratios.
+std::pair<float, float> printColourRatios(const char* label, const float (&levels)[kChannels]) {
     const float green = std::max(levels[1], levels[2]);
     if (!(green > 0.0f))
         throw std::runtime_error(msg::kNoGreenSignal);
+    const float red = levels[0] / green;
+    const float blue = levels[3] / green;
     out().precision(6);
-    out() << label << "R/G: " << levels[0] / green << std::endl;
-    out() << label << "B/G: " << levels[3] / green << std::endl;
+    out() << label << "R/G: " << red << std::endl;
+    out() << label << "B/G: " << blue << std::endl;
+    return {red, blue};
+}
+
+// The report's block grid: 16 blocks along the longer side, about square.
+ChannelBlockMeans reportBlockMeans(const BayerImage& image) {
+    const BlockGrid grid = blockGridFor(image.width(), image.height(), 16);
+    return blockMeans(image, grid.columns, grid.rows);
 }
 
 } // namespace
@@ -79,37 +94,88 @@ int Pipeline::run(int argc, const char* const argv[]) {
     // nothing to build them from.
     if (!commandLine_.value("binary").empty() && commandLine_.value("calibrate").empty())
         throw std::runtime_error(msg::kBinaryNeedsCalibrate);
+    reportPath_ = commandLine_.value("report");
+    report_.toolVersion = lscversion::versionText();
+    report_.commandLine = commandLine_.argumentsText();
+    try {
+        runStages();
+    } catch (...) {
+        recordFailure();
+        throw;
+    }
+    report_.finished = true;
+    writeReport();
+    finish();
+    return 0;
+}
+
+void Pipeline::runStages() {
+    beginStage("Reading the configuration");
     readConfiguration();
     openMessages();
+    beginStage("Loading the input image");
     loadInput();
+    beginStage("Checking the input image");
     decideBitDepth();
     checkSettingsAgainstImage();
     if (!settings_.sensorGuid.empty())
         input_.setSensorGuid(settings_.sensorGuid);
     inspectInput();
+    beginStage("Preparing the image");
     prepareImage();
+    beginStage("Checking the prepared image");
     checkPreparedImage();
     writePreparedImage();
     buildSampleSet();
+    beginStage("Obtaining the samples");
     obtainSamples();
+    beginStage("Fitting the lens shading surface");
     fitSurface();
+    beginStage("Writing the calibration register file");
     writeRegisterFile();
-    if (!settings_.binary.empty())
+    if (!settings_.binary.empty()) {
+        beginStage("Binary calibration data");
         writeBinaryData();
+    }
+    beginStage("Correcting the lens shading");
     correct();
+    beginStage("White balance");
     balanceWhite();
+    beginStage("Delta ab");
     measureColourError();
+    beginStage("Writing the flattened images");
     writeFlattenedImages();
-    finish();
-    return 0;
+}
+
+// The report of a failed run shows what failed and everything computed before.
+void Pipeline::recordFailure() {
+    if (reportPath_.empty())
+        return;
+    report_.failedStage = stage_;
+    report_.failureMessage = describeFailure(std::current_exception()).text;
+    try {
+        writeReport();
+    } catch (const std::exception& error) {
+        // The run's own error is what the operator must see first; this one
+        // goes on the line before it.
+        out() << msg::kErrorPrefix << error.what() << std::endl;
+    }
+}
+
+void Pipeline::writeReport() {
+    if (reportPath_.empty())
+        return;
+    out() << "Writing calibration report." << std::endl;
+    writeRunReport(reportPath_, report_);
 }
 
 void Pipeline::readConfiguration() {
     root_ = std::make_shared<config_node_impl>("root");
-    config_ = &root_->child("config");
+    config_ = static_cast<config_node_impl*>(&root_->child("config"));
     set_defaults(*config_);
     read_config_file(commandLine_.value("config"), *config_);
     validate(*config_);
+    report_.changedSettings = changedSettings(*config_);
 
     settings_.debug = config_->find_path("proc.debug").as_bool() || commandLine_.given("debug");
     timer_.enabled = settings_.debug;
@@ -166,6 +232,17 @@ void Pipeline::decideBitDepth() {
               << ") is different than bit depth specified by shared.bit_res (" << settings_.bitRes
               << ")." << std::endl;
     fullScale_ = prep::fullScale(depth_);
+
+    report_.haveInput = true;
+    report_.inputPath = settings_.input;
+    report_.width = input_.width();
+    report_.height = input_.height();
+    report_.bayerOrder = cfaPatternName(input_.cfa());
+    report_.bitDepth = depth_;
+    report_.exposureTime = input_.exposureTime();
+    report_.inspectionInFixedNotation = settings_.debug;
+    for (int channel = 0; channel < kChannels; ++channel)
+        report_.gains[channel] = input_.channelGain(channel);
 }
 
 void Pipeline::checkSettingsAgainstImage() {
@@ -264,6 +341,13 @@ void Pipeline::buildSampleSet() {
     context_.image.copy(prepared_);
     load_fit_settings(*config_, input_, context_);
     context_.quiet = settings_.quiet;
+    if (!reportPath_.empty()) {
+        report_.havePrepared = true;
+        report_.preparedWidth = prepared_.width();
+        report_.preparedHeight = prepared_.height();
+        report_.shadingBefore = reportBlockMeans(prepared_);
+        scaleToPeak(report_.shadingBefore, context_.blackLevel);
+    }
     timerLine(timer_, "Image checking time: ", out());
 }
 
@@ -283,13 +367,33 @@ void Pipeline::obtainSamples() {
 void Pipeline::fitSurface() {
     out() << "Computing lens shading surface." << std::endl;
     fitLensShading(context_, out());
-    printColourRatios("Measured ", context_.targetLevels);
+    const auto ratios = printColourRatios("Measured ", context_.targetLevels);
+    report_.measuredRatios[0] = ratios.first;
+    report_.measuredRatios[1] = ratios.second;
     if (settings_.xtest) {
         out() << "X test mode specified." << std::endl;
         out() << "Forcing lens shading surface to produce an X shaped color distortion."
               << std::endl;
         applyXTestSurface(context_);
     }
+    recordFit();
+}
+
+void Pipeline::recordFit() {
+    report_.haveFit = true;
+    report_.fractions[0] = context_.leftFraction;
+    report_.fractions[1] = context_.centerFraction;
+    report_.fractions[2] = context_.topFraction;
+    report_.fractions[3] = context_.middleFraction;
+    std::copy(&context_.controlGrids[0][0], &context_.controlGrids[0][0] + kChannels * kGridPoints,
+              &report_.controlGrids[0][0]);
+    std::copy(context_.targetLevels, context_.targetLevels + kChannels, report_.targetLevels);
+    report_.samplePoints.clear();
+    for (const shadingSample& sample : context_.samples)
+        report_.samplePoints.emplace_back(sample.x, sample.y);
+    report_.maxRmsBound = context_.maxRmsError;
+    report_.maxErrorBound = context_.maxError;
+    report_.maxGain = context_.maxGain;
 }
 
 void Pipeline::writeRegisterFile() {
@@ -339,6 +443,7 @@ void Pipeline::writeBinaryData() {
     timerLine(timer_, "Binary data parsing time: ", out());
     // From here on the correction uses the control points as stored.
     readConfigParam(*root_, data, context_);
+    recordFit();
     timerLine(timer_, "Binary data transfer time: ", out());
 }
 
@@ -356,7 +461,15 @@ void Pipeline::balanceWhite() {
     prep::whiteBalance(context_);
     float levels[kChannels];
     prep::measureLevels(levels, context_);
-    printColourRatios("Flattened image measured ", levels);
+    const auto ratios = printColourRatios("Flattened image measured ", levels);
+    report_.haveWhiteBalance = true;
+    report_.flattenedRatios[0] = ratios.first;
+    report_.flattenedRatios[1] = ratios.second;
+    if (!reportPath_.empty()) {
+        report_.haveResidual = true;
+        report_.residualAfter = reportBlockMeans(context_.corrected);
+        deviationFromMean(report_.residualAfter);
+    }
     timerLine(timer_, "White balance time: ", out());
 }
 
@@ -367,6 +480,14 @@ void Pipeline::measureColourError() {
     out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x "
           << context_.deltaAbBlocks[1] << std::endl;
     prep::evaluateDeltaAb(context_);
+    report_.haveDelta = true;
+    report_.deltaColumns = context_.deltaAbBlocks[0];
+    report_.deltaRows = context_.deltaAbBlocks[1];
+    report_.delta = context_.deltaImage;
+    report_.threshold = context_.maxDeltaAb;
+    report_.maxDelta = context_.maxDelta;
+    report_.meanChroma = context_.meanChroma;
+    report_.deltaStdDev = context_.deltaStdDev;
     if (!settings_.delta.empty()) {
         out() << "Writing delta ab data." << std::endl;
         prep::writeDeltaFile(settings_.delta, context_);

@@ -5,6 +5,7 @@
 
 #include "config/config_node.h"
 #include "driver/command_line.h"
+#include "driver/run_report.h"
 #include "driver/run_settings.h"
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
@@ -22,6 +23,10 @@ public:
     int run(int argc, const char* const argv[]);
 
 private:
+    void runStages();
+    void beginStage(const char* name) { stage_ = name; }
+    void recordFailure();
+    void writeReport();
     void readConfiguration();
     void openMessages();
     void loadInput();
@@ -34,6 +39,7 @@ private:
     void buildSampleSet();
     void obtainSamples();
     void fitSurface();
+    void recordFit();
     void writeRegisterFile();
     void writeBinaryData();
     void correct();
@@ -47,11 +53,16 @@ private:
     CommandLine commandLine_;
     RunSettings settings_;
     std::shared_ptr<config_node_impl> root_;
-    config_node* config_ = nullptr;
+    config_node_impl* config_ = nullptr;
 
     int depth_ = 0;             // bit depth of the run
     std::uint32_t fullScale_ = 0;  // 2^depth - 1
     BayerImage input_;
     BayerImage prepared_;
     ProcessingContext context_;
+
+    // The calibration report (--report): filled as the stages go.
+    std::string reportPath_;
+    RunReport report_;
+    const char* stage_ = "";
 };
