@@ -1,0 +1,334 @@
+#include "driver/report_sections.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <vector>
+
+#include "driver/report_data.h"
+#include "driver/report_figures.h"
+#include "driver/report_text.h"
+#include "lsc/patch_geometry.h"
+
+namespace {
+
+constexpr int kSurfaceCells = 64; // gain surface cells along the longer side
+constexpr const char* kChannelIds[kChannels] = {"red", "green-red", "green-blue", "blue"};
+
+std::string factRow(const std::string& name, const std::string& id, const std::string& html) {
+    return "<tr><th scope=\"row\">" + name + "</th><td id=\"" + id + "\">" + html + "</td></tr>";
+}
+
+std::string note(const std::string& text) {
+    return "<p class=\"note\">" + text + "</p>";
+}
+
+std::string section(const std::string& id, const std::string& title, const std::string& body) {
+    return "<section id=\"" + id + "\"><h2>" + title + "</h2>" + body + "</section>\n";
+}
+
+std::string span(const std::string& id, const std::string& text) {
+    return "<span id=\"" + id + "\" class=\"num\">" + text + "</span>";
+}
+
+std::string size(std::int64_t width, std::int64_t height) {
+    return std::to_string(width) + " x " + std::to_string(height);
+}
+
+// Values scaled by `factor` (fractions to per cent for the page).
+ChannelBlockMeans scaled(const ChannelBlockMeans& means, float factor) {
+    ChannelBlockMeans out = means;
+    for (std::vector<float>& channel : out.mean)
+        for (float& value : channel)
+            value *= factor;
+    return out;
+}
+
+bool complete(const ChannelBlockMeans& means) {
+    const std::size_t blocks =
+        static_cast<std::size_t>(std::max(means.columns, 0)) * std::max(means.rows, 0);
+    if (blocks == 0)
+        return false;
+    for (const std::vector<float>& channel : means.mean)
+        if (channel.size() != blocks)
+            return false;
+    return true;
+}
+
+double aspectOf(const RunReport& report) {
+    if (report.preparedWidth > 0 && report.preparedHeight > 0)
+        return static_cast<double>(report.preparedWidth) / report.preparedHeight;
+    if (report.width > 0 && report.height > 0)
+        return static_cast<double>(report.width) / report.height;
+    return 4.0 / 3.0;
+}
+
+std::string percent(double value, int decimals) {
+    return formatFixed(value, decimals) + " %";
+}
+
+} // namespace
+
+std::string verdictSection(const RunReport& report) {
+    if (report.finished && report.failureMessage.empty())
+        return "<div id=\"verdict\" class=\"verdict pass\" data-verdict=\"pass\">"
+               "<span class=\"badge\">PASS</span> Calibration completed.</div>\n";
+    if (report.failureMessage.empty())
+        return "<div id=\"verdict\" class=\"verdict fail\" data-verdict=\"incomplete\">"
+               "<span class=\"badge\">INCOMPLETE</span> The run did not finish.</div>\n";
+    const std::string stage =
+        report.failedStage.empty() ? "The run failed." : "Failed at: " + report.failedStage;
+    return "<div id=\"verdict\" class=\"verdict fail\" data-verdict=\"fail\">"
+           "<span class=\"badge\">FAIL</span> <span id=\"failed-stage\">" +
+           htmlEscape(stage) + "</span><pre id=\"failure-message\" class=\"message\">" +
+           htmlEscape(report.failureMessage) + "</pre></div>\n";
+}
+
+std::string runSection(const RunReport& report) {
+    std::string facts = "<table class=\"facts\">";
+    facts += factRow(
+        "Input file", "input-file",
+        report.inputPath.empty() ? "none" : "<code>" + htmlEscape(report.inputPath) + "</code>");
+    if (report.haveInput) {
+        facts += factRow("Image size", "image-size", size(report.width, report.height));
+        facts += factRow("Bayer order", "bayer-order", htmlEscape(report.bayerOrder));
+        facts += factRow("Bit depth", "bit-depth", std::to_string(report.bitDepth));
+        // As the exposure and gain line printed them: three digits.
+        const auto inspection = [&](float value) {
+            return report.inspectionInFixedNotation ? formatFixed(value, 3)
+                                                    : formatGeneral(value, 3);
+        };
+        facts += factRow("Exposure time", "exposure-time", inspection(report.exposureTime));
+        facts +=
+            factRow("Sensor gain", "sensor-gains",
+                    "{ " + inspection(report.gains[0]) + ", " + inspection(report.gains[1]) + ", " +
+                        inspection(report.gains[2]) + ", " + inspection(report.gains[3]) + " }");
+    } else {
+        facts += factRow("Image", "image-size", "not loaded");
+    }
+    if (report.havePrepared)
+        facts += factRow("Prepared image", "prepared-size",
+                         size(report.preparedWidth, report.preparedHeight));
+    facts += factRow("Tool version", "tool-version", htmlEscape(report.toolVersion));
+    facts += factRow("Command line", "command-line",
+                     "<code>" + htmlEscape(report.commandLine) + "</code>");
+    facts += "</table>";
+
+    std::string settings;
+    if (report.changedSettings.empty()) {
+        settings = "<p id=\"changed-settings\" class=\"note\">Every setting is at its default.</p>";
+    } else {
+        settings = "<table id=\"changed-settings\" class=\"settings\"><thead><tr><th>Setting "
+                   "changed from its default</th><th>Value</th></tr></thead><tbody>";
+        for (const auto& [key, value] : report.changedSettings)
+            settings += "<tr><td><code>" + htmlEscape(key) + "</code></td><td><code>" +
+                        htmlEscape(value) + "</code></td></tr>";
+        settings += "</tbody></table>";
+    }
+    return section("run", "Run", "<div class=\"columns\">" + facts + settings + "</div>");
+}
+
+std::string surfacesSection(const RunReport& report) {
+    const char* title = "Gain surfaces";
+    if (!report.haveFit)
+        return section("surfaces", title, note("Not fitted: the run ended before the fit."));
+    const std::uint32_t width = static_cast<std::uint32_t>(std::max(report.preparedWidth, 0));
+    const std::uint32_t height = static_cast<std::uint32_t>(std::max(report.preparedHeight, 0));
+    const PatchBreakpoints breaks =
+        patchBreakpoints(width, height, report.fractions[0], report.fractions[1],
+                         report.fractions[2], report.fractions[3]);
+    if (width < 2 || height < 2 || !patchGeometryUsable(breaks))
+        return section("surfaces", title,
+                       note("The patch geometry leaves a patch without pixels; the surfaces "
+                            "cannot be drawn."));
+
+    const BlockGrid grid = blockGridFor(width, height, kSurfaceCells);
+    GainSurface surfaces[kChannels];
+    for (int k = 0; k < kChannels; ++k)
+        surfaces[k] = sampleGainSurface(report.controlGrids[k], width, height, report.fractions,
+                                        grid.columns, grid.rows);
+    // One scale for the four, so the channels compare by colour.
+    ColourScale scale{ScaleKind::Sequential, surfaces[0].minimum, surfaces[0].maximum};
+    for (const GainSurface& surface : surfaces) {
+        scale.low = std::min<double>(scale.low, surface.minimum);
+        scale.high = std::max<double>(scale.high, surface.maximum);
+    }
+    if (!(scale.high - scale.low > 1e-6)) {
+        scale.low -= 0.05;
+        scale.high += 0.05;
+    }
+    const double middle = (scale.low + scale.high) / 2;
+    const std::vector<ScaleTick> ticks = {{scale.low, formatFixed(scale.low, 3)},
+                                          {middle, formatFixed(middle, 3)},
+                                          {scale.high, formatFixed(scale.high, 3)}};
+
+    const std::string points = samplePointsDefinition(report.samplePoints, width, height);
+    std::string body = points + "<div class=\"figures\">";
+    for (int k = 0; k < kChannels; ++k) {
+        const std::string id = kChannelIds[k];
+        body += "<figure id=\"surface-" + id + "\" class=\"chart\">" +
+                gainSurfaceFigure(surfaces[k], scale, ticks, width, height, breaks, !points.empty(),
+                                  std::string("Gain surface ") + kChannelNames[k]) +
+                "<figcaption><b>" + kChannelNames[k] + "</b>: gain " +
+                span("gain-min-" + id, formatFixed(surfaces[k].minimum, 3)) + " to " +
+                span("gain-max-" + id, formatFixed(surfaces[k].maximum, 3)) +
+                "</figcaption></figure>";
+    }
+    body += "</div>";
+    body += "<p id=\"patch-borders\" class=\"note\">Patch borders (dashed) at x = " +
+            std::to_string(breaks.x[1]) + ", " + std::to_string(breaks.x[2]) +
+            " and y = " + std::to_string(breaks.y[1]) + ", " + std::to_string(breaks.y[2]) +
+            " of the " + size(width, height) + " prepared image; " +
+            std::to_string(report.samplePoints.size()) + " sample points (dots).</p>";
+    return section("surfaces", title, body);
+}
+
+std::string shadingSection(const RunReport& report) {
+    const bool before = report.havePrepared && complete(report.shadingBefore);
+    const bool after = report.haveResidual && complete(report.residualAfter);
+    const char* title = "Shading before and after correction";
+    if (!before && !after)
+        return section("shading", title,
+                       note("Not measured: the run ended before the image was prepared."));
+    const double aspect = aspectOf(report);
+    std::string body;
+    if (before) {
+        const ChannelBlockMeans percentOfPeak = scaled(report.shadingBefore, 100.0f);
+        ColourScale scale{ScaleKind::Sequential, 100.0, 100.0};
+        for (int k = 0; k < kChannels; ++k)
+            scale.low = std::min<double>(scale.low, channelRange(percentOfPeak, k).minimum);
+        // At least a 10 % span, so a well-lit field does not look like strong shading.
+        scale.low = std::min(scale.low, 90.0);
+        const double middle = (scale.low + scale.high) / 2;
+        body += "<figure id=\"shading-before\" class=\"chart wide\">" +
+                channelMapsFigure(percentOfPeak, scale,
+                                  {{scale.low, percent(scale.low, 0)},
+                                   {middle, percent(middle, 0)},
+                                   {scale.high, percent(scale.high, 0)}},
+                                  aspect, "Shading before correction") +
+                "<figcaption><b>Before correction</b>: block means of the prepared image in "
+                "per cent of each channel's brightest block.</figcaption></figure>";
+    }
+    if (after) {
+        const ChannelBlockMeans percentDeviation = scaled(report.residualAfter, 100.0f);
+        double span = 0.0;
+        for (const std::vector<float>& channel : percentDeviation.mean)
+            span = std::max<double>(span, largestAbsolute(channel));
+        // At least +-2 %, so a flat result stays pale instead of showing noise at full colour.
+        span = std::max(span, 2.0);
+        body +=
+            "<figure id=\"residual-after\" class=\"chart wide\">" +
+            channelMapsFigure(percentDeviation, {ScaleKind::Diverging, -span, span},
+                              {{-span, percent(-span, 1)}, {0.0, "0 %"}, {span, percent(span, 1)}},
+                              aspect, "Residual after correction") +
+            "<figcaption><b>After correction</b>: deviation of each block from its "
+            "channel's mean, in per cent.</figcaption></figure>";
+    }
+
+    // Channels across, so the table takes three lines.
+    std::string header = "<tr><th></th>";
+    std::string darkest = "<tr><th scope=\"row\">Darkest block before</th>";
+    std::string residual = "<tr><th scope=\"row\">Largest residual after</th>";
+    for (int k = 0; k < kChannels; ++k) {
+        const std::string id = kChannelIds[k];
+        header += std::string("<th>") + kChannelNames[k] + "</th>";
+        darkest +=
+            "<td id=\"shading-min-" + id + "\">" +
+            (before ? percent(100.0 * channelRange(report.shadingBefore, k).minimum, 1) : "-") +
+            "</td>";
+        residual +=
+            "<td id=\"residual-max-" + id + "\">" +
+            (after ? "&#177;" + percent(100.0 * largestAbsolute(report.residualAfter.mean[k]), 2)
+                   : "-") +
+            "</td>";
+    }
+    body += "<table id=\"shading-figures\" class=\"numbers\"><thead>" + header +
+            "</tr></thead><tbody>" + darkest + "</tr>" + residual + "</tr>";
+    body += "</tbody></table>";
+    return section("shading", title, body);
+}
+
+std::string colourSection(const RunReport& report) {
+    const char* title = "Colour balance";
+    if (!report.haveFit && !report.haveWhiteBalance)
+        return section("colour", title, note("Not measured: the run ended before the fit."));
+    // Both ratio lines are printed in fixed notation with six decimals.
+    const auto ratio = [](bool have, float value) { return have ? formatFixed(value, 6) : "-"; };
+    const bool measured = report.haveFit || report.haveWhiteBalance;
+    const bool flattened = report.haveWhiteBalance;
+    std::string body = "<table id=\"colour-ratios\" class=\"numbers\"><thead><tr><th></th>"
+                       "<th>Measured (flat field)</th><th>After correction and white "
+                       "balance</th></tr></thead><tbody>";
+    body += "<tr><th scope=\"row\">R/G</th><td id=\"measured-rg\">" +
+            ratio(measured, report.measuredRatios[0]) + "</td><td id=\"flattened-rg\">" +
+            ratio(flattened, report.flattenedRatios[0]) + "</td></tr>";
+    body += "<tr><th scope=\"row\">B/G</th><td id=\"measured-bg\">" +
+            ratio(measured, report.measuredRatios[1]) + "</td><td id=\"flattened-bg\">" +
+            ratio(flattened, report.flattenedRatios[1]) + "</td></tr>";
+    body += "</tbody></table>";
+    return section("colour", title, body);
+}
+
+std::string deltaSection(const RunReport& report) {
+    const char* title = "Colour error (delta ab)";
+    if (!report.haveDelta)
+        return section("delta-ab", title, note("Not measured in this run."));
+    const std::string thresholdText = formatGeneral(report.threshold, 6);
+    std::size_t above = 0;
+    for (float value : report.delta)
+        above += value > report.threshold ? 1 : 0;
+    const bool within = report.maxDelta <= report.threshold;
+
+    std::string body =
+        "<div class=\"figures\"><figure id=\"delta-map\" class=\"chart\">" +
+        deltaFigure(report.deltaColumns, report.deltaRows, report.delta, report.threshold,
+                    thresholdText, aspectOf(report), "Delta ab per block") +
+        "<figcaption><b>Delta ab per block</b>: distance of each block's colour "
+        "from the mean colour; blocks above the threshold are outlined."
+        "</figcaption></figure>";
+    body += "<table id=\"delta-stats\" class=\"facts\">";
+    body += factRow("Maximum delta ab", "max-delta", formatFixed(report.maxDelta, 6));
+    body += factRow("Threshold", "delta-threshold", thresholdText);
+    body += factRow("Result", "delta-result",
+                    within ? "<span class=\"ok\">within the threshold</span>"
+                           : "<span class=\"bad\">above the threshold</span>");
+    body += factRow("Mean chroma", "mean-chroma", formatGeneral(report.meanChroma, 6));
+    body += factRow("Standard deviation", "delta-std-dev", formatGeneral(report.deltaStdDev, 6));
+    body += factRow("Blocks", "delta-blocks", size(report.deltaColumns, report.deltaRows));
+    body += factRow("Blocks above the threshold", "delta-above", std::to_string(above));
+    body += "</table></div>";
+    return section("delta-ab", title, body);
+}
+
+std::string fitErrorSection(const RunReport& report) {
+    if (!report.haveFitError)
+        return "";
+    const auto number = [](float value) { return formatGeneral(value, 6); };
+    std::string body = "<table id=\"deviations\" class=\"numbers\"><thead><tr><th>Channel</th>"
+                       "<th>Deviation max<br>(bound <span id=\"max-error-bound\">" +
+                       number(report.maxErrorBound) +
+                       "</span>)</th><th>RMS<br>(bound <span id=\"max-rms-bound\">" +
+                       number(report.maxRmsBound) +
+                       "</span>)</th><th>Result</th></tr></thead><tbody>";
+    for (int k = 0; k < kChannels; ++k) {
+        const std::string id = kChannelIds[k];
+        const bool maxOver = report.deviationMax[k] > report.maxErrorBound;
+        const bool rmsOver = report.deviationRms[k] > report.maxRmsBound;
+        std::string result = "<span class=\"ok\">within</span>";
+        if (maxOver || rmsOver) {
+            result = "<span class=\"bad\">";
+            if (rmsOver)
+                result += "RMS error bound exceeded.";
+            if (maxOver)
+                result += std::string(rmsOver ? "<br>" : "") + "MAX error bound exceeded.";
+            result += "</span>";
+        }
+        body += std::string("<tr><th scope=\"row\">") + kChannelNames[k] +
+                "</th><td id=\"deviation-max-" + id + "\">" + number(report.deviationMax[k]) +
+                "</td><td id=\"deviation-rms-" + id + "\">" + number(report.deviationRms[k]) +
+                "</td><td>" + result + "</td></tr>";
+    }
+    body += "</tbody></table>";
+    body += "<p class=\"note\">Largest gain allowed: <span id=\"max-gain-bound\">" +
+            number(report.maxGain) + "</span>.</p>";
+    return section("fit-error", "Fit error", body);
+}

@@ -1,0 +1,17 @@
+#pragma once
+// The sections of the calibration report page, each a complete HTML
+// fragment. A section whose stage was not reached says so instead of
+// leaving a gap, so a failed run's page still reads as a whole.
+
+#include <string>
+
+#include "driver/run_report.h"
+
+std::string verdictSection(const RunReport& report);
+std::string runSection(const RunReport& report);
+std::string surfacesSection(const RunReport& report);
+std::string shadingSection(const RunReport& report);
+std::string colourSection(const RunReport& report);
+std::string deltaSection(const RunReport& report);
+// Empty when the fit-error check did not run.
+std::string fitErrorSection(const RunReport& report);
