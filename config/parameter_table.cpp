@@ -9,7 +9,7 @@
 
 namespace {
 
-enum class Check { None, Int, Float };
+enum class Check { None, Int, OddInt, Float };
 
 struct Parameter {
     const char* section;
@@ -71,6 +71,7 @@ constexpr Parameter kTable[] = {
     {"lsc", "max_err", "0.2", Check::Float, 0, 1.0},
     {"lsc", "avg_luma", "0", Check::Int, 0, 1},
     {"lsc", "awb_avg_filter_size", "100", Check::None, 0, 0},
+    {"lsc", "sample_window", "1", Check::OddInt, 1, 15},
     {"apply_lsc", "max_delta_ab", "10.0", Check::Float, 0, 10},
     {"apply_lsc", "test_max_delta_ab", "0.0", Check::Float, 0, 10},
     {"apply_lsc", "sampling_factor", "4", Check::Int, 1, 100},
@@ -91,12 +92,19 @@ const Parameter& entry(const char* section, const char* key) {
 
 void checkEntry(const config_node& config, const Parameter& parameter) {
     const config_node& node = settingOf(config, parameter);
-    if (parameter.check == Check::Int)
-        check_int_range(config, node, static_cast<int>(parameter.low),
-                        static_cast<int>(parameter.high));
-    else if (parameter.check == Check::Float)
+    if (parameter.check == Check::Float) {
         check_float_range(config, node, static_cast<float>(parameter.low),
                           static_cast<float>(parameter.high));
+        return;
+    }
+    if (parameter.check == Check::None)
+        return;
+    check_int_range(config, node, static_cast<int>(parameter.low),
+                    static_cast<int>(parameter.high));
+    // A window centred on a sample needs an odd size.
+    if (parameter.check == Check::OddInt && node.as_int() % 2 == 0)
+        throw std::range_error(config::msg::kValueSpecifiedFor +
+                               config_relative_path(config, node) + config::msg::kMustBeOdd);
 }
 
 void checkBlockName(const std::string& name) {

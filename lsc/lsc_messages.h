@@ -55,6 +55,7 @@ inline constexpr char kBadPatchGeometry[] =
 inline constexpr char kBadAngleStep[] = "lsc.sampling_factor must be at least 1.";
 inline constexpr char kBadSampleMargin[] = "lsc.sampling_margin must not be negative.";
 inline constexpr char kBadProcSamplingFactor[] = "shared.proc_sampling_factor must be at least 1.";
+inline constexpr char kBadSampleWindow[] = "lsc.sample_window must be an odd number from 1 to 15.";
 inline constexpr char kBadApplyStep[] = "apply_lsc.sampling_factor must be at least 1.";
 inline constexpr char kNoWorkingImage[] = "No image to process for lens shading.";
 inline constexpr char kNotBayerFloatImage[] =

@@ -38,6 +38,7 @@ struct ProcessingContext {
     bool averageChannels = false;  // lsc.avg_luma
     bool quiet = false;
     int awbFilterSize = 100;       // lsc.awb_avg_filter_size
+    int sampleWindow = 1;          // lsc.sample_window: Bayer blocks per side of a sample's median
     float maxGain = 6.0f;
     float maxRmsError = 0.2f;
     float maxError = 0.2f;

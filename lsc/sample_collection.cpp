@@ -10,6 +10,7 @@
 #include "lsc/bayer_phase.h"
 #include "lsc/lsc_messages.h"
 #include "lsc/patch_geometry.h"
+#include "lsc/sample_window.h"
 #include "lsc/target_levels.h"
 #include "lsc/working_image.h"
 
@@ -21,8 +22,10 @@ constexpr float kDegreesToRadians = 0.017453292f;
 // lines computed left of the margin or the image never wrap around.
 class SampleTaker {
 public:
-    SampleTaker(const WorkingImage& image, std::int64_t margin, std::vector<shadingSample>& out)
-        : image_(image), margin_(margin), phase_(bayerPhase(image.cfa)), out_(out) {}
+    SampleTaker(const WorkingImage& image, std::int64_t margin, int window,
+                std::vector<shadingSample>& out)
+        : image_(image), margin_(margin), window_(window), phase_(bayerPhase(image.cfa)),
+          out_(out) {}
 
     std::int64_t margin() const { return margin_; }
     bool insideX(std::int64_t x) const { return margin_ <= x && x < image_.width - margin_; }
@@ -38,16 +41,20 @@ public:
         if (bx + 1 >= image_.width || by + 1 >= image_.height)
             return;
         shadingSample sample{bx, by, {0, 0, 0, 0}};
-        for (std::uint32_t dy = 0; dy < 2; ++dy)
-            for (std::uint32_t dx = 0; dx < 2; ++dx)
-                sample.value[bayerChannel(dx, dy, phase_)] =
-                    image_.pixels[static_cast<std::size_t>(by + dy) * image_.width + bx + dx];
+        if (window_ > 1)
+            windowMedians(image_, phase_, bx, by, window_, sample.value);
+        else
+            for (std::uint32_t dy = 0; dy < 2; ++dy)
+                for (std::uint32_t dx = 0; dx < 2; ++dx)
+                    sample.value[bayerChannel(dx, dy, phase_)] =
+                        image_.pixels[static_cast<std::size_t>(by + dy) * image_.width + bx + dx];
         out_.push_back(sample);
     }
 
 private:
     const WorkingImage& image_;
     std::int64_t margin_;
+    int window_;
     int phase_;
     std::vector<shadingSample>& out_;
 };
@@ -120,6 +127,8 @@ void collectSamples(ProcessingContext& context, std::ostream& messages) {
         throw std::runtime_error(lsc::msg::kBadSampleMargin);
     if (context.procSamplingFactor < 1)
         throw std::runtime_error(lsc::msg::kBadProcSamplingFactor);
+    if (!sampleWindowUsable(context.sampleWindow))
+        throw std::runtime_error(lsc::msg::kBadSampleWindow);
 
     removeBlackLevel(image, context.blackLevel);
 
@@ -132,7 +141,7 @@ void collectSamples(ProcessingContext& context, std::ostream& messages) {
                          context.topFraction, context.middleFraction);
 
     std::vector<shadingSample> samples;
-    SampleTaker taker(image, margin, samples);
+    SampleTaker taker(image, margin, context.sampleWindow, samples);
     takeSineGrid(taker, image, context.sampleAngleStep);
     takeBorderLines(taker, image, breaks);
     context.samples = std::move(samples);

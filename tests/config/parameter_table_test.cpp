@@ -133,6 +133,28 @@ TEST_F(ParameterTableTest, SectionsAreCheckedInTableOrder) {
               "and 100.");
 }
 
+TEST_F(ParameterTableTest, SampleWindowMustBeOddFromOneToFifteen) {
+    EXPECT_EQ(config.find_path("lsc.sample_window").as_string(), "1");
+    EXPECT_TRUE(config.find_path("lsc.sample_window").is_default());
+    EXPECT_EQ(validationError("lsc.sample_window = 15;"), "(valid)");
+    EXPECT_EQ(validationError("lsc.sample_window = 4;"),
+              "Value specified for lsc.sample_window must be odd.");
+    EXPECT_EQ(validationError("lsc.sample_window = 0;"),
+              "Value specified for lsc.sample_window is too low, value must be between 1 and 15.");
+    EXPECT_EQ(validationError("lsc.sample_window = 17;"),
+              "Value specified for lsc.sample_window is too high, value must be between 1 and "
+              "15.");
+    EXPECT_EQ(validationError("lsc.sample_window = -2;"),
+              "Value specified for lsc.sample_window is too low, value must be between 1 and 15.");
+}
+
+TEST_F(ParameterTableTest, SampleWindowIsCheckedAfterTheOtherFitSettings) {
+    EXPECT_EQ(validationError("lsc.sample_window = 2; lsc.avg_luma = 2;"),
+              "Value specified for lsc.avg_luma is too high, value must be between 0 and 1.");
+    EXPECT_EQ(validationError("lsc.avg_luma = 0; apply_lsc.max_delta_ab = 11;"),
+              "Value specified for lsc.sample_window must be odd.");
+}
+
 TEST_F(ParameterTableTest, UncheckedAndUnknownSettingsPass) {
     EXPECT_EQ(validationError("lsc.left_patch_width = -7; proc.black_level = x; other.key = 1;"),
               "(valid)");

@@ -133,6 +133,35 @@ TEST_F(SampleCollection, RefusesAnAngleStepBelowOne) {
     }
 }
 
+TEST_F(SampleCollection, SampleWindowKeepsABrightPixelOutOfItsSample) {
+    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    context.sampleAngleStep = 90;                // the sine grid holds the block at (32, 24)
+    context.image.pixels()[24 * 64 + 32] = 1.0f; // its red pixel
+    auto redAtCentre = [&] {
+        collectSamples(context, messages);
+        for (const shadingSample& s : context.samples)
+            if (s.x == 32 && s.y == 24)
+                return s.value[0];
+        return -1.0f;
+    };
+    EXPECT_EQ(redAtCentre(), 1.0f);
+    context.sampleWindow = 3;
+    EXPECT_EQ(redAtCentre(), kLevels[0]);
+}
+
+TEST_F(SampleCollection, RefusesASampleWindowItCannotUse) {
+    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    for (int window : {0, 4, 17}) {
+        context.sampleWindow = window;
+        try {
+            collectSamples(context, messages);
+            ADD_FAILURE() << "no exception for " << window;
+        } catch (const std::runtime_error& e) {
+            EXPECT_STREQ(e.what(), "lsc.sample_window must be an odd number from 1 to 15.");
+        }
+    }
+}
+
 TEST_F(SampleCollection, RefusesAMissingImage) {
     EXPECT_THROW(collectSamples(context, messages), std::runtime_error);
 }
