@@ -80,6 +80,7 @@ void load_fit_settings(const config_node& config, const BayerImage& image,
     context.maxGain = setting(config, "lsc", "max_gain").as_float();
     context.maxRmsError = setting(config, "lsc", "max_rms_err").as_float();
     context.maxError = setting(config, "lsc", "max_err").as_float();
+    context.logFitError = setting(config, "lsc", "log_err_flag").as_int() != 0;
     context.sampleWindow = setting(config, "lsc", "sample_window").as_int();
     context.maxDeltaAb = setting(config, "apply_lsc", "max_delta_ab").as_float();
     context.awbFilterSize = setting(config, "lsc", "awb_avg_filter_size").as_int();

@@ -64,7 +64,7 @@ std::string gainSurfaceFigure(const GainSurface& surface, const ColourScale& sca
                               std::uint32_t height, const PatchBreakpoints& breaks,
                               bool withSamples, const std::string& label) {
     const auto [mapWidth, mapHeight] =
-        fitMap(height > 0 ? static_cast<double>(width) / height : 0.0, kFigureWidth, 300.0);
+        fitMap(height > 0 ? static_cast<double>(width) / height : 0.0, kFigureWidth, 270.0);
     const double figureWidth = std::max(mapWidth, kMinimumWidth);
     const double barTop = mapHeight + 6.0;
     const double total = barTop + colourBarExtent(kBarHeight, false);
@@ -123,7 +123,7 @@ std::string channelMapsFigure(const ChannelBlockMeans& means, const ColourScale&
 
 std::string deltaFigure(int columns, int rows, const std::vector<float>& delta, float threshold,
                         const std::string& thresholdText, double aspect, const std::string& label) {
-    const auto [mapWidth, mapHeight] = fitMap(aspect, kFigureWidth, 240.0);
+    const auto [mapWidth, mapHeight] = fitMap(aspect, kFigureWidth, 210.0);
     const double figureWidth = std::max(mapWidth, kMinimumWidth);
     const double barTop = mapHeight + 6.0;
     const double total = barTop + colourBarExtent(kBarHeight, true);

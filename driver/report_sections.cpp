@@ -84,47 +84,52 @@ std::string verdictSection(const RunReport& report) {
 }
 
 std::string runSection(const RunReport& report) {
-    std::string facts = "<table class=\"facts\">";
-    facts += factRow(
+    std::string capture = "<table class=\"facts\">";
+    capture += factRow(
         "Input file", "input-file",
         report.inputPath.empty() ? "none" : "<code>" + htmlEscape(report.inputPath) + "</code>");
     if (report.haveInput) {
-        facts += factRow("Image size", "image-size", size(report.width, report.height));
-        facts += factRow("Bayer order", "bayer-order", htmlEscape(report.bayerOrder));
-        facts += factRow("Bit depth", "bit-depth", std::to_string(report.bitDepth));
+        capture += factRow("Image size", "image-size", size(report.width, report.height));
+        capture += factRow("Bayer order", "bayer-order", htmlEscape(report.bayerOrder));
+        capture += factRow("Bit depth", "bit-depth", std::to_string(report.bitDepth));
         // As the exposure and gain line printed them: three digits.
         const auto inspection = [&](float value) {
             return report.inspectionInFixedNotation ? formatFixed(value, 3)
                                                     : formatGeneral(value, 3);
         };
-        facts += factRow("Exposure time", "exposure-time", inspection(report.exposureTime));
-        facts +=
+        capture += factRow("Exposure time", "exposure-time", inspection(report.exposureTime));
+        capture +=
             factRow("Sensor gain", "sensor-gains",
                     "{ " + inspection(report.gains[0]) + ", " + inspection(report.gains[1]) + ", " +
                         inspection(report.gains[2]) + ", " + inspection(report.gains[3]) + " }");
     } else {
-        facts += factRow("Image", "image-size", "not loaded");
+        capture += factRow("Image", "image-size", "not loaded");
     }
-    if (report.havePrepared)
-        facts += factRow("Prepared image", "prepared-size",
-                         size(report.preparedWidth, report.preparedHeight));
-    facts += factRow("Tool version", "tool-version", htmlEscape(report.toolVersion));
-    facts += factRow("Command line", "command-line",
-                     "<code>" + htmlEscape(report.commandLine) + "</code>");
-    facts += "</table>";
+    capture += "</table>";
 
+    std::string run = "<table class=\"facts\">";
+    if (report.havePrepared)
+        run += factRow("Prepared image", "prepared-size",
+                       size(report.preparedWidth, report.preparedHeight));
+    run += factRow("Tool version", "tool-version", htmlEscape(report.toolVersion));
+    run += factRow("Command line", "command-line",
+                   "<code>" + htmlEscape(report.commandLine) + "</code>");
+    run += "</table>";
+
+    // Three columns of "key = value": a configuration that sets many keys
+    // still leaves room for the surfaces on the first page.
     std::string settings;
     if (report.changedSettings.empty()) {
         settings = "<p id=\"changed-settings\" class=\"note\">Every setting is at its default.</p>";
     } else {
-        settings = "<table id=\"changed-settings\" class=\"settings\"><thead><tr><th>Setting "
-                   "changed from its default</th><th>Value</th></tr></thead><tbody>";
+        settings = "<div id=\"changed-settings\" class=\"settings\"><h3>Settings changed from "
+                   "their defaults</h3><ul>";
         for (const auto& [key, value] : report.changedSettings)
-            settings += "<tr><td><code>" + htmlEscape(key) + "</code></td><td><code>" +
-                        htmlEscape(value) + "</code></td></tr>";
-        settings += "</tbody></table>";
+            settings += "<li><code>" + htmlEscape(key) + "</code> = <code>" + htmlEscape(value) +
+                        "</code></li>";
+        settings += "</ul></div>";
     }
-    return section("run", "Run", "<div class=\"columns\">" + facts + settings + "</div>");
+    return section("run", "Run", "<div class=\"columns\">" + capture + run + "</div>" + settings);
 }
 
 std::string surfacesSection(const RunReport& report) {
@@ -247,56 +252,65 @@ std::string shadingSection(const RunReport& report) {
     return section("shading", title, body);
 }
 
-std::string colourSection(const RunReport& report) {
-    const char* title = "Colour balance";
-    if (!report.haveFit && !report.haveWhiteBalance)
-        return section("colour", title, note("Not measured: the run ended before the fit."));
+namespace {
+
+std::string colourRatios(const RunReport& report) {
     // Both ratio lines are printed in fixed notation with six decimals.
     const auto ratio = [](bool have, float value) { return have ? formatFixed(value, 6) : "-"; };
     const bool measured = report.haveFit || report.haveWhiteBalance;
     const bool flattened = report.haveWhiteBalance;
-    std::string body = "<table id=\"colour-ratios\" class=\"numbers\"><thead><tr><th></th>"
-                       "<th>Measured (flat field)</th><th>After correction and white "
-                       "balance</th></tr></thead><tbody>";
-    body += "<tr><th scope=\"row\">R/G</th><td id=\"measured-rg\">" +
-            ratio(measured, report.measuredRatios[0]) + "</td><td id=\"flattened-rg\">" +
-            ratio(flattened, report.flattenedRatios[0]) + "</td></tr>";
-    body += "<tr><th scope=\"row\">B/G</th><td id=\"measured-bg\">" +
-            ratio(measured, report.measuredRatios[1]) + "</td><td id=\"flattened-bg\">" +
-            ratio(flattened, report.flattenedRatios[1]) + "</td></tr>";
-    body += "</tbody></table>";
-    return section("colour", title, body);
+    std::string table = "<table id=\"colour-ratios\" class=\"numbers\"><thead><tr><th></th>"
+                        "<th>Flat field</th><th>Corrected and white-balanced</th></tr></thead>"
+                        "<tbody>";
+    table += "<tr><th scope=\"row\">R/G</th><td id=\"measured-rg\">" +
+             ratio(measured, report.measuredRatios[0]) + "</td><td id=\"flattened-rg\">" +
+             ratio(flattened, report.flattenedRatios[0]) + "</td></tr>";
+    table += "<tr><th scope=\"row\">B/G</th><td id=\"measured-bg\">" +
+             ratio(measured, report.measuredRatios[1]) + "</td><td id=\"flattened-bg\">" +
+             ratio(flattened, report.flattenedRatios[1]) + "</td></tr>";
+    return table + "</tbody></table>";
 }
 
-std::string deltaSection(const RunReport& report) {
-    const char* title = "Colour error (delta ab)";
-    if (!report.haveDelta)
-        return section("delta-ab", title, note("Not measured in this run."));
-    const std::string thresholdText = formatGeneral(report.threshold, 6);
+std::string deltaStatistics(const RunReport& report, const std::string& thresholdText) {
     std::size_t above = 0;
     for (float value : report.delta)
         above += value > report.threshold ? 1 : 0;
     const bool within = report.maxDelta <= report.threshold;
+    std::string table = "<table id=\"delta-ab\" class=\"facts\">";
+    table += factRow("Maximum delta ab", "max-delta", formatFixed(report.maxDelta, 6));
+    table += factRow("Threshold", "delta-threshold", thresholdText);
+    table += factRow("Result", "delta-result",
+                     within ? "<span class=\"ok\">within the threshold</span>"
+                            : "<span class=\"bad\">above the threshold</span>");
+    table += factRow("Mean chroma", "mean-chroma", formatGeneral(report.meanChroma, 6));
+    table += factRow("Standard deviation", "delta-std-dev", formatGeneral(report.deltaStdDev, 6));
+    table += factRow("Blocks", "delta-blocks", size(report.deltaColumns, report.deltaRows));
+    table += factRow("Blocks above the threshold", "delta-above", std::to_string(above));
+    return table + "</table>";
+}
 
-    std::string body =
-        "<div class=\"figures\"><figure id=\"delta-map\" class=\"chart\">" +
+} // namespace
+
+std::string colourSection(const RunReport& report) {
+    const char* title = "Colour balance and colour error";
+    if (!report.haveFit && !report.haveWhiteBalance)
+        return section("colour", title, note("Not measured: the run ended before the fit."));
+    if (!report.haveDelta)
+        return section("colour", title,
+                       colourRatios(report) +
+                           "<p id=\"delta-ab\" class=\"note\">Delta ab: not measured in this "
+                           "run.</p>");
+    // The delta ab map on the left; the ratios and the statistics beside it.
+    const std::string thresholdText = formatGeneral(report.threshold, 6);
+    const std::string map =
+        "<figure id=\"delta-map\" class=\"chart\">" +
         deltaFigure(report.deltaColumns, report.deltaRows, report.delta, report.threshold,
                     thresholdText, aspectOf(report), "Delta ab per block") +
-        "<figcaption><b>Delta ab per block</b>: distance of each block's colour "
-        "from the mean colour; blocks above the threshold are outlined."
-        "</figcaption></figure>";
-    body += "<table id=\"delta-stats\" class=\"facts\">";
-    body += factRow("Maximum delta ab", "max-delta", formatFixed(report.maxDelta, 6));
-    body += factRow("Threshold", "delta-threshold", thresholdText);
-    body += factRow("Result", "delta-result",
-                    within ? "<span class=\"ok\">within the threshold</span>"
-                           : "<span class=\"bad\">above the threshold</span>");
-    body += factRow("Mean chroma", "mean-chroma", formatGeneral(report.meanChroma, 6));
-    body += factRow("Standard deviation", "delta-std-dev", formatGeneral(report.deltaStdDev, 6));
-    body += factRow("Blocks", "delta-blocks", size(report.deltaColumns, report.deltaRows));
-    body += factRow("Blocks above the threshold", "delta-above", std::to_string(above));
-    body += "</table></div>";
-    return section("delta-ab", title, body);
+        "<figcaption><b>Delta ab per block</b>: distance from the mean colour; "
+        "outlined above the threshold.</figcaption></figure>";
+    return section("colour", title,
+                   "<div class=\"figures\">" + map + "<div>" + colourRatios(report) +
+                       deltaStatistics(report, thresholdText) + "</div></div>");
 }
 
 std::string fitErrorSection(const RunReport& report) {

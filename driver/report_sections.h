@@ -11,7 +11,8 @@ std::string verdictSection(const RunReport& report);
 std::string runSection(const RunReport& report);
 std::string surfacesSection(const RunReport& report);
 std::string shadingSection(const RunReport& report);
+// The colour ratios before and after, with the delta ab map and statistics
+// when that stage ran.
 std::string colourSection(const RunReport& report);
-std::string deltaSection(const RunReport& report);
 // Empty when the fit-error check did not run.
 std::string fitErrorSection(const RunReport& report);

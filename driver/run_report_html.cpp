@@ -15,7 +15,7 @@ namespace {
 constexpr char kStyle[] = R"css(
 @page { size: A4; margin: 11mm 12mm 12mm; }
 html { -webkit-print-color-adjust: exact; print-color-adjust: exact; }
-body { font: 9pt/1.35 "DejaVu Sans", "Liberation Sans", Arial, Helvetica, sans-serif;
+body { font: 9pt/1.3 "DejaVu Sans", "Liberation Sans", Arial, Helvetica, sans-serif;
        color: #111; background: #fff; max-width: 186mm; margin: 6mm auto; }
 h1 { font-size: 15pt; margin: 0 0 1mm; }
 h2 { font-size: 11pt; margin: 4mm 0 1.5mm; padding-bottom: 0.5mm; border-bottom: 0.6pt solid #777; }
@@ -27,14 +27,19 @@ h2 { font-size: 11pt; margin: 4mm 0 1.5mm; padding-bottom: 0.5mm; border-bottom:
 .message { white-space: pre-wrap; word-break: break-word; font: 9pt/1.3 "DejaVu Sans Mono", monospace;
            margin: 1.5mm 0 0; color: #111; }
 table { border-collapse: collapse; margin: 1mm 0; }
-th, td { text-align: left; vertical-align: top; padding: 0.5mm 2.5mm 0.5mm 0; border-bottom: 0.4pt solid #ccc; }
+th, td { text-align: left; vertical-align: top; padding: 0.3mm 2.5mm 0.3mm 0; border-bottom: 0.4pt solid #ccc; }
 thead th { border-bottom: 0.8pt solid #777; font-weight: bold; }
 th[scope=row] { font-weight: normal; color: #444; white-space: nowrap; }
 table.numbers td { text-align: right; font-variant-numeric: tabular-nums; padding-left: 4mm; }
 code { font: 8pt "DejaVu Sans Mono", monospace; word-break: break-all; }
+h3 { font-size: 9pt; margin: 2mm 0 1mm; }
+.settings ul { columns: 3; column-gap: 5mm; list-style: none; margin: 0; padding: 0; }
+.settings li { break-inside: avoid; font-size: 7pt; line-height: 1.3; }
+.settings code { font-size: 7pt; }
 .columns { display: grid; grid-template-columns: 1fr 1fr; gap: 6mm; align-items: start; }
-.figures { display: grid; grid-template-columns: repeat(2, 76mm); justify-content: space-around;
+.figures { display: grid; grid-template-columns: repeat(2, 78mm); justify-content: space-around;
            gap: 2mm 6mm; align-items: start; }
+.figures table { width: 100%; }
 figure { margin: 0 0 2mm; break-inside: avoid; page-break-inside: avoid; }
 figure svg { display: block; max-width: 100%; height: auto; }
 figcaption { margin-top: 0.8mm; }
@@ -44,8 +49,8 @@ svg.definitions { position: absolute; width: 0; height: 0; overflow: hidden; }
 .note { color: #444; margin: 1mm 0; }
 .ok { color: #0b4d1e; }
 .bad { color: #a1150f; font-weight: bold; }
-section { break-inside: avoid-page; }
-#shading { break-before: page; page-break-before: always; }
+h2, h3 { break-after: avoid; page-break-after: avoid; }
+.verdict, table.numbers, table.facts { break-inside: avoid; page-break-inside: avoid; }
 @media print { body { margin: 0; max-width: none; } }
 )css";
 
@@ -67,13 +72,8 @@ std::string runReportHtml(const RunReport& report) {
     page += runSection(report);
     page += surfacesSection(report);
     page += shadingSection(report);
-    // The two small tables share a row, which keeps the measurements on one page.
-    const std::string fitError = fitErrorSection(report);
-    if (fitError.empty())
-        page += colourSection(report);
-    else
-        page += "<div class=\"columns\">" + colourSection(report) + fitError + "</div>\n";
-    page += deltaSection(report);
+    page += colourSection(report);
+    page += fitErrorSection(report);
     page += "</main>\n</body>\n</html>\n";
     return page;
 }

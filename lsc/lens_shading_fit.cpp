@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "lsc/bernstein_surface.h"
+#include "lsc/fit_checks.h"
 #include "lsc/lsc_messages.h"
 #include "lsc/patch_geometry.h"
 #include "lsc/patch_surface.h"
@@ -94,6 +95,7 @@ void turnSamplesIntoGains(std::vector<shadingSample>& samples,
 } // namespace
 
 void fitLensShading(ProcessingContext& context, std::ostream& messages) {
+    context.fitDeviationMeasured = false;
     const WorkingImage image = workingImage(context.image);
     const std::uint32_t w = image.width, h = image.height;
     // A patch without pixels would make the local coordinates infinite.
@@ -122,6 +124,7 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
             targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], context.quiet, messages));
 
     turnSamplesIntoGains(context.samples, targets, context.greenBalance);
+    checkGainSamples(context.samples, w, h, context.maxGain);
 
     const std::vector<double> xBreaks(breaks.x, breaks.x + 4);
     const std::vector<double> yBreaks(breaks.y, breaks.y + 4);
@@ -135,7 +138,17 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
                 surface.addValueConstraint(s.x, s.y, s.value[k]);
         surface.fit(kPatchTolerance, messages);
         surface.copyToGrid(grids[k]);
+        const FitDeviation deviation = fitDeviation(surface, context.samples, k, w, h, messages);
+        context.fitDeviationMax[k] = static_cast<float>(deviation.max);
+        context.fitDeviationRms[k] = static_cast<float>(deviation.rms);
+        if (context.logFitError && !context.quiet)
+            messages << deviationLine(k, context.fitDeviationMax[k], context.fitDeviationRms[k])
+                     << std::endl;
     }
+    context.fitDeviationMeasured = true;
+    checkDeviationBounds(context.fitDeviationRms, context.fitDeviationMax, context.maxRmsError,
+                         context.maxError);
+    checkControlPoints(grids, context.maxGain);
 
     for (int k = 0; k < kChannels; ++k)
         for (int i = 0; i < kGridPoints; ++i)

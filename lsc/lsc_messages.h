@@ -39,6 +39,18 @@ inline constexpr char kSolverShapeMismatch[] =
 inline constexpr char kZeroValue[] =
     "A value of zero in the input cannot be corrected (i.e. gained up to unity).";
 
+// Fit checks. The deviation line reads "<channel> deviation max, rms: <max> <rms>".
+inline constexpr char kDeviationLine[] = " deviation max, rms:";
+inline constexpr char kRmsBoundExceeded[] = "RMS error bound exceeded.";
+inline constexpr char kMaxBoundExceeded[] = "MAX error bound exceeded.";
+// "Gain <value> of the <channel> channel is above lsc.max_gain (<limit>). Likely ..."
+inline constexpr char kGainAbovePrefix[] = "Gain ";
+inline constexpr char kGainAboveChannel[] = " of the ";
+inline constexpr char kGainAboveLimit[] = " channel is above lsc.max_gain (";
+inline constexpr char kGainAboveSuffix[] =
+    "). Likely a dark corner, a missing diffuser or a configuration that does not match the "
+    "sensor.";
+
 // Patch lookup, written as "patch containing " x "," y " not found.".
 inline constexpr char kPatchNotFoundPrefix[] = "patch containing ";
 inline constexpr char kPatchNotFoundSuffix[] = " not found.";

@@ -154,6 +154,21 @@ double patchSurface::global(std::uint32_t row, std::uint32_t column) const {
     return patch(i, j).controlPoints(r, c);
 }
 
+double patchSurface::value(double x, double y, std::ostream& messages) const {
+    const PatchIndex where = findPatch(*this, x, y, messages);
+    const surfacePatch& p = patch(where.row, where.column);
+    const double u = p.localU(x);
+    const double v = p.localV(y);
+    const int degree = static_cast<int>(kPointsPerPatch) - 1;
+    double sum = 0.0;
+    for (std::uint32_t r = 0; r < pointsY_; ++r) {
+        const double weight = bernstein(static_cast<int>(r), degree, v);
+        for (std::uint32_t c = 0; c < pointsX_; ++c)
+            sum += weight * bernstein(static_cast<int>(c), degree, u) * p.controlPoints(r, c);
+    }
+    return sum;
+}
+
 void patchSurface::copyToGrid(float* grid) const {
     for (std::uint32_t i = 0; i < patchRows_; ++i)
         for (std::uint32_t j = 0; j < patchColumns_; ++j) {

@@ -62,6 +62,10 @@ public:
     // Global point (row, column) as its first holder (upper-left patch) has it.
     double global(std::uint32_t row, std::uint32_t column) const;
 
+    // Value of the surface at (x, y), in the patch findPatch gives for it
+    // (points outside every patch are reported on `messages`).
+    double value(double x, double y, std::ostream& messages) const;
+
     // Writes the global grid, row-major, as single precision into
     // grid[0 .. globalRows * globalColumns - 1].
     void copyToGrid(float* grid) const;

@@ -39,9 +39,10 @@ struct ProcessingContext {
     bool quiet = false;
     int awbFilterSize = 100;       // lsc.awb_avg_filter_size
     int sampleWindow = 1;          // lsc.sample_window: Bayer blocks per side of a sample's median
-    float maxGain = 6.0f;
-    float maxRmsError = 0.2f;
-    float maxError = 0.2f;
+    float maxGain = 6.0f;          // lsc.max_gain: ceiling of gain samples and control points
+    float maxRmsError = 0.2f;      // lsc.max_rms_err: bound of each channel's RMS fit deviation
+    float maxError = 0.2f;         // lsc.max_err: bound of each channel's largest fit deviation
+    bool logFitError = false;      // lsc.log_err_flag: print the fit deviation of each channel
 
     // Preparation and evaluation settings
     int procSamplingFactor = 1;    // shared.proc_sampling_factor
@@ -55,6 +56,12 @@ struct ProcessingContext {
     float targetLevels[kChannels] = {0, 0, 0, 0};
     std::vector<shadingSample> samples;
     float controlGrids[kChannels][kGridPoints] = {};
+    // How far each channel's fitted surface lies from its gain samples, in
+    // gain units; set once all four channels are fitted, also when a bound
+    // then ends the run.
+    bool fitDeviationMeasured = false;
+    float fitDeviationMax[kChannels] = {0, 0, 0, 0};
+    float fitDeviationRms[kChannels] = {0, 0, 0, 0};
     float whiteBalance[kChannels] = {0, 0, 0, 0};  // read back from calibration data
 
     // Evaluation results

@@ -57,6 +57,7 @@ TEST_F(FitSettingsTest, DefaultsConvertOnce) {
     EXPECT_EQ(c.maxGain, 6.0f);
     EXPECT_EQ(c.maxRmsError, 0.2f);
     EXPECT_EQ(c.maxError, 0.2f);
+    EXPECT_FALSE(c.logFitError);
     EXPECT_EQ(c.sampleWindow, 1);
     EXPECT_EQ(c.maxDeltaAb, 10.0f);
     EXPECT_EQ(c.awbFilterSize, 100);
@@ -72,8 +73,10 @@ TEST_F(FitSettingsTest, ConfiguredValuesArrive) {
         "lsc.falloff_factor = 50; lsc.green_balance = 1; lsc.avg_luma = 1;\n"
         "lsc.sampling_margin = 20; apply_lsc.max_delta_ab = 4.5; lsc.awb_avg_filter_size = 7;\n"
         "apply_lsc.ccm = {2, 0.5};\napply_lsc.ccm[2] = {0, -1, 3};\n"
-        "lsc.sample_window = 7;");
+        "lsc.log_err_flag = 1; lsc.sample_window = 7; lsc.max_gain = 3.5;");
+    EXPECT_TRUE(c.logFitError);
     EXPECT_EQ(c.sampleWindow, 7);
+    EXPECT_EQ(c.maxGain, 3.5f);
     EXPECT_EQ(c.falloff, 0.5f);
     EXPECT_TRUE(c.greenBalance);
     EXPECT_TRUE(c.averageChannels);
