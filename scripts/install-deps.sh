@@ -9,6 +9,7 @@ packages=(
     libjpeg-dev libtiff-dev libssl-dev
     libgtest-dev libbenchmark-dev
     libjpeg-turbo-progs libtiff-tools
+    python3                 # the report tests check the page with Python's HTML parser
 )
 
 missing=()
