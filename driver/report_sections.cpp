@@ -317,6 +317,8 @@ std::string fitErrorSection(const RunReport& report) {
     if (!report.haveFitError)
         return "";
     const auto number = [](float value) { return formatGeneral(value, 6); };
+    // The deviation lines print five decimals.
+    const auto deviation = [](float value) { return formatFixed(value, 5); };
     std::string body = "<table id=\"deviations\" class=\"numbers\"><thead><tr><th>Channel</th>"
                        "<th>Deviation max<br>(bound <span id=\"max-error-bound\">" +
                        number(report.maxErrorBound) +
@@ -325,8 +327,9 @@ std::string fitErrorSection(const RunReport& report) {
                        "</span>)</th><th>Result</th></tr></thead><tbody>";
     for (int k = 0; k < kChannels; ++k) {
         const std::string id = kChannelIds[k];
-        const bool maxOver = report.deviationMax[k] > report.maxErrorBound;
-        const bool rmsOver = report.deviationRms[k] > report.maxRmsBound;
+        // As the check decides: a figure that is not a number exceeds its bound.
+        const bool maxOver = !(report.deviationMax[k] <= report.maxErrorBound);
+        const bool rmsOver = !(report.deviationRms[k] <= report.maxRmsBound);
         std::string result = "<span class=\"ok\">within</span>";
         if (maxOver || rmsOver) {
             result = "<span class=\"bad\">";
@@ -337,9 +340,9 @@ std::string fitErrorSection(const RunReport& report) {
             result += "</span>";
         }
         body += std::string("<tr><th scope=\"row\">") + kChannelNames[k] +
-                "</th><td id=\"deviation-max-" + id + "\">" + number(report.deviationMax[k]) +
-                "</td><td id=\"deviation-rms-" + id + "\">" + number(report.deviationRms[k]) +
-                "</td><td>" + result + "</td></tr>";
+                "</th><td id=\"deviation-max-" + id + "\">" + deviation(report.deviationMax[k]) +
+                "</td><td id=\"deviation-rms-" + id + "\">" + deviation(report.deviationRms[k]) +
+                "</td><td id=\"fit-result-" + id + "\">" + result + "</td></tr>";
     }
     body += "</tbody></table>";
     body += "<p class=\"note\">Largest gain allowed: <span id=\"max-gain-bound\">" +
