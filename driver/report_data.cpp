@@ -63,10 +63,11 @@ ChannelBlockMeans blockMeans(const BayerImage& mosaic, int columns, int rows) {
     means.rows = static_cast<int>(std::min<std::uint64_t>(static_cast<unsigned>(rows), cellsY));
     const std::size_t blocks = static_cast<std::size_t>(means.columns) * means.rows;
 
-    // Block column of each cell, worked out once for all rows.
-    std::vector<std::uint32_t> blockColumn(cellsX);
-    for (std::uint64_t cx = 0; cx < cellsX; ++cx)
-        blockColumn[cx] = static_cast<std::uint32_t>(cx * means.columns / cellsX);
+    // First cell of each block column (cell cx belongs to block column
+    // cx * columns / cellsX), worked out once for all rows.
+    std::vector<std::uint64_t> firstCell(static_cast<std::size_t>(means.columns) + 1);
+    for (std::size_t b = 0; b <= static_cast<std::size_t>(means.columns); ++b)
+        firstCell[b] = (b * cellsX + means.columns - 1) / means.columns;
     std::vector<double> sums(blocks * kChannels, 0.0);
     std::vector<std::uint64_t> cells(blocks, 0);
 
@@ -76,15 +77,19 @@ ChannelBlockMeans blockMeans(const BayerImage& mosaic, int columns, int rows) {
         const std::size_t blockRow = static_cast<std::size_t>((y / 2) * means.rows / cellsY);
         const float* row = pixels + y * width;
         const int channels[2] = {bayerChannel(0, y, phase), bayerChannel(1, y, phase)};
-        double* rowSums = sums.data() + blockRow * means.columns * kChannels;
-        for (std::uint64_t cx = 0; cx < cellsX; ++cx) {
-            double* blockSums = rowSums + std::size_t{blockColumn[cx]} * kChannels;
-            blockSums[channels[0]] += row[2 * cx];
-            blockSums[channels[1]] += row[2 * cx + 1];
+        for (std::size_t b = 0; b < static_cast<std::size_t>(means.columns); ++b) {
+            // A row's share of one block in single precision, gathered in double.
+            float even = 0.0f, odd = 0.0f;
+            for (std::uint64_t cx = firstCell[b]; cx < firstCell[b + 1]; ++cx) {
+                even += row[2 * cx];
+                odd += row[2 * cx + 1];
+            }
+            double* blockSums = sums.data() + (blockRow * means.columns + b) * kChannels;
+            blockSums[channels[0]] += even;
+            blockSums[channels[1]] += odd;
+            if (y % 2 == 0)
+                cells[blockRow * means.columns + b] += firstCell[b + 1] - firstCell[b];
         }
-        if (y % 2 == 0)
-            for (std::uint64_t cx = 0; cx < cellsX; ++cx)
-                ++cells[blockRow * means.columns + blockColumn[cx]];
     }
 
     for (int k = 0; k < kChannels; ++k) {

@@ -86,6 +86,15 @@ TEST(BlockMeans, AveragesEachBlockOverItsOwnCells) {
     EXPECT_FLOAT_EQ(means.mean[0][1], 4.0f); // cells 3, 4, 5
 }
 
+TEST(BlockMeans, DealsUnevenCellsToBlocksInOrder) {
+    // Five cells across into two blocks: cells 0..2 and 3..4.
+    const BayerImage image =
+        makeMosaic(10, 2, kCfaRggb, [](int x, int y) { return (x + y) % 2 ? 0.0f : x / 2 + 0.0f; });
+    const ChannelBlockMeans means = blockMeans(image, 2, 1);
+    EXPECT_FLOAT_EQ(means.mean[0][0], 1.0f);
+    EXPECT_FLOAT_EQ(means.mean[0][1], 3.5f);
+}
+
 TEST(BlockMeans, DealsUnevenCellsAndLeavesOutAnOddLastRowAndColumn) {
     // 5 x 3 pixels: 2 x 1 cells; the last column and row hold 100 and must not count.
     const BayerImage image =
