@@ -152,6 +152,7 @@ void Pipeline::recordFailure() {
     if (reportPath_.empty())
         return;
     report_.failedStage = stage_;
+    recordFitError();
     report_.failureMessage = describeFailure(std::current_exception()).text;
     try {
         writeReport();
@@ -391,9 +392,19 @@ void Pipeline::recordFit() {
     report_.samplePoints.clear();
     for (const shadingSample& sample : context_.samples)
         report_.samplePoints.emplace_back(sample.x, sample.y);
+    recordFitError();
+}
+
+// Also after a failed fit: the deviations show why a bound ended the run.
+void Pipeline::recordFitError() {
     report_.maxRmsBound = context_.maxRmsError;
     report_.maxErrorBound = context_.maxError;
     report_.maxGain = context_.maxGain;
+    report_.haveFitError = context_.fitDeviationMeasured;
+    std::copy(context_.fitDeviationMax, context_.fitDeviationMax + kChannels,
+              report_.deviationMax);
+    std::copy(context_.fitDeviationRms, context_.fitDeviationRms + kChannels,
+              report_.deviationRms);
 }
 
 void Pipeline::writeRegisterFile() {

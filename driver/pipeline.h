@@ -40,6 +40,7 @@ private:
     void obtainSamples();
     void fitSurface();
     void recordFit();
+    void recordFitError();
     void writeRegisterFile();
     void writeBinaryData();
     void correct();
