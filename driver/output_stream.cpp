@@ -1,7 +1,10 @@
 #include "driver/output_stream.h"
 
 #include "driver/driver_messages.h"
+#include "image/output_file.h"
 #include "lsc/apan_exception.h"
+
+#include <unistd.h>
 
 outputStream messageStream;
 
@@ -12,6 +15,18 @@ outputStream::outputStream() : std::ostream(nullptr) {
 void outputStream::openInfoFile(const std::string& name) {
     if (name == "-")
         return;
+    // Opened anew, the file standard output or error already writes to would
+    // be truncated and its earlier lines overwritten: keep that stream.
+    switch (standardStreamDescriptor(name)) {
+    case STDOUT_FILENO:
+        buffer_.target = stdout;
+        return;
+    case STDERR_FILENO:
+        buffer_.target = stderr;
+        return;
+    default:
+        break;
+    }
     std::FILE* file = std::fopen(name.c_str(), "w+");
     if (!file)
         throw apan::exception(240, msg::kInfoFileOpen, msg::kInfoFileOpenHint);

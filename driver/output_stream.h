@@ -21,8 +21,10 @@ public:
     void setQuiet(bool quiet) { buffer_.quiet = quiet; }
     bool quiet() const { return buffer_.quiet; }
 
-    // "-" keeps standard output. Any other name is created or truncated and
-    // becomes the target for the rest of the run. Throws apan::exception 240.
+    // "-", or a name of the file standard output or standard error already
+    // writes to (/dev/stdout), keeps that stream. Any other name is created or
+    // truncated and becomes the target for the rest of the run. Throws
+    // apan::exception 240.
     void openInfoFile(const std::string& name);
 
     // Points the stream at an already open stdio stream (tests).

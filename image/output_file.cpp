@@ -30,6 +30,22 @@ std::string resolveLink(const std::string& path) {
     return resolved;
 }
 
+// Opens a device, pipe or standard stream for a direct write.
+std::FILE* openDirect(const std::string& path) {
+    const int standard = standardStreamDescriptor(path);
+    if (standard < 0)
+        return std::fopen(path.c_str(), "wb");
+    // Whatever the tool printed before is on its way out first.
+    std::fflush(standard == STDOUT_FILENO ? stdout : stderr);
+    const int fd = dup(standard);
+    if (fd < 0)
+        return nullptr;
+    std::FILE* stream = fdopen(fd, "wb");
+    if (!stream)
+        ::close(fd);
+    return stream;
+}
+
 mode_t creationMode() {
     const mode_t mask = umask(0);
     umask(mask);
@@ -37,6 +53,19 @@ mode_t creationMode() {
 }
 
 } // namespace
+
+int standardStreamDescriptor(const std::string& path) {
+    struct stat named;
+    if (stat(path.c_str(), &named) != 0)
+        return -1;
+    for (int fd : {STDOUT_FILENO, STDERR_FILENO}) {
+        struct stat opened;
+        if (fstat(fd, &opened) == 0 && opened.st_dev == named.st_dev &&
+            opened.st_ino == named.st_ino)
+            return fd;
+    }
+    return -1;
+}
 
 OutputFile::~OutputFile() {
     abort();
@@ -47,7 +76,7 @@ bool OutputFile::open(const std::string& path) {
     if (path.empty())
         return false;
     if (writeDirectly(path)) {
-        stream_ = std::fopen(path.c_str(), "wb");
+        stream_ = openDirect(path);
         target_ = path;
         return stream_ != nullptr;
     }

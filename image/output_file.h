@@ -3,7 +3,10 @@
 // file (or one that does not exist yet) is written beside its target under a
 // temporary name and renamed into place by commit(); a device, a FIFO or any
 // other special file (/dev/stdout, /dev/full, a named pipe) is written
-// directly, never renamed over. Without commit() the temporary is removed.
+// directly, never renamed over; a path that names the file standard output or
+// standard error already writes to is written through that descriptor, so
+// nothing printed before is truncated or overwritten. Without commit() the
+// temporary is removed.
 //
 // Procedural like the rest of the image library: no exceptions, results as bool.
 
@@ -34,6 +37,10 @@ private:
     std::string target_;
     std::string temporary_;  // empty for a direct write
 };
+
+// STDOUT_FILENO or STDERR_FILENO when `path` names the file that descriptor
+// writes to (/dev/stdout, /proc/self/fd/2, the same terminal), else -1.
+int standardStreamDescriptor(const std::string& path);
 
 // Writes a whole byte block to `path` through OutputFile. False on any failure.
 bool writeWholeFile(const std::string& path, const void* data, std::size_t size);
