@@ -5,14 +5,13 @@
 #include "image/image_buffer.h"
 #include "lsc/apan_exception.h"
 
-#include <boost/iostreams/device/file.hpp>
 #include <boost/iostreams/filtering_stream.hpp>
 #include <boost/program_options.hpp>
 
 #include <cstdio>
-#include <fstream>
 #include <limits>
 #include <memory>
+#include <sstream>
 #include <stdexcept>
 #include <sys/stat.h>
 #include <vector>
@@ -94,6 +93,31 @@ struct FileClose {
     void operator()(std::FILE* file) const noexcept { std::fclose(file); }
 };
 
+bool isDirectory(std::FILE* file) {
+    struct stat info;
+    return fstat(fileno(file), &info) == 0 && S_ISDIR(info.st_mode);
+}
+
+// A details file holds a handful of lines; anything longer than this is not
+// one (a device such as /dev/zero would otherwise be read without end).
+constexpr std::size_t kMaxDetailsBytes = 1 << 20;
+
+// The whole details file, or false when it cannot be opened or read (a
+// directory, a read error, no end within kMaxDetailsBytes).
+bool readDetailsText(const std::string& path, std::string& text) {
+    std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
+    if (!file || isDirectory(file.get()))
+        return false;
+    char chunk[4096];
+    std::size_t n;
+    while ((n = std::fread(chunk, 1, sizeof chunk, file.get())) > 0) {
+        if (text.size() + n > kMaxDetailsBytes)
+            return false;
+        text.append(chunk, n);
+    }
+    return !std::ferror(file.get());
+}
+
 } // namespace
 
 HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t defaultBits) {
@@ -131,20 +155,19 @@ void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
                        std::uint16_t defaultBits, const std::string& detailsPath,
                        bool fixedHeader) {
     namespace io = boost::iostreams;
-    std::ifstream probe(detailsPath);
-    if (!probe)
+    std::string detailsText;
+    if (!readDetailsText(detailsPath, detailsText))
         throw apan::exception(264, msg::kDetailsUnreadable, msg::kDetailsUnreadableHint);
-    probe.close();
+    std::istringstream detailsSource(detailsText);
     io::filtering_istream details;
     details.push(strip_comments(';'));
     details.push(strip_comments('#'));
-    details.push(io::file_source(detailsPath));
-    if (!details)
-        throw apan::exception(264, msg::kDetailsUnreadable, msg::kDetailsUnreadableHint);
+    details.push(detailsSource);
     const HeaderlessRawDetails d = parseHeaderlessDetails(details, defaultBits);
 
     std::unique_ptr<std::FILE, FileClose> file(std::fopen(rawPath.c_str(), "rb"));
-    if (!file)
+    // A directory opens for reading but holds no samples.
+    if (!file || isDirectory(file.get()))
         throw apan::exception(210, msg::kRawOpen + rawPath, msg::kRawOpenHint);
 
     // The file's size is known before anything is allocated: a details file

@@ -32,6 +32,7 @@ inline constexpr char kCannotOpenSampleOutput[] = "Cannot open sample output fil
 inline constexpr char kCannotWriteSampleOutput[] = "Cannot write sample output file: ";
 inline constexpr char kBadFullScale[] = "The full-scale value of a sample file must be at least 1.";
 inline constexpr char kCannotOpenSampleInput[] = "Cannot open input sample file: ";
+inline constexpr char kSampleInputTooLarge[] = "Input sample file is larger than 64 MiB: ";
 inline constexpr char kExpectingLevels[] =
     "Expecting four maximum channel values separated by commas at the beginning of the sample "
     "file.";

@@ -57,16 +57,25 @@ struct FileClose {
     void operator()(std::FILE* file) const noexcept { std::fclose(file); }
 };
 
-// The whole file, or false when it cannot be opened or read.
-bool readWholeFile(const std::string& path, std::string& text) {
+// Far more than the samples of any sensor; a device such as /dev/zero named
+// as the sample file would otherwise be read until memory runs out.
+constexpr std::size_t kMaxSampleFileBytes = std::size_t{64} << 20;
+
+enum class ReadResult { kOk, kUnreadable, kTooLarge };
+
+// The whole file, refused when it cannot be opened or read or is too large.
+ReadResult readWholeFile(const std::string& path, std::string& text) {
     std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
     if (!file)
-        return false;
+        return ReadResult::kUnreadable;
     char block[65536];
     std::size_t got;
-    while ((got = std::fread(block, 1, sizeof block, file.get())) > 0)
+    while ((got = std::fread(block, 1, sizeof block, file.get())) > 0) {
+        if (text.size() + got > kMaxSampleFileBytes)
+            return ReadResult::kTooLarge;
         text.append(block, got);
-    return std::ferror(file.get()) == 0;
+    }
+    return std::ferror(file.get()) == 0 ? ReadResult::kOk : ReadResult::kUnreadable;
 }
 
 } // namespace
@@ -173,7 +182,10 @@ void writeSampleFile(const std::string& path, const ProcessingContext& context,
 void readSampleFile(const std::string& path, ProcessingContext& context, std::uint32_t fullScale) {
     requireFloatImage(context.image);
     std::string text;
-    if (!readWholeFile(path, text))
+    const ReadResult read = readWholeFile(path, text);
+    if (read == ReadResult::kTooLarge)
+        throw std::runtime_error(msg::kSampleInputTooLarge + path);
+    if (read != ReadResult::kOk)
         throw std::runtime_error(msg::kCannotOpenSampleInput + path);
     SampleSet set = parseSampleFile(text, context.image.width(), context.image.height(),
                                     {fullScale, context.procSamplingFactor});
