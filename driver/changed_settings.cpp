@@ -1,6 +1,27 @@
 #include "driver/changed_settings.h"
 
+#include "config/parameter_table.h"
+#include "config/value_text.h"
+
+namespace {
+
+bool sameValue(const std::string& value, const config_node& defaultNode) {
+    if (!defaultNode.initialized())
+        return false;
+    const std::string& defaultValue = defaultNode.as_string();
+    if (value == defaultValue)
+        return true;
+    // "6" and "6.0" are the same setting.
+    float a, b;
+    return parseFloatText(value, a) && parseFloatText(defaultValue, b) && a == b;
+}
+
+} // namespace
+
 std::vector<std::pair<std::string, std::string>> changedSettings(const config_node_impl& config) {
+    config_node_impl defaults("defaults");
+    set_defaults(defaults);
+
     std::vector<std::pair<std::string, std::string>> changed;
     // Depth-first in print order, with an explicit stack: keys may nest deeply.
     std::vector<const config_node_impl*> pending;
@@ -16,8 +37,11 @@ std::vector<std::pair<std::string, std::string>> changedSettings(const config_no
     while (!pending.empty()) {
         const config_node_impl& node = *pending.back();
         pending.pop_back();
-        if (node.initialized() && !node.is_default())
-            changed.emplace_back(config_relative_path(config, node), node.as_string());
+        if (node.initialized() && !node.is_default()) {
+            const std::string path = config_relative_path(config, node);
+            if (!sameValue(node.as_string(), defaults.find_path(path)))
+                changed.emplace_back(path, node.as_string());
+        }
         pushChildren(node);
     }
     return changed;

@@ -6,7 +6,8 @@
 #include <utility>
 #include <vector>
 
-// Every setting below the "config" node whose value came from a file rather
-// than the parameter table, as (path relative to "config", value), in the
-// order the tree prints them.
+// Every setting below the "config" node whose value differs from the
+// parameter table's default (or that the table does not know), as (path
+// relative to "config", value), in the order the tree prints them. A value
+// given in the file that equals its default, as number or as text, is left out.
 std::vector<std::pair<std::string, std::string>> changedSettings(const config_node_impl& config);
