@@ -135,7 +135,8 @@ std::string runSection(const RunReport& report) {
 std::string surfacesSection(const RunReport& report) {
     const char* title = "Gain surfaces";
     if (!report.haveFit)
-        return section("surfaces", title, note("Not fitted: the run ended before the fit."));
+        return section("surfaces", title,
+                       note("No surface: the run ended before a fit was accepted."));
     const std::uint32_t width = static_cast<std::uint32_t>(std::max(report.preparedWidth, 0));
     const std::uint32_t height = static_cast<std::uint32_t>(std::max(report.preparedHeight, 0));
     const PatchBreakpoints breaks =
@@ -294,7 +295,8 @@ std::string deltaStatistics(const RunReport& report, const std::string& threshol
 std::string colourSection(const RunReport& report) {
     const char* title = "Colour balance and colour error";
     if (!report.haveFit && !report.haveWhiteBalance)
-        return section("colour", title, note("Not measured: the run ended before the fit."));
+        return section("colour", title,
+                       note("Not measured: the run ended before a fit was accepted."));
     if (!report.haveDelta)
         return section("colour", title,
                        colourRatios(report) +
