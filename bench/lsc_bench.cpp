@@ -1,5 +1,6 @@
-// Timings of the lens-shading surface: the least-squares fit of one channel,
-// the whole fit of four channels and the correction of a 12-megapixel image.
+// Timings of the lens-shading surface: sample collection with and without the
+// sample window, the least-squares fit of one channel, the whole fit of four
+// channels and the correction of a 12-megapixel image.
 
 #include <cmath>
 #include <cstdint>
@@ -48,6 +49,27 @@ ProcessingContext collectedContext(int angleStep) {
     collectSamples(context, messages);
     return context;
 }
+
+// The samples of a 4000 x 3000 sensor's full-resolution image (down-sampling
+// 1), with the median over window x window blocks per sample; angle step 8
+// (the default) or 1 (the densest grid).
+void BM_CollectSamples(benchmark::State& state) {
+    ProcessingContext context;
+    makeFlatImage(context, 4000, 3000);
+    context.sampleWindow = static_cast<int>(state.range(0));
+    context.sampleAngleStep = static_cast<int>(state.range(1));
+    context.quiet = true;
+    std::ostringstream messages;
+    for (auto _ : state) {
+        collectSamples(context, messages);
+        benchmark::DoNotOptimize(context.samples.data());
+    }
+    state.counters["samples"] = static_cast<double>(context.samples.size());
+}
+BENCHMARK(BM_CollectSamples)
+    ->ArgsProduct({{1, 5, 15}, {8, 1}})
+    ->ArgNames({"window", "angleStep"})
+    ->Unit(benchmark::kMillisecond);
 
 void BM_PatchFitOneChannel(benchmark::State& state) {
     const ProcessingContext collected = collectedContext(8);
