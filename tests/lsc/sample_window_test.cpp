@@ -56,13 +56,6 @@ TEST(SampleWindow, ThreeBlocksPerSideGiveEachChannelItsOwnMedianOfNine) {
     EXPECT_EQ(image.medians(8, 8, 3), (std::vector<float>{0.25f, 5.0f, 0.5f, 0.75f}));
 }
 
-TEST(SampleWindow, WindowOfOneIsTheBlockItself) {
-    TestImage image(8, 8);
-    for (int k = 0; k < kChannels; ++k)
-        image.at(4, 2, k) = 0.1f * static_cast<float>(k + 1);
-    EXPECT_EQ(image.medians(4, 2, 1), (std::vector<float>{0.1f, 0.2f, 0.3f, 0.4f}));
-}
-
 TEST(SampleWindow, ClippedAtTheCornerAnEvenCountGivesTheMeanOfTheTwoMiddleValues) {
     TestImage image(20, 20, 100.0f);
     // Window 3 at block (0, 0) keeps the blocks at x, y in {0, 2}.
