@@ -31,6 +31,7 @@ th, td { text-align: left; vertical-align: top; padding: 0.3mm 2.5mm 0.3mm 0; bo
 thead th { border-bottom: 0.8pt solid #777; font-weight: bold; }
 th[scope=row] { font-weight: normal; color: #444; white-space: nowrap; }
 table.numbers td { text-align: right; font-variant-numeric: tabular-nums; padding-left: 4mm; }
+table.numbers thead th + th { text-align: right; padding-left: 4mm; }
 code { font: 8pt "DejaVu Sans Mono", monospace; word-break: break-all; }
 h3 { font-size: 9pt; margin: 2mm 0 1mm; }
 .settings ul { columns: 3; column-gap: 5mm; list-style: none; margin: 0; padding: 0; }
