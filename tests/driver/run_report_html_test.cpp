@@ -38,24 +38,55 @@ std::string shellQuoted(const std::string& text) {
 
 class ReportPage : public ::testing::Test {
 protected:
-    // Writes the report and runs the structure checker with the arguments;
-    // the checker's findings go into the failure message.
-    void expectValidPage(const RunReport& report, const std::vector<std::string>& arguments) {
-        const std::string page = dir_.file("report.html");
-        writeRunReport(page, report);
+    // Runs the structure checker on a page file; returns its exit status and
+    // leaves its findings in `findings`.
+    int check(const std::string& page, const std::vector<std::string>& arguments,
+              std::string& findings) {
         std::string command =
             python() + " " +
             shellQuoted(std::string(LSC_SOURCE_DIR) + "/tests/report/check_report.py") + " " +
             shellQuoted(page);
         for (const std::string& argument : arguments)
             command += " " + shellQuoted(argument);
-        const std::string findings = dir_.file("findings.txt");
-        const int status = std::system((command + " > " + shellQuoted(findings) + " 2>&1").c_str());
-        EXPECT_EQ(status, 0) << readFile(findings);
+        const std::string output = dir_.file("findings.txt");
+        const int status = std::system((command + " > " + shellQuoted(output) + " 2>&1").c_str());
+        findings = readFile(output);
+        return status;
+    }
+
+    // Writes the report and expects the checker to pass it.
+    void expectValidPage(const RunReport& report, const std::vector<std::string>& arguments) {
+        const std::string page = dir_.file("report.html");
+        writeRunReport(page, report);
+        std::string findings;
+        EXPECT_EQ(check(page, arguments, findings), 0) << findings;
+    }
+
+    // Expects the checker to refuse a page, naming `finding`.
+    void expectRefused(const std::string& html, const std::string& finding) {
+        const std::string page = dir_.file("broken.html");
+        testing_support::writeFile(page, html);
+        std::string findings;
+        EXPECT_NE(check(page, {}, findings), 0) << html;
+        EXPECT_NE(findings.find(finding), std::string::npos) << findings;
     }
 
     TempDir dir_;
 };
+
+TEST_F(ReportPage, CheckerRefusesWhatAPageMustNotHave) {
+    const std::string head = "<!DOCTYPE html><html lang=\"en\"><head><meta charset=\"utf-8\">"
+                             "<title>t</title></head><body>";
+    expectRefused(head + "<div><p>text</div></body></html>", "</div> closes <p>");
+    expectRefused(head + "<script>1</script></body></html>", "forbidden element <script>");
+    expectRefused(head + "<a href=\"http://example.invalid/\">x</a></body></html>",
+                  "reference outside the page");
+    expectRefused(head + "<p id=\"a\"></p><p id=\"a\"></p></body></html>", "duplicate id");
+    expectRefused(head + "<figure><svg viewBox=\"0 0 1 1\" aria-label=\"x\"></svg>"
+                         "<figcaption>c</figcaption></figure></body></html>",
+                  "no legend");
+    expectRefused(head + "<p>\xFF</p></body></html>", "not UTF-8");
+}
 
 TEST_F(ReportPage, PassingRunShowsEverySectionWithTheNumbersAsPrinted) {
     expectValidPage(report_test::exampleRunReport(),
