@@ -84,14 +84,23 @@ void BayerImage::read(const std::string& path) {
     ImagePtr raw(rawRead(path.c_str(), &rc));
     if (!raw)
         fail(img::msg::kCannotReadKqraw);
+    // The image takes over the raw samples' block, widened to floats where
+    // the reader left room for them: loading then never holds the raw samples
+    // and a float copy at once.
     ImagePtr image(imageCreate(raw->width, raw->height, raw->bitsPerSample, raw->samplesPerPixel,
                                raw->numberOfImages, raw->cfa[0], raw->cfa[1], raw->pixelType,
-                               raw->bufferType, kDataReal32, &rc));
+                               raw->bufferType, kDataNone, &rc));
     if (!image)
         fail(img::msg::kCannotAllocateImage);
     copyMetadataOrThrow(image.get(), raw.get());
-    if (!img::normaliseSamples(raw.get(), static_cast<float*>(image->data)))
+    const int widened = img::widenSamplesToFloat(raw.get());
+    if (widened == img::kNoMemory)
+        fail(img::msg::kCannotAllocateImage);
+    if (widened != img::kOk)
         fail(img::msg::kCannotReadKqraw);
+    image->data = raw->data;
+    image->dataType = kDataReal32;
+    raw->data = nullptr;
     buffer_ = std::move(image);
 }
 

@@ -307,8 +307,9 @@ int readPixels(img::ByteSource& source, KqRawBlock* block) {
     if (!source.read(block->lead, kKqRawPixelLeadSize))
         return img::kIoError;
     block->sampleCount = (block->size - kKqRawPixelLeadSize) / 2;
-    const std::size_t bytes = static_cast<std::size_t>(block->sampleCount * 2);
-    block->samples = static_cast<std::uint16_t*>(img::allocateSamples(bytes));
+    // With room for floats: the samples usually become the input image.
+    block->samples = static_cast<std::uint16_t*>(
+        img::allocateWidenableSamples(block->sampleCount, sizeof(std::uint16_t)));
     if (!block->samples)
         return img::kNoMemory;
     return img::readSamplesLE(source, block->samples, block->sampleCount) ? img::kOk

@@ -4,6 +4,7 @@
 
 #include "image/byte_order.h"
 #include "image/image_result.h"
+#include "image/sample_memory.h"
 
 namespace img {
 
@@ -86,9 +87,14 @@ int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
         return kSizeMismatch;
     int rc = kOk;
     ImagePtr image(imageCreate(static_cast<std::int32_t>(width), static_cast<std::int32_t>(height),
-                               16, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataUint16, &rc));
+                               16, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataNone, &rc));
     if (!image)
         return rc == kBadArgument ? kSizeMismatch : rc;
+    // With room for floats: the samples usually become the input image.
+    image->data = allocateWidenableSamples(std::uint64_t{width} * height, sizeof(std::uint16_t));
+    if (!image->data)
+        return kNoMemory;
+    image->dataType = kDataUint16;
     if (!source.seek(offset) || !readSamplesLE(source, static_cast<std::uint16_t*>(image->data),
                                                std::uint64_t{width} * height))
         return kIoError;

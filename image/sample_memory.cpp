@@ -2,6 +2,10 @@
 
 #include <cstdlib>
 
+#if defined(__GLIBC__) || defined(__BIONIC__)
+#include <malloc.h>
+#endif
+
 #include <sys/mman.h>
 
 namespace img {
@@ -22,6 +26,23 @@ void* allocateSamples(std::size_t bytes) noexcept {
     }
 #endif
     return std::malloc(bytes > 0 ? bytes : 1);
+}
+
+void* allocateWidenableSamples(std::uint64_t count, std::size_t sampleBytes) noexcept {
+    const std::uint64_t bytes = count * sizeof(float);
+    if (sampleBytes > sizeof(float) || count > SIZE_MAX / sizeof(float))
+        return nullptr;
+    return allocateSamples(static_cast<std::size_t>(bytes));
+}
+
+bool blockHolds(const void* block, std::uint64_t bytes) noexcept {
+#if defined(__GLIBC__) || defined(__BIONIC__)
+    return block && malloc_usable_size(const_cast<void*>(block)) >= bytes;
+#else
+    (void)block;
+    (void)bytes;
+    return false;
+#endif
 }
 
 } // namespace img

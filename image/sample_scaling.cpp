@@ -1,5 +1,11 @@
 #include "image/sample_scaling.h"
 
+#include <cstdlib>
+#include <cstring>
+
+#include "image/image_result.h"
+#include "image/sample_memory.h"
+
 namespace img {
 namespace {
 
@@ -18,6 +24,27 @@ void normalise(const Sample* in, std::uint64_t count, unsigned bits, float* out)
         out[i] = static_cast<float>(in[i] & mask) / scale;
 }
 
+// The conversion from the last sample to the first, in the block that holds
+// the samples and is large enough for the floats. Float i takes bytes
+// [4i, 4i + 4), which hold no sample below index i, so every sample is read
+// before its bytes are written; a chunk is copied out first so that the
+// loop works on separate memory.
+template <typename Sample>
+void normaliseInPlace(void* block, std::uint64_t count, unsigned bits) {
+    constexpr std::uint64_t kChunk = 4096;
+    Sample chunk[kChunk];
+    auto* bytes = static_cast<unsigned char*>(block);
+    float* out = static_cast<float*>(block);
+    std::uint64_t end = count;
+    while (end > 0) {
+        const std::uint64_t begin = end > kChunk ? end - kChunk : 0;
+        const std::uint64_t n = end - begin;
+        std::memcpy(chunk, bytes + begin * sizeof(Sample), static_cast<std::size_t>(n) * sizeof(Sample));
+        normalise(chunk, n, bits, out + begin);
+        end = begin;
+    }
+}
+
 } // namespace
 
 bool normaliseSamples(const ImageBuffer* raw, float* out) noexcept {
@@ -33,6 +60,32 @@ bool normaliseSamples(const ImageBuffer* raw, float* out) noexcept {
         return true;
     }
     return false;
+}
+
+int widenSamplesToFloat(ImageBuffer* raw) noexcept {
+    if (!raw || !raw->data || (raw->dataType != kDataUint16 && raw->dataType != kDataUint8))
+        return kUnsupported;
+    const std::uint64_t count = imageTotalSamples(raw, -1);
+    if (count > SIZE_MAX / sizeof(float))
+        return kNoMemory;
+    const std::uint64_t bytes = count * sizeof(float);
+    if (!blockHolds(raw->data, bytes)) {
+        // No room where the samples lie: convert into a new block.
+        auto* floats = static_cast<float*>(allocateSamples(static_cast<std::size_t>(bytes)));
+        if (!floats)
+            return kNoMemory;
+        normaliseSamples(raw, floats);
+        std::free(raw->data);
+        raw->data = floats;
+    } else if (raw->dataType == kDataUint16) {
+        normaliseInPlace<std::uint16_t>(raw->data, count,
+                                        raw->bitsPerSample < 16 ? raw->bitsPerSample : 16);
+    } else {
+        normaliseInPlace<std::uint8_t>(raw->data, count,
+                                       raw->bitsPerSample < 8 ? raw->bitsPerSample : 8);
+    }
+    raw->dataType = kDataReal32;
+    return kOk;
 }
 
 void quantiseSamples(const float* in, std::uint64_t count, unsigned bits,

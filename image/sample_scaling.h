@@ -14,6 +14,14 @@ namespace img {
 // output is 0.
 bool normaliseSamples(const ImageBuffer* raw, float* out) noexcept;
 
+// The same conversion, after which the image holds REAL32 samples. A block
+// from allocateWidenableSamples (the raw readers' blocks) is converted where
+// it lies, so loading never holds the raw samples and a float copy at once;
+// any other block is converted into a new one. Result: kOk; kNoMemory (the
+// image is unchanged); kUnsupported for data types other than UINT8 and
+// UINT16 or no samples.
+int widenSamplesToFloat(ImageBuffer* raw) noexcept;
+
 // out[i] = min(2^bits - 1, v * (2^bits - 1) + 0.5 truncated); negative
 // results and NaN give 0. bits 0..16.
 void quantiseSamples(const float* in, std::uint64_t count, unsigned bits,
