@@ -4,6 +4,7 @@
 #include "prep/median_tree.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
+#include "prep/window_mirror.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -14,20 +15,6 @@ namespace prep {
 namespace {
 
 constexpr std::size_t kTreeChannels = 4;  // channels filtered side by side
-
-// Mirrors a window coordinate into 0..n-1 with the edge sample repeated. A
-// single reflection covers every window the image is wide enough for; on an
-// image narrower than the window the reflection repeats instead of reading
-// outside the image.
-std::size_t mirror(std::int64_t i, std::int64_t n) {
-    if (i >= 0 && i < n)
-        return static_cast<std::size_t>(i);
-    const std::int64_t period = 2 * n;
-    i %= period;
-    if (i < 0)
-        i += period;
-    return static_cast<std::size_t>(i < n ? i : period - 1 - i);
-}
 
 } // namespace
 
@@ -53,12 +40,12 @@ void medianFilterDownsample(const BayerImage& planes, int size, int factor, Baye
     for (std::int64_t y = 0; y < height; ++y) {
         for (std::size_t i = 0; i < window; ++i)
             rowOffsets[i] =
-                mirror(factor * y - half + static_cast<std::int64_t>(i), planes.height()) *
+                mirrorIndex(factor * y - half + static_cast<std::int64_t>(i), planes.height()) *
                 sourceWidth;
         for (std::int64_t x = 0; x < width; ++x) {
             for (std::size_t i = 0; i < window; ++i)
                 columnOffsets[i] =
-                    mirror(factor * x - half + static_cast<std::int64_t>(i), planes.width());
+                    mirrorIndex(factor * x - half + static_cast<std::int64_t>(i), planes.width());
             for (std::size_t first = 0; first < channels; first += kTreeChannels) {
                 const std::size_t group = std::min(kTreeChannels, channels - first);
                 for (std::size_t k = 0; k < group; ++k)
