@@ -12,6 +12,9 @@ inline constexpr char kIndexTooLargePrefix[] = "Index ";
 inline constexpr char kIndexTooLargeMiddle[] = " of ";
 inline constexpr char kIndexTooLargeSuffix[] = " is too large, the largest allowed index is 65535.";
 inline constexpr char kBadPathPrefix[] = "Invalid configuration path: ";
+inline constexpr char kPathTooLongPrefix[] = "Configuration path longer than 256 characters: ";
+inline constexpr char kPathTooManyEntriesPrefix[] =
+    "Configuration path would add more than 262144 new entries: ";
 
 // Configuration file
 inline constexpr char kCannotOpenConfig[] = "Unable to open configuration file.";

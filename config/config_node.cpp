@@ -16,6 +16,13 @@ namespace {
 // typing slip such as a[4000000000] must not try to create billions of nodes.
 constexpr std::size_t kMaxIndex = 65535;
 
+// A path created in one go names one setting, so it is held to what the
+// configuration file allows one key and one file: at most 256 characters and
+// 262144 new entries. Without them a short text such as a[65535][65535]...
+// adds 65536 nodes a step, and a long dotted one builds names of quadratic size.
+constexpr std::size_t kMaxPathLength = 256;
+constexpr std::size_t kMaxNewEntries = 262144;
+
 [[noreturn]] void throwNoneHasNoValue() {
     throw std::invalid_argument(config::msg::kNoneHasNoValue);
 }
@@ -103,7 +110,18 @@ const config_node& config_node::find_path(const std::string& path) const {
 }
 
 config_node& config_node::child_path(const std::string& path) {
-    return walkPath(*this, path, [](config_node& node, const PathStep& step) -> config_node& {
+    if (path.size() > kMaxPathLength)
+        throw std::invalid_argument(config::msg::kPathTooLongPrefix +
+                                    path.substr(0, kMaxPathLength));
+    std::size_t newEntries = 0;
+    return walkPath(*this, path, [&](config_node& node, const PathStep& step) -> config_node& {
+        // Counted before anything is created; an index beyond the limit is
+        // refused by child() itself.
+        if (step.isIndex ? step.index >= node.size() && step.index <= kMaxIndex
+                         : !node.find(step.name).valid())
+            newEntries += step.isIndex ? step.index + 1 - node.size() : 1;
+        if (newEntries > kMaxNewEntries)
+            throw std::out_of_range(config::msg::kPathTooManyEntriesPrefix + path);
         return step.isIndex ? node.child(step.index) : node.child(step.name);
     });
 }

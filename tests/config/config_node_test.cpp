@@ -279,4 +279,34 @@ TEST(ConfigNodeDepth, DeepTreesPrintAndReleaseWithoutRecursion) {
     EXPECT_EQ(deepPrintedLines, 4001u);
 }
 
+// A path held to the size of one configuration key and one file's entries:
+// nested large indices in a short text once tried to build gigabytes of nodes.
+TEST_F(ConfigNodeTest, PathThatWouldAddTooManyEntriesIsRefusedBeforeCreatingThem) {
+    EXPECT_EQ(messageOf([&] { config.child_path("a[65535][65535][65535][65535]"); }),
+              "Configuration path would add more than 262144 new entries: "
+              "a[65535][65535][65535][65535]");
+    EXPECT_EQ(config.find_path("a[65535][65535][65535]").size(), 0u);
+    EXPECT_THROW(config.child_path(std::string("b") + "[65535]" + "[65535]" + "[65535]" +
+                                   "[65535][65535][65535][65535][65535][65535]"),
+                 std::out_of_range);
+}
+
+TEST_F(ConfigNodeTest, EntriesThatExistDoNotCountAgainstAPath) {
+    config.child_path("a[65535][65535][65535]");
+    EXPECT_EQ(config.child_path("a[65535][65535][65535][3]").name(),
+              "root.config.a[65535][65535][65535][3]");
+}
+
+TEST_F(ConfigNodeTest, PathLongerThanAKeyIsRefused) {
+    std::string path = "a";
+    while (path.size() < 256)
+        path += ".a";
+    path.resize(256);
+    path.back() = 'b';
+    EXPECT_EQ(config.child_path(path).name(), "root.config." + path);
+    EXPECT_EQ(messageOf([&] { config.child_path(path + "c"); }),
+              "Configuration path longer than 256 characters: " + path);
+    EXPECT_FALSE(config.find_path(path + "c").valid());
+}
+
 } // namespace
