@@ -74,7 +74,7 @@ template <typename F> void forEachSineOffset(int angleStep, float halfExtent, F 
     for (std::int64_t angle = -90;; angle += angleStep) {
         const float degrees = static_cast<float>(angle < 90 ? angle : 90);
         const float sine = std::sin(degrees * kDegreesToRadians);
-        f(static_cast<std::int64_t>(std::lround(halfExtent * (sine + 1.0f))));
+        f(static_cast<std::int64_t>(std::llround(halfExtent * (sine + 1.0f))));
         if (angle >= 90)
             break;
     }

@@ -256,7 +256,7 @@ std::string fixedHeaderFileBytes(const FlatField& field, const CaptureInfo& capt
     putU32(bytes, 16, bayerCodeOf(field.spec.cfa));
     putU32(bytes, 24, std::uint32_t(capture.sensorGuid));
     putU32(bytes, 28, std::uint32_t(capture.sensorGuid >> 32));
-    putU32(bytes, 32, std::uint32_t(std::lround(double(capture.exposureTime) * 65536.0)));
+    putU32(bytes, 32, std::uint32_t(std::llround(double(capture.exposureTime) * 65536.0)));
     putU32(bytes, 36, floatBits(capture.exposureTime));
     for (int k = 0; k < 4; ++k)
         putU32(bytes, 68 + 4 * std::size_t(k), floatBits(capture.gains[k]));
