@@ -3,6 +3,7 @@
 
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
+#include "tests/support/tool_runner.h"
 
 #include <algorithm>
 #include <cctype>
@@ -409,7 +410,8 @@ std::string flatgenPath() {
 }
 
 int runFlatgen(const std::string& arguments) {
-    return std::system((flatgenPath() + " " + arguments + " >/dev/null 2>&1").c_str());
+    return std::system(
+        (toolCommandPrefix() + flatgenPath() + " " + arguments + " >/dev/null 2>&1").c_str());
 }
 
 // The parameters that examples/README.md gives for examples/flatfield.kqraw.

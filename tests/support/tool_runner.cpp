@@ -23,6 +23,26 @@ std::string readAll(std::FILE* file) {
 
 } // namespace
 
+const std::vector<std::string>& toolPrefix() {
+#ifdef LSC_TOOL_PREFIX
+    static const std::vector<std::string> prefix{LSC_TOOL_PREFIX};
+#else
+    static const std::vector<std::string> prefix;
+#endif
+    return prefix;
+}
+
+std::string toolCommandPrefix() {
+    std::string command;
+    for (const std::string& word : toolPrefix()) {
+        command += '\'';
+        for (char c : word)
+            command += c == '\'' ? std::string("'\\''") : std::string(1, c);
+        command += "' ";
+    }
+    return command;
+}
+
 ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
                    const std::string& input) {
     std::FILE* out = std::tmpfile();
@@ -31,12 +51,12 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
     std::fwrite(input.data(), 1, input.size(), in);
     std::rewind(in);
 
+    std::vector<std::string> words(toolPrefix());
+    words.push_back(LSC_BINARY);
+    words.insert(words.end(), args.begin(), args.end());
     std::vector<char*> argv;
-    std::string program = LSC_BINARY;
-    argv.push_back(program.data());
-    std::vector<std::string> copies(args);
-    for (std::string& arg : copies)
-        argv.push_back(arg.data());
+    for (std::string& word : words)
+        argv.push_back(word.data());
     argv.push_back(nullptr);
 
     ToolResult result;
@@ -47,7 +67,7 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
         dup2(fileno(err), 2);
         if (!dir.empty() && chdir(dir.c_str()) != 0)
             _exit(127);
-        execv(argv[0], argv.data());
+        execvp(argv[0], argv.data());  // the emulator may be named without a path
         _exit(127);
     }
     int status = 0;

@@ -18,4 +18,12 @@ struct ToolResult {
 ToolResult runTool(const std::vector<std::string>& args, const std::string& dir = "",
                    const std::string& input = "");
 
+// What starts a program of this build: empty natively; in a cross build the
+// emulator and its arguments, so tests run the target's programs on the host.
+const std::vector<std::string>& toolPrefix();
+
+// toolPrefix() as the start of a shell command: each word quoted, followed by
+// a space; empty natively.
+std::string toolCommandPrefix();
+
 } // namespace testing_support
