@@ -1,0 +1,61 @@
+// The one-pass preparation of a 12-megapixel (4000 x 3000) RGGB capture with
+// the default settings (3 x 3 median, down-sampling by 4), beside the same
+// work in three steps (split, filter, weave) that it replaces.
+
+#include "image/image_buffer.h"
+#include "prep/bayer_planes.h"
+#include "prep/median_filter.h"
+#include "prep/mosaic_preparation.h"
+
+#include <cstdint>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+
+namespace {
+
+constexpr std::int32_t kWidth = 4000;
+constexpr std::int32_t kHeight = 3000;
+
+// A flat field with some noise, so the windows hold distinct values.
+BayerImage noisyCapture() {
+    int result = 0;
+    BayerImage image;
+    image.reset(imageCreate(kWidth, kHeight, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
+                            kDataReal32, &result));
+    std::uint32_t state = 12345;
+    for (std::size_t i = 0; i < std::size_t{kWidth} * kHeight; ++i) {
+        state = state * 1664525u + 1013904223u;
+        image.pixels()[i] = static_cast<float>(600 + (state >> 24) % 64) / 1023.0f;
+    }
+    return image;
+}
+
+void BM_PrepareMosaic(benchmark::State& state) {
+    const BayerImage mosaic = noisyCapture();
+    const prep::MosaicPreparation settings{true, static_cast<int>(state.range(0)),
+                                           static_cast<int>(state.range(1))};
+    for (auto _ : state) {
+        const BayerImage prepared = prep::prepareMosaic(mosaic, settings);
+        benchmark::DoNotOptimize(prepared.pixels());
+    }
+    state.SetItemsProcessed(state.iterations() * kWidth * kHeight);
+}
+BENCHMARK(BM_PrepareMosaic)->Args({3, 4})->Args({5, 4})->Unit(benchmark::kMillisecond);
+
+void BM_PrepareInThreeSteps(benchmark::State& state) {
+    const BayerImage mosaic = noisyCapture();
+    const int size = static_cast<int>(state.range(0));
+    const int factor = static_cast<int>(state.range(1));
+    for (auto _ : state) {
+        const BayerImage planes = prep::split(mosaic);
+        BayerImage reduced;
+        prep::medianFilterDownsample(planes, size, factor, reduced);
+        const BayerImage prepared = prep::weave(reduced, 2, 0, kCfaRggb);
+        benchmark::DoNotOptimize(prepared.pixels());
+    }
+    state.SetItemsProcessed(state.iterations() * kWidth * kHeight);
+}
+BENCHMARK(BM_PrepareInThreeSteps)->Args({3, 4})->Args({5, 4})->Unit(benchmark::kMillisecond);
+
+} // namespace
