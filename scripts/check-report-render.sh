@@ -26,22 +26,25 @@ if [ "${#missing[@]}" -gt 0 ]; then
 fi
 [ -x "$build_dir/lsc" ] || BUILD_DIR="$build_dir" scripts/build.sh
 
-# Outputs under the build directory, so the page shows short, stable paths.
-out="$build_dir/report-check"
-rm -rf "$out"
-mkdir -p "$out"
+# The example's outputs go where scripts/run-example.sh puts them, so the
+# page shows the paths a reader of the README knows; the pictures go to a
+# scratch directory.
+mkdir -p examples/out
+page="examples/out/report.html"
 "$build_dir/lsc" --config examples/lsc.cfg --input examples/flatfield.kqraw \
-    --calibrate "$out/calibration.txt" --kq --quiet --report "$out/report.html"
-python3 tests/report/check_report.py "$out/report.html" --verdict=pass --figures=7
+    --calibrate examples/out/calibration.txt --kq --quiet --report "$page"
+python3 tests/report/check_report.py "$page" --verdict=pass --figures=7
+out="$(mktemp -d)"
+trap 'rm -rf "$out"' EXIT
 
 # A fresh profile per run, nothing fetched, no sandbox (CI runs as root).
 render() {
     local profile
-    profile="$(mktemp -d "$PWD/$out/profile.XXXXXX")"
+    profile="$(mktemp -d "$out/profile.XXXXXX")"
     if ! timeout 180 chromium --headless --no-sandbox --disable-gpu --no-first-run \
         --disable-background-networking --disable-component-update --disable-sync \
         --disable-dev-shm-usage --hide-scrollbars --user-data-dir="$profile" \
-        "$@" "file://$PWD/$out/report.html" >"$out/chromium.log" 2>&1; then
+        "$@" "file://$PWD/$page" >"$out/chromium.log" 2>&1; then
         cat "$out/chromium.log" >&2
         echo "Chromium could not render the report." >&2
         return 1
