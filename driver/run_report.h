@@ -21,7 +21,7 @@ struct RunReport {
     // Verdict: empty failure text means the run passed.
     bool finished = false;          // the run reached "Completed."
     std::string failedStage;        // what the run was doing when it failed
-    std::string failureMessage;     // the error text as printed after "ERROR: "
+    std::string failureMessage;     // the error lines as printed ("ERROR: ...")
 
     // The run
     std::string toolVersion;        // "3.8.1"
