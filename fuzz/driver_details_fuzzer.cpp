@@ -30,10 +30,10 @@ bool isHexText(const std::string& text) {
 void checkAccepted(const HeaderlessRawDetails& d) {
     const bool sizes = d.width >= 1 && d.width <= 65535 && d.height >= 1 && d.height <= 65535;
     const bool bits = d.bits >= 1 && d.bits <= 16;
-    const bool cfa = d.cfa == kCfaRggb || d.cfa == kCfaGrbg || d.cfa == kCfaBggr ||
-                     d.cfa == kCfaGbrg;
-    const bool serial = d.serialNumber.size() % 2 == 0 && d.serialNumber.size() <= 32 &&
-                        isHexText(d.serialNumber);
+    const bool cfa =
+        d.cfa == kCfaRggb || d.cfa == kCfaGrbg || d.cfa == kCfaBggr || d.cfa == kCfaGbrg;
+    const bool serial =
+        d.serialNumber.size() % 2 == 0 && d.serialNumber.size() <= 32 && isHexText(d.serialNumber);
     const bool guid = d.sensorGuid.size() <= 16 && isHexText(d.sensorGuid);
     if (!(sizes && bits && cfa && serial && guid))
         std::abort();
@@ -57,7 +57,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         checkAccepted(parseHeaderlessDetails(details, defaultBits));
     } catch (const boost::program_options::error&) {
     } catch (const apan::exception&) {
-    } catch (const std::runtime_error&) { // missing or out-of-range values
+    } catch (const std::runtime_error&) {    // missing or out-of-range values
     } catch (const std::invalid_argument&) { // Bayer order, sensor GUID
     }
     return 0;

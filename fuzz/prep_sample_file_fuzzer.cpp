@@ -3,13 +3,13 @@
 // outside the image is a bug. What it accepts is written out and read back:
 // the second reading must write the same text as the first.
 
-#include "prep/sample_file.h"
-
 #include <cstdint>
 #include <cstdlib>
 #include <stdexcept>
 #include <string>
 #include <string_view>
+
+#include "prep/sample_file.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     constexpr std::int32_t kWidth = 648, kHeight = 486;
