@@ -141,6 +141,16 @@ const char kCalibrationError[] =
     "ERROR: Unable to open output calibration file, possible invalid output path or output "
     "filename specified.";
 
+// An output written after the register file, with one message for a file
+// that cannot be created and one that cannot be written.
+OutputCase afterCalibration(const char* option, const char* openError,
+                            const char* writeError = nullptr) {
+    return {option,
+            {"--input", "flat.kqraw", "--calibrate", "CAL", std::string("--") + option, "%"},
+            openError,
+            writeError ? writeError : openError};
+}
+
 const OutputCase kOutputs[] = {
     {"calibrate",
      {"--input", "flat.kqraw", "--calibrate", "%"},
@@ -150,46 +160,20 @@ const OutputCase kOutputs[] = {
      {"--input", "flat.kqraw", "--calibrate", "cal.txt", "--binary", "%"},
      "ERROR: Cannot store binary calibration file.",
      "ERROR: Cannot store binary calibration file."},
-    {"flat",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--flat", "%"},
-     "ERROR: Cannot store kqraw image.",
-     "ERROR: Cannot store kqraw image."},
-    {"jpeg",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--jpeg", "%"},
-     "ERROR: Cannot store jpeg image.",
-     "ERROR: Cannot store jpeg image."},
-    {"bmp",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--bmp", "%"},
-     "ERROR: Cannot store BMP image.",
-     "ERROR: Cannot store BMP image."},
-    {"inputasjpeg",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--inputasjpeg", "%"},
-     "ERROR: Cannot store jpeg image.",
-     "ERROR: Cannot store jpeg image."},
-    {"inputasbmp",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--inputasbmp", "%"},
-     "ERROR: Cannot store BMP image.",
-     "ERROR: Cannot store BMP image."},
+    afterCalibration("flat", "ERROR: Cannot store kqraw image."),
+    afterCalibration("jpeg", "ERROR: Cannot store jpeg image."),
+    afterCalibration("bmp", "ERROR: Cannot store BMP image."),
+    afterCalibration("inputasjpeg", "ERROR: Cannot store jpeg image."),
+    afterCalibration("inputasbmp", "ERROR: Cannot store BMP image."),
     {"translate",
      {"--input", "flat.raw", "--raw", "flat.txt", "--calibrate", "CAL", "--translate", "%"},
      "ERROR: Cannot store kqraw image.",
      "ERROR: Cannot store kqraw image."},
-    {"preproc",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--preproc", "%"},
-     "ERROR: Cannot store kqraw image.",
-     "ERROR: Cannot store kqraw image."},
-    {"outsamples",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--outsamples", "%"},
-     "ERROR: Cannot open sample output file: %",
-     "ERROR: Cannot write sample output file: %"},
-    {"delta",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--delta", "%"},
-     "ERROR: Cannot open file : %",
-     "ERROR: Cannot write file : %"},
-    {"stats",
-     {"--input", "flat.kqraw", "--calibrate", "CAL", "--stats", "%"},
-     "ERROR: Cannot open file : %",
-     "ERROR: Cannot write file : %"},
+    afterCalibration("preproc", "ERROR: Cannot store kqraw image."),
+    afterCalibration("outsamples", "ERROR: Cannot open sample output file: %",
+                     "ERROR: Cannot write sample output file: %"),
+    afterCalibration("delta", "ERROR: Cannot open file : %", "ERROR: Cannot write file : %"),
+    afterCalibration("stats", "ERROR: Cannot open file : %", "ERROR: Cannot write file : %"),
 };
 
 class OutputFaults : public ToolRun, public ::testing::WithParamInterface<OutputCase> {
