@@ -66,11 +66,13 @@ ToolResult runOnFullDisk(const std::vector<std::string>& args, const std::string
     int out[2], err[2];
     if (pipe(out) != 0 || pipe(err) != 0)
         return {};
-    std::vector<std::string> copies(args);
-    std::string program = LSC_BINARY;
-    std::vector<char*> argv = {program.data()};
-    for (std::string& arg : copies)
-        argv.push_back(arg.data());
+    // Through the emulator in a cross build, like every other run.
+    std::vector<std::string> words(testing_support::toolPrefix());
+    words.push_back(LSC_BINARY);
+    words.insert(words.end(), args.begin(), args.end());
+    std::vector<char*> argv;
+    for (std::string& word : words)
+        argv.push_back(word.data());
     argv.push_back(nullptr);
 
     const pid_t pid = fork();
@@ -86,7 +88,7 @@ ToolResult runOnFullDisk(const std::vector<std::string>& args, const std::string
         const rlimit limit = {maxFileBytes, maxFileBytes};
         if (setrlimit(RLIMIT_FSIZE, &limit) != 0 || chdir(dir.c_str()) != 0)
             _exit(127);
-        execv(argv[0], argv.data());
+        execvp(argv[0], argv.data());
         _exit(127);
     }
     close(out[1]);
