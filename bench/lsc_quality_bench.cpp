@@ -43,24 +43,24 @@
 namespace {
 
 using testing_support::FlatField;
-using testing_support::FlatFieldSpec;
+using testing_support::FlatFieldShape;
 
 constexpr int kBlock = 8;
 
 constexpr std::uint32_t kSeeds[] = {21, 22, 23, 24, 25};
 
-FlatFieldSpec benchSpec(bool offCentre, std::uint32_t seed) {
-    FlatFieldSpec spec;
-    spec.width = 2000;
-    spec.height = 1500;
-    spec.noise = 0.005;
-    spec.defects = 200;
+FlatFieldShape benchShape(bool offCentre, std::uint32_t seed) {
+    FlatFieldShape shape;
+    shape.width = 2000;
+    shape.height = 1500;
+    shape.noise = 0.005;
+    shape.defects = 200;
     if (offCentre) {
-        spec.centerX = 0.4;
-        spec.centerY = 0.6;
+        shape.centerX = 0.4;
+        shape.centerY = 0.6;
     }
-    spec.seed = seed;
-    return spec;
+    shape.seed = seed;
+    return shape;
 }
 
 struct PreparedField {
@@ -78,7 +78,7 @@ const PreparedField& preparedField(bool offCentre, bool medianFilter, std::uint3
     if (found != cache.end())
         return found->second;
     PreparedField& entry = cache[key];
-    entry.field = testing_support::makeFlatField(benchSpec(offCentre, seed));
+    entry.field = testing_support::makeFlatField(benchShape(offCentre, seed));
     entry.defect.assign(entry.field.samples.size(), false);
     for (std::size_t at : entry.field.hotPixels)
         entry.defect[at] = true;
@@ -114,7 +114,7 @@ const PreparedField& preparedField(bool offCentre, bool medianFilter, std::uint3
 template <typename F>
 std::vector<double> worstBlockDeviations(const PreparedField& input, F value) {
     const FlatField& field = input.field;
-    const int width = field.spec.width, height = field.spec.height;
+    const int width = field.shape.width, height = field.shape.height;
     std::vector<double> worst(4, 0.0);
     for (int k = 0; k < 4; ++k) {
         std::vector<double> means;
@@ -186,7 +186,7 @@ void BM_FlatnessAfterCorrection(benchmark::State& state) {
     std::vector<double> flat(4, 0.0), floor(4, 0.0);
     for (auto _ : state) {
         for (const PreparedField* input : inputs) {
-            const std::size_t width = static_cast<std::size_t>(input->field.spec.width);
+            const std::size_t width = static_cast<std::size_t>(input->field.shape.width);
             ProcessingContext context;
             const float* corrected = nullptr;
             try {

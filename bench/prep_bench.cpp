@@ -80,11 +80,11 @@ BENCHMARK(BM_MedianFilterDownsample)
 
 // Loading the same capture from a KQRAW2 file, for comparison.
 void BM_LoadKqraw2(benchmark::State& state) {
-    testing_support::FlatFieldSpec spec;
-    spec.width = kWidth;
-    spec.height = kHeight;
-    spec.noise = 0.01;
-    const std::string bytes = testing_support::kqraw2FileBytes(testing_support::makeFlatField(spec));
+    testing_support::FlatFieldShape shape;
+    shape.width = kWidth;
+    shape.height = kHeight;
+    shape.noise = 0.01;
+    const std::string bytes = testing_support::kqraw2FileBytes(testing_support::makeFlatField(shape));
     char path[] = "/tmp/prep_bench_XXXXXX";
     const int fd = mkstemp(path);
     if (fd < 0 || write(fd, bytes.data(), bytes.size()) != static_cast<ssize_t>(bytes.size())) {

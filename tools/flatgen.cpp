@@ -47,7 +47,7 @@ const char kHelp[] =
     "  --help                  print this text\n";
 
 struct Options {
-    FlatFieldSpec spec;
+    FlatFieldShape shape;
     CaptureInfo capture;
     std::string format = "kqraw2";
     std::string output;
@@ -97,7 +97,7 @@ std::vector<double> parseList(const std::string& name, const std::string& text,
 }
 
 void applyOption(Options& options, const std::string& name, const std::string& value) {
-    FlatFieldSpec& spec = options.spec;
+    FlatFieldShape& shape = options.shape;
     if (name == "format") {
         if (value != "kqraw2" && value != "kqraw" && value != "raw")
             throw UsageError("--format: expected kqraw2, kqraw or raw");
@@ -105,37 +105,37 @@ void applyOption(Options& options, const std::string& name, const std::string& v
     } else if (name == "details") {
         options.details = value;
     } else if (name == "width") {
-        spec.width = parseInt<int>(name, value);
+        shape.width = parseInt<int>(name, value);
     } else if (name == "height") {
-        spec.height = parseInt<int>(name, value);
+        shape.height = parseInt<int>(name, value);
     } else if (name == "bits") {
-        spec.bits = parseInt<int>(name, value);
+        shape.bits = parseInt<int>(name, value);
     } else if (name == "order") {
-        spec.cfa = cfaOfBayerOrder(value);
-        if (spec.cfa == 0)
+        shape.cfa = cfaOfBayerOrder(value);
+        if (shape.cfa == 0)
             throw UsageError("--order: expected RGGB, GRBG, GBRG or BGGR");
     } else if (name == "level") {
-        spec.centerLevel = parseDouble(name, value);
+        shape.centerLevel = parseDouble(name, value);
     } else if (name == "corner") {
-        spec.cornerLevel = parseDouble(name, value);
+        shape.cornerLevel = parseDouble(name, value);
     } else if (name == "centre" || name == "center") {
         const auto xy = parseList(name, value, 2);
-        spec.centerX = xy[0];
-        spec.centerY = xy[1];
+        shape.centerX = xy[0];
+        shape.centerY = xy[1];
     } else if (name == "channel-levels") {
         const auto levels = parseList(name, value, 4);
         for (int k = 0; k < 4; ++k)
-            spec.channelLevel[k] = levels[std::size_t(k)];
+            shape.channelLevel[k] = levels[std::size_t(k)];
     } else if (name == "colour-shading" || name == "color-shading") {
-        spec.colourShading = parseDouble(name, value);
+        shape.colourShading = parseDouble(name, value);
     } else if (name == "noise") {
-        spec.noise = parseDouble(name, value);
+        shape.noise = parseDouble(name, value);
     } else if (name == "defects") {
-        spec.defects = parseInt<int>(name, value);
+        shape.defects = parseInt<int>(name, value);
     } else if (name == "black-level") {
-        spec.blackLevel = parseInt<int>(name, value);
+        shape.blackLevel = parseInt<int>(name, value);
     } else if (name == "seed") {
-        spec.seed = parseInt<std::uint32_t>(name, value);
+        shape.seed = parseInt<std::uint32_t>(name, value);
     } else if (name == "serial") {
         options.capture.serialNumber = value;
     } else if (name == "exposure") {
@@ -188,7 +188,7 @@ void writeOrThrow(const std::string& path, const std::string& bytes) {
 }
 
 void generate(const Options& options) {
-    const FlatField field = makeFlatField(options.spec);
+    const FlatField field = makeFlatField(options.shape);
     if (options.format == "kqraw") {
         writeOrThrow(options.output, fixedHeaderFileBytes(field, options.capture));
     } else if (options.format == "raw") {

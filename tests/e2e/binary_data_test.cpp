@@ -39,7 +39,7 @@ std::string hexOf(const std::string& bytes) {
 }
 
 TEST_F(BinaryData, IsWrittenReadBackAndDigested) {
-    prepare("shared.cfg_file_date = 2012-05-01T10:30;", smallSpec(),
+    prepare("shared.cfg_file_date = 2012-05-01T10:30;", smallShape(),
             [] {
                 CaptureInfo capture;
                 capture.serialNumber = "0a1b2c3d";
@@ -59,8 +59,9 @@ TEST_F(BinaryData, IsWrittenReadBackAndDigested) {
     ASSERT_GT(blob.size(), 24u);
     EXPECT_EQ(blob.substr(0, 8), std::string("\xCA\x1B\xA7\xED\x01\x04\x00\x00", 8));
     // Table: tracking, tool, lens shading, white balance, digest.
-    const auto word = [&](std::size_t at) {
-        return (static_cast<unsigned char>(blob[at]) << 8) | static_cast<unsigned char>(blob[at + 1]);
+    const auto word = [&](std::size_t offset) {
+        return (static_cast<unsigned char>(blob[offset]) << 8) |
+               static_cast<unsigned char>(blob[offset + 1]);
     };
     EXPECT_EQ(word(8), 0x0001);
     EXPECT_EQ(word(12), 0x0003);

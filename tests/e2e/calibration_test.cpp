@@ -93,7 +93,7 @@ TEST_F(Calibration, RunPrintsTheFitAndEvaluationLinesInOrder) {
 }
 
 TEST_F(Calibration, RegisterFileHoldsGeometryLevelsSerialAndFourGrids) {
-    prepare("", smallSpec(), withSerial("00112233445566778899aabbccddeeff"));
+    prepare("", smallShape(), withSerial("00112233445566778899aabbccddeeff"));
     const auto result = calibrate();
     ASSERT_EQ(result.status, 0) << result.out;
     const auto text = lines(read("cal.txt"));
@@ -121,7 +121,7 @@ TEST_F(Calibration, RegisterFileHoldsGeometryLevelsSerialAndFourGrids) {
 
 TEST_F(Calibration, RegisterFileReadsBackAsConfiguration) {
     for (const std::string& serial : {std::string(), std::string("0a1b")}) {
-        prepare("", smallSpec(), withSerial(serial));
+        prepare("", smallShape(), withSerial(serial));
         ASSERT_EQ(calibrate().status, 0);
         // Used as a configuration file, it must parse and validate.
         const auto again = run({"-c", "cal.txt", "-i", "flat.kqraw", "-l", "cal2.txt"});

@@ -191,10 +191,10 @@ TEST_F(Configuration, SettingsAreCheckedAgainstTheImageSize) {
 
 TEST_F(Configuration, SixteenBitDepthDoesNotRefuseThePixelLimits) {
     // 2^16 - 1 taken as a signed 16-bit number would be -1 and refuse every limit.
-    FlatFieldSpec spec = smallSpec();
-    spec.bits = 16;
+    FlatFieldShape shape = smallShape();
+    shape.bits = 16;
     prepare("proc.min_pixel_val = 100; proc.max_pixel_val = 65000; proc.peak_pixel_min = 1000;",
-            spec);
+            shape);
     const auto result = calibrate();
     EXPECT_EQ(result.status, 0) << result.out;
     EXPECT_TRUE(hasLine(result.out, "Completed.")) << result.out;

@@ -15,16 +15,16 @@ namespace e2e {
 
 using testing_support::CaptureInfo;
 using testing_support::FlatField;
-using testing_support::FlatFieldSpec;
+using testing_support::FlatFieldShape;
 using testing_support::ToolResult;
 
 // A small, clean 10-bit RGGB flat field that passes the default checks (the
 // default white-balance filter of 100 pixels needs a width of at least 400).
-inline FlatFieldSpec smallSpec() {
-    FlatFieldSpec spec;
-    spec.width = 640;
-    spec.height = 480;
-    return spec;
+inline FlatFieldShape smallShape() {
+    FlatFieldShape shape;
+    shape.width = 640;
+    shape.height = 480;
+    return shape;
 }
 
 class ToolRun : public ::testing::Test {
@@ -36,10 +36,10 @@ protected:
         testing_support::writeFile(path(name), bytes);
     }
 
-    // Writes "flat.kqraw" (a container of `spec`) and "lsc.cfg" with `config`.
-    void prepare(const std::string& config = "", const FlatFieldSpec& spec = smallSpec(),
+    // Writes "flat.kqraw" (a container of `shape`) and "lsc.cfg" with `config`.
+    void prepare(const std::string& config = "", const FlatFieldShape& shape = smallShape(),
                  const CaptureInfo& capture = {}) {
-        field_ = testing_support::makeFlatField(spec);
+        field_ = testing_support::makeFlatField(shape);
         write("flat.kqraw", testing_support::kqraw2FileBytes(field_, capture));
         write("lsc.cfg", config);
     }

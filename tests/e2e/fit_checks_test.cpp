@@ -14,12 +14,12 @@ namespace {
 const std::string kGoldenDir = std::string(LSC_SOURCE_DIR) + "/tests/data/e2e/";
 
 // The flat field of the golden default run: noisy, with defective pixels.
-FlatFieldSpec goldenSpec() {
-    FlatFieldSpec spec = smallSpec();
-    spec.noise = 0.005;
-    spec.defects = 200;
-    spec.seed = 3;
-    return spec;
+FlatFieldShape goldenShape() {
+    FlatFieldShape shape = smallShape();
+    shape.noise = 0.005;
+    shape.defects = 200;
+    shape.seed = 3;
+    return shape;
 }
 
 // Compares a whole text with a golden file. On a mismatch the actual text is
@@ -40,7 +40,7 @@ void paint(FlatField& field, int x, int y, int size, double factor, int value = 
     for (int row = y; row < y + size; ++row)
         for (int column = x; column < x + size; ++column) {
             std::uint16_t& sample =
-                field.samples[static_cast<std::size_t>(row) * field.spec.width + column];
+                field.samples[static_cast<std::size_t>(row) * field.shape.width + column];
             sample = static_cast<std::uint16_t>(value >= 0 ? value : sample * factor);
         }
 }
@@ -59,7 +59,7 @@ protected:
 };
 
 TEST_F(FitChecks, DefaultRunKeepsItsRegisterFileAndEveryLine) {
-    prepare("", goldenSpec());
+    prepare("", goldenShape());
     const auto result = calibrate();
     ASSERT_EQ(result.status, 0) << result.out;
     expectGolden(result.out, "default_run_stdout.txt");
@@ -67,7 +67,7 @@ TEST_F(FitChecks, DefaultRunKeepsItsRegisterFileAndEveryLine) {
 }
 
 TEST_F(FitChecks, LogFlagOnlyAddsTheDeviationOfEachChannel) {
-    prepare("lsc.log_err_flag = 1;", goldenSpec());
+    prepare("lsc.log_err_flag = 1;", goldenShape());
     const auto result = calibrate();
     ASSERT_EQ(result.status, 0) << result.out;
     expectGolden(read("cal.txt"), "default_run_register.txt");
@@ -125,9 +125,9 @@ TEST_F(FitChecks, SampleWindowKeepsASmallBlotchOutOfTheSamples) {
 }
 
 TEST_F(FitChecks, CornerTooDarkToCorrectMeetsTheGainCeiling) {
-    FlatFieldSpec spec = smallSpec();
-    spec.cornerLevel = 0.15;
-    prepare("proc.min_pixel_val = 10;", spec);
+    FlatFieldShape shape = smallShape();
+    shape.cornerLevel = 0.15;
+    prepare("proc.min_pixel_val = 10;", shape);
     auto result = calibrate();
     EXPECT_EQ(result.status, 1);
     EXPECT_TRUE(std::regex_search(

@@ -34,17 +34,17 @@ float f32At(const std::string& bytes, std::size_t at) {
     return value;
 }
 
-FlatFieldSpec smallSpec() {
-    FlatFieldSpec spec;
-    spec.width = 64;
-    spec.height = 48;
-    return spec;
+FlatFieldShape smallShape() {
+    FlatFieldShape shape;
+    shape.width = 64;
+    shape.height = 48;
+    return shape;
 }
 
 // --- Levels -------------------------------------------------------------------
 
 TEST(FlatFieldLevels, GreenFallsFromTheCentreLevelToTheCornerLevel) {
-    const FlatField field = makeFlatField(smallSpec());
+    const FlatField field = makeFlatField(smallShape());
     const double cx = 31.5, cy = 23.5;
     EXPECT_NEAR(field.level(1, cx, cy), 0.8, 1e-12);
     for (auto [x, y] : {std::pair{0, 0}, {63, 0}, {0, 47}, {63, 47}})
@@ -59,9 +59,9 @@ TEST(FlatFieldLevels, GreenFallsFromTheCentreLevelToTheCornerLevel) {
 }
 
 TEST(FlatFieldLevels, RedFallsAndBlueRisesAgainstGreenTowardsTheCorners) {
-    FlatFieldSpec spec = smallSpec();
-    spec.colourShading = 0.1;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.colourShading = 0.1;
+    const FlatField field = makeFlatField(shape);
     const double cx = 31.5, cy = 23.5;
     EXPECT_NEAR(field.level(0, cx, cy) / field.level(1, cx, cy), 0.55, 1e-12);
     EXPECT_NEAR(field.level(3, cx, cy) / field.level(1, cx, cy), 0.65, 1e-12);
@@ -70,10 +70,10 @@ TEST(FlatFieldLevels, RedFallsAndBlueRisesAgainstGreenTowardsTheCorners) {
 }
 
 TEST(FlatFieldLevels, BrightestGreenSitsAtAnOffCentreOpticalCentre) {
-    FlatFieldSpec spec = smallSpec();
-    spec.centerX = 0.25;
-    spec.centerY = 0.75;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.centerX = 0.25;
+    shape.centerY = 0.75;
+    const FlatField field = makeFlatField(shape);
     const double cx = 0.25 * 63, cy = 0.75 * 47;
     EXPECT_NEAR(field.level(1, cx, cy), 0.8, 1e-12);
     EXPECT_LT(field.level(1, cx + 1, cy), 0.8);
@@ -81,10 +81,10 @@ TEST(FlatFieldLevels, BrightestGreenSitsAtAnOffCentreOpticalCentre) {
 }
 
 TEST(FlatFieldLevels, NoiselessSamplesAreTheRoundedLevelPlusTheBlackLevel) {
-    FlatFieldSpec spec = smallSpec();
-    spec.bits = 12;
-    spec.blackLevel = 64;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.bits = 12;
+    shape.blackLevel = 64;
+    const FlatField field = makeFlatField(shape);
     ASSERT_EQ(field.samples.size(), 64u * 48u);
     for (int y = 0; y < 48; ++y)
         for (int x = 0; x < 64; ++x) {
@@ -96,30 +96,30 @@ TEST(FlatFieldLevels, NoiselessSamplesAreTheRoundedLevelPlusTheBlackLevel) {
 }
 
 TEST(FlatFieldLevels, SamplesClipToTheBitDepth) {
-    FlatFieldSpec spec = smallSpec();
-    spec.bits = 1;
-    spec.centerLevel = 3.0;
-    spec.cornerLevel = 1.0;
-    for (std::uint16_t s : makeFlatField(spec).samples)
+    FlatFieldShape shape = smallShape();
+    shape.bits = 1;
+    shape.centerLevel = 3.0;
+    shape.cornerLevel = 1.0;
+    for (std::uint16_t s : makeFlatField(shape).samples)
         ASSERT_EQ(s, 1);
-    spec.bits = 16;
-    spec.centerLevel = 0.5;
-    spec.blackLevel = -40000;
-    for (std::uint16_t s : makeFlatField(spec).samples)
+    shape.bits = 16;
+    shape.centerLevel = 0.5;
+    shape.blackLevel = -40000;
+    for (std::uint16_t s : makeFlatField(shape).samples)
         ASSERT_EQ(s, 0);
 }
 
 TEST(FlatFieldLevels, NoiseHasTheRequestedSpreadAroundTheLevel) {
-    FlatFieldSpec spec = smallSpec();
-    spec.width = spec.height = 256;
-    spec.bits = 14;
-    spec.cornerLevel = 1.0;
-    spec.colourShading = 0.0;
-    spec.centerLevel = 0.5;
-    for (double& level : spec.channelLevel)
+    FlatFieldShape shape = smallShape();
+    shape.width = shape.height = 256;
+    shape.bits = 14;
+    shape.cornerLevel = 1.0;
+    shape.colourShading = 0.0;
+    shape.centerLevel = 0.5;
+    for (double& level : shape.channelLevel)
         level = 1.0;
-    spec.noise = 0.01;
-    const FlatField field = makeFlatField(spec);
+    shape.noise = 0.01;
+    const FlatField field = makeFlatField(shape);
     double sum = 0, squares = 0;
     for (float v : field.normalized()) {
         sum += v;
@@ -132,9 +132,9 @@ TEST(FlatFieldLevels, NoiseHasTheRequestedSpreadAroundTheLevel) {
 }
 
 TEST(FlatFieldLevels, DefectsAreDistinctHotAndDeadPixels) {
-    FlatFieldSpec spec = smallSpec();
-    spec.defects = 7;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.defects = 7;
+    const FlatField field = makeFlatField(shape);
     EXPECT_EQ(field.hotPixels.size(), 4u);
     EXPECT_EQ(field.deadPixels.size(), 3u);
     std::set<std::size_t> positions;
@@ -148,15 +148,15 @@ TEST(FlatFieldLevels, DefectsAreDistinctHotAndDeadPixels) {
     }
     EXPECT_EQ(positions.size(), 7u);
 
-    spec.width = spec.height = 2;
-    spec.defects = 100;  // more than there are pixels: every pixel, once
-    const FlatField tiny = makeFlatField(spec);
+    shape.width = shape.height = 2;
+    shape.defects = 100;  // more than there are pixels: every pixel, once
+    const FlatField tiny = makeFlatField(shape);
     EXPECT_EQ(tiny.hotPixels.size() + tiny.deadPixels.size(), 4u);
 }
 
 TEST(FlatFieldLevels, NormalizedMasksToTheBitDepth) {
-    FlatFieldSpec spec = smallSpec();
-    FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    FlatField field = makeFlatField(shape);
     field.samples[0] = 0xFFFF;
     field.samples[1] = 0;
     field.samples[2] = 0x0400 | 511;
@@ -166,22 +166,22 @@ TEST(FlatFieldLevels, NormalizedMasksToTheBitDepth) {
     EXPECT_EQ(values[2], 511.0f / 1023.0f);
 }
 
-TEST(FlatFieldLevels, RefusesSpecsItCannotRender) {
+TEST(FlatFieldLevels, RefusesShapesItCannotRender) {
     const auto refused = [](auto change) {
-        FlatFieldSpec spec = smallSpec();
-        change(spec);
-        EXPECT_THROW(makeFlatField(spec), std::invalid_argument);
+        FlatFieldShape shape = smallShape();
+        change(shape);
+        EXPECT_THROW(makeFlatField(shape), std::invalid_argument);
     };
-    refused([](FlatFieldSpec& s) { s.width = 0; });
-    refused([](FlatFieldSpec& s) { s.height = -3; });
-    refused([](FlatFieldSpec& s) { s.width = s.height = 1 << 15; });
-    refused([](FlatFieldSpec& s) { s.bits = 0; });
-    refused([](FlatFieldSpec& s) { s.bits = 17; });
-    refused([](FlatFieldSpec& s) { s.cfa = 0x12340000; });
-    refused([](FlatFieldSpec& s) { s.cornerLevel = 0.0; });
-    refused([](FlatFieldSpec& s) { s.cornerLevel = 1.5; });
-    refused([](FlatFieldSpec& s) { s.noise = -0.1; });
-    refused([](FlatFieldSpec& s) { s.defects = -1; });
+    refused([](FlatFieldShape& s) { s.width = 0; });
+    refused([](FlatFieldShape& s) { s.height = -3; });
+    refused([](FlatFieldShape& s) { s.width = s.height = 1 << 15; });
+    refused([](FlatFieldShape& s) { s.bits = 0; });
+    refused([](FlatFieldShape& s) { s.bits = 17; });
+    refused([](FlatFieldShape& s) { s.cfa = 0x12340000; });
+    refused([](FlatFieldShape& s) { s.cornerLevel = 0.0; });
+    refused([](FlatFieldShape& s) { s.cornerLevel = 1.5; });
+    refused([](FlatFieldShape& s) { s.noise = -0.1; });
+    refused([](FlatFieldShape& s) { s.defects = -1; });
 }
 
 // --- Bayer orders -------------------------------------------------------------
@@ -197,15 +197,15 @@ class FlatFieldOrder : public ::testing::TestWithParam<OrderCase> {};
 
 TEST_P(FlatFieldOrder, MapsPixelsToChannelsAndCodes) {
     const OrderCase& order = GetParam();
-    FlatFieldSpec spec = smallSpec();
-    spec.cfa = order.cfa;
-    spec.cornerLevel = 1.0;
-    spec.colourShading = 0.0;
-    spec.channelLevel[0] = 0.2;
-    spec.channelLevel[1] = 0.4;
-    spec.channelLevel[2] = 0.6;
-    spec.channelLevel[3] = 0.8;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.cfa = order.cfa;
+    shape.cornerLevel = 1.0;
+    shape.colourShading = 0.0;
+    shape.channelLevel[0] = 0.2;
+    shape.channelLevel[1] = 0.4;
+    shape.channelLevel[2] = 0.6;
+    shape.channelLevel[3] = 0.8;
+    const FlatField field = makeFlatField(shape);
     const int at[4][2] = {{0, 0}, {1, 0}, {0, 1}, {1, 1}};
     for (int i = 0; i < 4; ++i) {
         for (int shift = 0; shift < 4; shift += 2) {  // the pattern repeats every two pixels
@@ -238,14 +238,14 @@ TEST(FlatFieldOrderNames, UnknownPatternsHaveNoCodeOrName) {
 // --- Determinism --------------------------------------------------------------
 
 TEST(FlatFieldSeed, SameSeedGivesTheSameImageAndAnotherSeedDoesNot) {
-    FlatFieldSpec spec = smallSpec();
-    spec.noise = 0.01;
-    spec.defects = 4;
-    const FlatField first = makeFlatField(spec);
-    EXPECT_EQ(makeFlatField(spec).samples, first.samples);
-    EXPECT_EQ(makeFlatField(spec).hotPixels, first.hotPixels);
-    spec.seed = 2;
-    const FlatField other = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.noise = 0.01;
+    shape.defects = 4;
+    const FlatField first = makeFlatField(shape);
+    EXPECT_EQ(makeFlatField(shape).samples, first.samples);
+    EXPECT_EQ(makeFlatField(shape).hotPixels, first.hotPixels);
+    shape.seed = 2;
+    const FlatField other = makeFlatField(shape);
     EXPECT_NE(other.samples, first.samples);
     EXPECT_NE(other.hotPixels, first.hotPixels);
 }
@@ -263,12 +263,12 @@ CaptureInfo sampleCapture() {
 }
 
 TEST(RawFileBuilders, Kqraw2HoldsHeaderPixelsCaptureAndSensorInfoBlocks) {
-    FlatFieldSpec spec = smallSpec();
-    spec.width = 4;
-    spec.height = 2;
-    spec.cfa = 0x43320000;  // BGGR
-    spec.bits = 12;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.width = 4;
+    shape.height = 2;
+    shape.cfa = 0x43320000;  // BGGR
+    shape.bits = 12;
+    const FlatField field = makeFlatField(shape);
     const std::string bytes = kqraw2FileBytes(field, sampleCapture());
 
     const std::size_t pixelsAt = 72, captureAt = pixelsAt + 36 + 8 + 16;
@@ -313,11 +313,11 @@ TEST(RawFileBuilders, Kqraw2HoldsHeaderPixelsCaptureAndSensorInfoBlocks) {
 }
 
 TEST(RawFileBuilders, FixedHeaderFileCarriesCaptureDataAtItsOffsets) {
-    FlatFieldSpec spec = smallSpec();
-    spec.width = 3;
-    spec.height = 2;
-    spec.cfa = 0x32430000;  // GRBG
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.width = 3;
+    shape.height = 2;
+    shape.cfa = 0x32430000;  // GRBG
+    const FlatField field = makeFlatField(shape);
     const std::string bytes = fixedHeaderFileBytes(field, sampleCapture());
     ASSERT_EQ(bytes.size(), 298672u + 12u);
     EXPECT_EQ(u32At(bytes, 0), 1u);
@@ -341,7 +341,7 @@ TEST(RawFileBuilders, FixedHeaderFileCarriesCaptureDataAtItsOffsets) {
 }
 
 TEST(RawFileBuilders, FixedHeaderRefusesSerialNumbersThatAreNotHexBytes) {
-    const FlatField field = makeFlatField(smallSpec());
+    const FlatField field = makeFlatField(smallShape());
     for (const char* serial : {"abc", "0g", "00112233445566778899aabbccddeeff00"}) {
         CaptureInfo capture;
         capture.serialNumber = serial;
@@ -354,19 +354,19 @@ TEST(RawFileBuilders, FixedHeaderRefusesSerialNumbersThatAreNotHexBytes) {
 }
 
 TEST(RawFileBuilders, HeaderlessFileIsLittleEndianSamplesOnly) {
-    FlatFieldSpec spec = smallSpec();
-    spec.width = 2;
-    spec.height = 1;
-    FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.width = 2;
+    shape.height = 1;
+    FlatField field = makeFlatField(shape);
     field.samples = {0x0102, 0xA0B0};
     EXPECT_EQ(headerlessFileBytes(field), std::string("\x02\x01\xB0\xA0", 4));
 }
 
 TEST(RawFileBuilders, DetailsTextDescribesTheHeaderlessFile) {
-    FlatFieldSpec spec = smallSpec();
-    spec.cfa = 0x34230000;
-    spec.bits = 12;
-    const FlatField field = makeFlatField(spec);
+    FlatFieldShape shape = smallShape();
+    shape.cfa = 0x34230000;
+    shape.bits = 12;
+    const FlatField field = makeFlatField(shape);
     EXPECT_EQ(headerlessDetailsText(field, sampleCapture()),
               "image.width = 64\n"
               "image.height = 48\n"
@@ -415,14 +415,14 @@ int runFlatgen(const std::string& arguments) {
 }
 
 // The parameters that examples/README.md gives for examples/flatfield.kqraw.
-FlatFieldSpec exampleSpec() {
-    FlatFieldSpec spec;
-    spec.cornerLevel = 0.55;
-    spec.colourShading = 0.05;
-    spec.noise = 0.003;
-    spec.defects = 6;
-    spec.seed = 2026;
-    return spec;
+FlatFieldShape exampleShape() {
+    FlatFieldShape shape;
+    shape.cornerLevel = 0.55;
+    shape.colourShading = 0.05;
+    shape.noise = 0.003;
+    shape.defects = 6;
+    shape.seed = 2026;
+    return shape;
 }
 
 CaptureInfo exampleCapture() {
@@ -433,7 +433,7 @@ CaptureInfo exampleCapture() {
 
 TEST(Flatgen, WritesEachFormatLikeTheBuilders) {
     TempDir dir;
-    const FlatField field = makeFlatField(exampleSpec());
+    const FlatField field = makeFlatField(exampleShape());
     const CaptureInfo capture = exampleCapture();
     const std::string common = "--corner 0.55 --colour-shading 0.05 --noise 0.003 --defects 6 "
                                "--seed 2026 --serial 0123456789abcdef0123456789abcdef ";
@@ -460,7 +460,7 @@ TEST(Flatgen, RejectsBadArgumentsWithoutWritingAnything) {
 
 TEST(ExampleFiles, FlatFieldIsWhatTheDocumentedCommandGenerates) {
     const std::string bytes = readFile(kSourceDir + "/examples/flatfield.kqraw");
-    EXPECT_TRUE(bytes == kqraw2FileBytes(makeFlatField(exampleSpec()), exampleCapture()))
+    EXPECT_TRUE(bytes == kqraw2FileBytes(makeFlatField(exampleShape()), exampleCapture()))
         << "examples/flatfield.kqraw differs from the command in examples/README.md";
 }
 
@@ -481,7 +481,7 @@ std::map<std::string, std::string> exampleSettings() {
 // The preparation the tool applies before its checks: each Bayer plane is
 // median-filtered 3 x 3 (mirrored at the borders) and decimated by 4.
 std::pair<int, int> preparedRange(const FlatField& field) {
-    const int width = field.spec.width / 2, height = field.spec.height / 2;
+    const int width = field.shape.width / 2, height = field.shape.height / 2;
     const auto mirror = [](int i, int n) { return i < 0 ? -1 - i : i >= n ? 2 * n - 1 - i : i; };
     int low = 1 << 16, high = -1;
     for (int plane = 0; plane < 4; ++plane) {
@@ -493,7 +493,7 @@ std::pair<int, int> preparedRange(const FlatField& field) {
                     for (int dx = -1; dx <= 1; ++dx) {
                         const int px = 2 * mirror(x + dx, width) + plane % 2;
                         const int py = 2 * mirror(y + dy, height) + plane / 2;
-                        window[n++] = field.samples[std::size_t(py) * std::size_t(field.spec.width) +
+                        window[n++] = field.samples[std::size_t(py) * std::size_t(field.shape.width) +
                                                     std::size_t(px)];
                     }
                 std::nth_element(window, window + 4, window + 9);
@@ -515,7 +515,7 @@ TEST(ExampleFiles, FlatFieldPassesTheExampleConfigurationChecks) {
     const int peak = std::stoi(settings.at("proc.peak_pixel_min"));
     EXPECT_TRUE(0 <= minimum && minimum <= maximum && maximum <= 1023 && peak <= maximum);
 
-    const FlatField field = makeFlatField(exampleSpec());
+    const FlatField field = makeFlatField(exampleShape());
     const auto [low, high] = preparedRange(field);
     EXPECT_GE(low, minimum);
     EXPECT_LE(high, maximum);

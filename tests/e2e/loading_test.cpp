@@ -14,8 +14,8 @@ constexpr int exitStatusOf(int code) {
 class Loading : public ToolRun {
 protected:
     // Writes "flat.raw" and its details file "details.txt".
-    void prepareHeaderless(const std::string& details, const FlatFieldSpec& spec = smallSpec()) {
-        prepare("", spec);
+    void prepareHeaderless(const std::string& details, const FlatFieldShape& shape = smallShape()) {
+        prepare("", shape);
         write("flat.raw", testing_support::headerlessFileBytes(field_));
         write("details.txt", details);
     }
@@ -45,7 +45,7 @@ TEST_F(Loading, ExposureAndGainsComeFromTheCaptureBlock) {
     capture.gains[1] = 1.0f;
     capture.gains[2] = 1.0f;
     capture.gains[3] = 2.0f;
-    prepare("", smallSpec(), capture);
+    prepare("", smallShape(), capture);
     const auto result = calibrate();
     EXPECT_TRUE(hasLine(result.out, "Exposure time = 12.5")) << result.out;
     EXPECT_TRUE(hasLine(result.out, "Sensor gain = { 1.25, 1, 1, 2 }")) << result.out;
@@ -228,9 +228,9 @@ TEST_F(Loading, HeaderlessMissingFilesAreReported) {
 TEST_F(Loading, HeaderlessBitDepthComesFromTheConfigurationWhenNotGiven) {
     // A 12-bit dump read at the default of 10 bits is masked; with
     // shared.bit_res = 12 it keeps its range.
-    FlatFieldSpec spec = smallSpec();
-    spec.bits = 12;
-    prepareHeaderless(details(), spec);
+    FlatFieldShape shape = smallShape();
+    shape.bits = 12;
+    prepareHeaderless(details(), shape);
     write("lsc.cfg", "shared.bit_res = 12; proc.max_pixel_val = 4095; proc.peak_pixel_min = 2000; "
                      "proc.min_pixel_val = 200;");
     const auto result = calibrateHeaderless();

@@ -18,7 +18,7 @@
 namespace {
 
 using testing_support::FlatField;
-using testing_support::FlatFieldSpec;
+using testing_support::FlatFieldShape;
 
 // 3 x 3 median over the pixels of the same colour (two pixels apart), as the
 // image preparation does before the fit sees the image; it removes the
@@ -73,20 +73,20 @@ class CorrectedFlatField : public ::testing::TestWithParam<std::tuple<std::uint3
 
 TEST_P(CorrectedFlatField, EveryChannelIsFlatWithinOnePercent) {
     const auto [cfa, bits, blackLevel] = GetParam();
-    FlatFieldSpec spec;
-    spec.width = 640;
-    spec.height = 480;
-    spec.cfa = cfa;
-    spec.bits = bits;
-    spec.cornerLevel = 0.5;
-    spec.colourShading = 0.08;
-    spec.noise = 0.002; // about 2 codes at 10 bits
-    spec.defects = 200;
-    spec.blackLevel = blackLevel;
-    spec.seed = 7 + bits;
-    const FlatField field = testing_support::makeFlatField(spec);
+    FlatFieldShape shape;
+    shape.width = 640;
+    shape.height = 480;
+    shape.cfa = cfa;
+    shape.bits = bits;
+    shape.cornerLevel = 0.5;
+    shape.colourShading = 0.08;
+    shape.noise = 0.002; // about 2 codes at 10 bits
+    shape.defects = 200;
+    shape.blackLevel = blackLevel;
+    shape.seed = 7 + bits;
+    const FlatField field = testing_support::makeFlatField(shape);
     const std::vector<float> prepared =
-        sameColourMedian(field.normalized(), spec.width, spec.height);
+        sameColourMedian(field.normalized(), shape.width, shape.height);
 
     ProcessingContext context;
     context.blackLevel = static_cast<float>(blackLevel) / static_cast<float>(field.fullScale());
@@ -94,8 +94,8 @@ TEST_P(CorrectedFlatField, EveryChannelIsFlatWithinOnePercent) {
     context.procSamplingFactor = 4;
     context.quiet = true;
     lsc_test::makeImage(
-        context, spec.width, spec.height, cfa,
-        [&](int x, int y) { return prepared[static_cast<std::size_t>(y) * spec.width + x]; },
+        context, shape.width, shape.height, cfa,
+        [&](int x, int y) { return prepared[static_cast<std::size_t>(y) * shape.width + x]; },
         static_cast<std::uint16_t>(bits));
     std::ostringstream messages;
     collectSamples(context, messages);

@@ -75,9 +75,9 @@ private:
 struct Geometry {
     double cx, cy, halfDiagonal;
 
-    explicit Geometry(const FlatFieldSpec& spec)
-        : cx(spec.centerX * (spec.width - 1)), cy(spec.centerY * (spec.height - 1)),
-          halfDiagonal(0.5 * std::hypot(spec.width - 1.0, spec.height - 1.0)) {}
+    explicit Geometry(const FlatFieldShape& shape)
+        : cx(shape.centerX * (shape.width - 1)), cy(shape.centerY * (shape.height - 1)),
+          halfDiagonal(0.5 * std::hypot(shape.width - 1.0, shape.height - 1.0)) {}
 
     double radiusSquared(double x, double y) const {
         if (halfDiagonal <= 0.0)
@@ -95,36 +95,36 @@ double vignetting(double cornerLevel, double r2) {
     return 1.0 / (t * t);
 }
 
-double shadedLevel(const FlatFieldSpec& spec, int channel, double r2) {
+double shadedLevel(const FlatFieldShape& shape, int channel, double r2) {
     double colour = 1.0;
     if (channel == 0)
-        colour = 1.0 - spec.colourShading * r2;
+        colour = 1.0 - shape.colourShading * r2;
     else if (channel == 3)
-        colour = 1.0 + spec.colourShading * r2;
-    return spec.centerLevel * spec.channelLevel[channel] * colour *
-           vignetting(spec.cornerLevel, r2);
+        colour = 1.0 + shape.colourShading * r2;
+    return shape.centerLevel * shape.channelLevel[channel] * colour *
+           vignetting(shape.cornerLevel, r2);
 }
 
 // Images beyond this are a mistake in a test, not a capture.
 constexpr std::uint64_t kMaxPixels = std::uint64_t{1} << 28;
 
-void validate(const FlatFieldSpec& spec) {
-    if (spec.width <= 0 || spec.height <= 0 ||
-        std::uint64_t(spec.width) * std::uint64_t(spec.height) > kMaxPixels)
+void validate(const FlatFieldShape& shape) {
+    if (shape.width <= 0 || shape.height <= 0 ||
+        std::uint64_t(shape.width) * std::uint64_t(shape.height) > kMaxPixels)
         throw std::invalid_argument("flat field: width and height must be positive and sane");
-    if (spec.bits < 1 || spec.bits > 16)
+    if (shape.bits < 1 || shape.bits > 16)
         throw std::invalid_argument("flat field: bits must be 1..16");
-    if (!findOrder(spec.cfa))
+    if (!findOrder(shape.cfa))
         throw std::invalid_argument("flat field: cfa is not one of the four Bayer orders");
-    if (!(spec.cornerLevel > 0.0 && spec.cornerLevel <= 1.0))
+    if (!(shape.cornerLevel > 0.0 && shape.cornerLevel <= 1.0))
         throw std::invalid_argument("flat field: corner level must lie in (0, 1]");
-    if (!(spec.noise >= 0.0) || spec.defects < 0)
+    if (!(shape.noise >= 0.0) || shape.defects < 0)
         throw std::invalid_argument("flat field: noise and defects must not be negative");
 }
 
 void placeDefects(FlatField& field, GaussianSource& random) {
     const std::size_t count = field.samples.size();
-    const std::size_t wanted = std::min<std::size_t>(std::size_t(field.spec.defects), count);
+    const std::size_t wanted = std::min<std::size_t>(std::size_t(field.shape.defects), count);
     std::vector<bool> taken(count, false);
     for (std::size_t i = 0; i < wanted; ++i) {
         std::size_t at;
@@ -194,16 +194,16 @@ std::string serialBytes(const std::string& text) {
 } // namespace
 
 std::uint32_t FlatField::fullScale() const {
-    return (std::uint32_t{1} << spec.bits) - 1;
+    return (std::uint32_t{1} << shape.bits) - 1;
 }
 
 int FlatField::channelAt(int x, int y) const {
-    const BayerOrder* order = findOrder(spec.cfa);
+    const BayerOrder* order = findOrder(shape.cfa);
     return channelOf(order ? order->phase : 0, x, y);
 }
 
 double FlatField::level(int channel, double x, double y) const {
-    return shadedLevel(spec, channel, Geometry(spec).radiusSquared(x, y));
+    return shadedLevel(shape, channel, Geometry(shape).radiusSquared(x, y));
 }
 
 std::vector<float> FlatField::normalized() const {
@@ -214,22 +214,22 @@ std::vector<float> FlatField::normalized() const {
     return values;
 }
 
-FlatField makeFlatField(const FlatFieldSpec& spec) {
-    validate(spec);
+FlatField makeFlatField(const FlatFieldShape& shape) {
+    validate(shape);
     FlatField field;
-    field.spec = spec;
-    field.samples.resize(std::size_t(spec.width) * std::size_t(spec.height));
-    const Geometry geometry(spec);
+    field.shape = shape;
+    field.samples.resize(std::size_t(shape.width) * std::size_t(shape.height));
+    const Geometry geometry(shape);
     const double scale = field.fullScale();
-    GaussianSource random(spec.seed);
-    const int phase = findOrder(spec.cfa)->phase;
+    GaussianSource random(shape.seed);
+    const int phase = findOrder(shape.cfa)->phase;
     std::size_t at = 0;
-    for (int y = 0; y < spec.height; ++y) {
-        for (int x = 0; x < spec.width; ++x) {
-            double value = shadedLevel(spec, channelOf(phase, x, y), geometry.radiusSquared(x, y));
-            if (spec.noise > 0.0)
-                value += spec.noise * random.next();
-            value = std::floor(value * scale + 0.5) + spec.blackLevel;
+    for (int y = 0; y < shape.height; ++y) {
+        for (int x = 0; x < shape.width; ++x) {
+            double value = shadedLevel(shape, channelOf(phase, x, y), geometry.radiusSquared(x, y));
+            if (shape.noise > 0.0)
+                value += shape.noise * random.next();
+            value = std::floor(value * scale + 0.5) + shape.blackLevel;
             field.samples[at++] = std::uint16_t(std::clamp(value, 0.0, scale));
         }
     }
@@ -239,8 +239,8 @@ FlatField makeFlatField(const FlatFieldSpec& spec) {
 
 std::string kqraw2FileBytes(const FlatField& field, const CaptureInfo& capture) {
     return KqRawBuilder()
-        .header(std::uint32_t(field.spec.width), std::uint32_t(field.spec.height),
-                bayerCodeOf(field.spec.cfa), std::uint32_t(field.spec.bits))
+        .header(std::uint32_t(field.shape.width), std::uint32_t(field.shape.height),
+                bayerCodeOf(field.shape.cfa), std::uint32_t(field.shape.bits))
         .pixels(field.samples)
         .capture(capture.exposureTime, capture.gains)
         .sensorInfo("", capture.serialNumber, "")
@@ -251,9 +251,9 @@ std::string fixedHeaderFileBytes(const FlatField& field, const CaptureInfo& capt
     std::string bytes(kFixedHeaderSize, '\0');
     putU32(bytes, 0, 1);  // format version
     putU32(bytes, 4, 1);  // header revision: exposure time as float at +36
-    putU32(bytes, 8, std::uint32_t(field.spec.width));
-    putU32(bytes, 12, std::uint32_t(field.spec.height));
-    putU32(bytes, 16, bayerCodeOf(field.spec.cfa));
+    putU32(bytes, 8, std::uint32_t(field.shape.width));
+    putU32(bytes, 12, std::uint32_t(field.shape.height));
+    putU32(bytes, 16, bayerCodeOf(field.shape.cfa));
     putU32(bytes, 24, std::uint32_t(capture.sensorGuid));
     putU32(bytes, 28, std::uint32_t(capture.sensorGuid >> 32));
     putU32(bytes, 32, std::uint32_t(std::llround(double(capture.exposureTime) * 65536.0)));
@@ -278,10 +278,10 @@ std::string headerlessDetailsText(const FlatField& field, const CaptureInfo& cap
     std::ostringstream text;
     text.imbue(std::locale::classic());
     text.precision(9);
-    text << "image.width = " << field.spec.width << "\n"
-         << "image.height = " << field.spec.height << "\n"
-         << "image.bit_res = " << field.spec.bits << "\n"
-         << "image.bayer_order = " << bayerOrderName(field.spec.cfa) << "\n"
+    text << "image.width = " << field.shape.width << "\n"
+         << "image.height = " << field.shape.height << "\n"
+         << "image.bit_res = " << field.shape.bits << "\n"
+         << "image.bayer_order = " << bayerOrderName(field.shape.cfa) << "\n"
          << "image.exp_time = " << capture.exposureTime << "\n"
          << "image.gain = " << capture.gains[0] << "\n";
     if (capture.sensorGuid != 0)

@@ -12,7 +12,7 @@
 
 namespace testing_support {
 
-struct FlatFieldSpec {
+struct FlatFieldShape {
     int width = 640;
     int height = 480;
     int bits = 10;                          // sample bit depth, 1..16
@@ -29,7 +29,7 @@ struct FlatFieldSpec {
 };
 
 struct FlatField {
-    FlatFieldSpec spec;
+    FlatFieldShape shape;
     std::vector<std::uint16_t> samples;     // width * height, row-major
     // Sample indices (y * width + x) of the defects: hot ones at full scale, dead ones at 0.
     std::vector<std::size_t> hotPixels, deadPixels;
@@ -45,8 +45,8 @@ struct FlatField {
     std::vector<float> normalized() const;
 };
 
-// Throws std::invalid_argument for a spec it cannot render (size, bits, cfa, levels).
-FlatField makeFlatField(const FlatFieldSpec& spec);
+// Throws std::invalid_argument for a shape it cannot render (size, bits, cfa, levels).
+FlatField makeFlatField(const FlatFieldShape& shape);
 
 // Capture data that the raw files carry beside the pixels.
 struct CaptureInfo {
