@@ -5,6 +5,7 @@
 #include "blob/blob_layout.h"
 #include "blob/blob_messages.h"
 #include "config/value_text.h"
+#include "image/hex_text.h"
 
 namespace blob {
 
@@ -13,16 +14,6 @@ namespace {
 [[noreturn]] void refuse(const config_node& config, const config_node& node,
                          const std::string& why) {
     throw std::runtime_error(msg::kValueFor + config_relative_path(config, node) + why);
-}
-
-int hexDigit(char c) {
-    if (c >= '0' && c <= '9')
-        return c - '0';
-    if (c >= 'a' && c <= 'f')
-        return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F')
-        return c - 'A' + 10;
-    return -1;
 }
 
 // Whole-text decimal with optional sign; false when malformed. Magnitudes
@@ -94,8 +85,8 @@ std::vector<std::uint8_t> serialBytes(const config_node& config, const config_no
     std::vector<std::uint8_t> bytes;
     bytes.reserve(text.size() / 2);
     for (std::size_t i = 0; i < text.size(); i += 2) {
-        const int high = hexDigit(text[i]);
-        const int low = hexDigit(text[i + 1]);
+        const int high = img::hexDigit(text[i]);
+        const int low = img::hexDigit(text[i + 1]);
         if (high < 0 || low < 0)
             refuse(config, node, msg::kInvalidSerial);
         bytes.push_back(static_cast<std::uint8_t>(high * 16 + low));

@@ -2,6 +2,7 @@
 
 #include "config/strip_comments.h"
 #include "driver/driver_messages.h"
+#include "image/hex_text.h"
 #include "image/image_buffer.h"
 #include "lsc/apan_exception.h"
 
@@ -44,7 +45,7 @@ po::options_description detailsOptions() {
 
 bool isHex(const std::string& text) {
     for (char c : text)
-        if (!std::isxdigit(static_cast<unsigned char>(c)))
+        if (img::hexDigit(c) < 0)
             return false;
     return true;
 }

@@ -3,9 +3,8 @@
 #include <cstring>
 
 namespace img {
-namespace {
 
-int hexDigit(char c) {
+int hexDigit(char c) noexcept {
     if (c >= '0' && c <= '9')
         return c - '0';
     if (c >= 'a' && c <= 'f')
@@ -14,8 +13,6 @@ int hexDigit(char c) {
         return c - 'A' + 10;
     return -1;
 }
-
-} // namespace
 
 std::uint64_t parseHex64(const char* text) noexcept {
     if (!text)

@@ -7,6 +7,9 @@
 
 namespace img {
 
+// The value of one hexadecimal digit (either case), -1 for any other character.
+int hexDigit(char c) noexcept;
+
 // Reads text as a hexadecimal number as scanf's %llx does: blanks, an
 // optional 0x, then hex digits up to the first other character. No digits
 // give 0; a value beyond 64 bits gives the largest 64-bit value.

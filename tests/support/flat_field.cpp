@@ -9,6 +9,8 @@
 #include <sstream>
 #include <stdexcept>
 
+#include "image/hex_text.h"
+
 namespace testing_support {
 
 namespace {
@@ -168,22 +170,12 @@ void appendSamples(std::string& bytes, const std::vector<std::uint16_t>& samples
     }
 }
 
-int hexDigit(char c) {
-    if (c >= '0' && c <= '9')
-        return c - '0';
-    if (c >= 'a' && c <= 'f')
-        return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F')
-        return c - 'A' + 10;
-    return -1;
-}
-
 std::string serialBytes(const std::string& text) {
     if (text.size() % 2 != 0 || text.size() > 32)
         throw std::invalid_argument("serial number: up to 32 hexadecimal digits, even count");
     std::string bytes;
     for (std::size_t i = 0; i < text.size(); i += 2) {
-        const int high = hexDigit(text[i]), low = hexDigit(text[i + 1]);
+        const int high = img::hexDigit(text[i]), low = img::hexDigit(text[i + 1]);
         if (high < 0 || low < 0)
             throw std::invalid_argument("serial number: not hexadecimal: " + text);
         bytes += char(high * 16 + low);
