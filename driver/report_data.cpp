@@ -11,20 +11,6 @@
 
 namespace {
 
-// Patch index and local coordinate along one axis, as the correction picks them.
-struct AxisPosition {
-    std::uint32_t patch;
-    float local;
-};
-
-AxisPosition axisPosition(std::uint32_t p, const std::uint32_t (&breaks)[4]) {
-    if (p < breaks[1])
-        return {0, static_cast<float>(p) / static_cast<float>(breaks[1])};
-    if (p < breaks[2])
-        return {1, static_cast<float>(p - breaks[1]) / static_cast<float>(breaks[2] - breaks[1])};
-    return {2, static_cast<float>(p - breaks[2]) / static_cast<float>(breaks[3] - breaks[2])};
-}
-
 // Pixel at fraction (index + offset) / count of a size, inside 0..size - 1.
 std::uint32_t pixelAt(std::uint64_t index2, std::uint64_t count2, std::uint32_t size) {
     const std::uint64_t p = index2 * size / count2;

@@ -10,25 +10,6 @@
 #include "lsc/patch_geometry.h"
 #include "lsc/working_image.h"
 
-namespace {
-
-// Patch index and local coordinate of a block position along one axis, with
-// breakpoints (0, first, second, size).
-struct AxisPosition {
-    std::uint32_t patch;
-    float local;
-};
-
-AxisPosition axisPosition(std::uint32_t p, const std::uint32_t breaks[4]) {
-    if (p < breaks[1])
-        return {0, static_cast<float>(p) / static_cast<float>(breaks[1])};
-    if (p < breaks[2])
-        return {1, static_cast<float>(p - breaks[1]) / static_cast<float>(breaks[2] - breaks[1])};
-    return {2, static_cast<float>(p - breaks[2]) / static_cast<float>(breaks[3] - breaks[2])};
-}
-
-} // namespace
-
 void applyLensShading(ProcessingContext& context) {
     const WorkingImage in = workingImage(context.image);
     const std::uint64_t step = context.applyStep;

@@ -14,6 +14,21 @@ struct PatchBreakpoints {
 PatchBreakpoints patchBreakpoints(std::uint32_t width, std::uint32_t height, double leftFraction,
                                   double centerFraction, double topFraction, double middleFraction);
 
+// Patch index (0..2) and local coordinate (0..1) of position p along one
+// axis with breakpoints (0, first, second, size), as the correction picks them.
+struct AxisPosition {
+    std::uint32_t patch;
+    float local;
+};
+// Inline: the correction calls it once a block.
+inline AxisPosition axisPosition(std::uint32_t p, const std::uint32_t (&breaks)[4]) {
+    if (p < breaks[1])
+        return {0, static_cast<float>(p) / static_cast<float>(breaks[1])};
+    if (p < breaks[2])
+        return {1, static_cast<float>(p - breaks[1]) / static_cast<float>(breaks[2] - breaks[1])};
+    return {2, static_cast<float>(p - breaks[2]) / static_cast<float>(breaks[3] - breaks[2])};
+}
+
 // Patch sizes as the register file exports them: the outer patches round, the
 // central ones truncate, the far ones take the rest (signed: a bad geometry
 // can leave them zero or negative).
