@@ -202,6 +202,15 @@ void Pipeline::openMessages() {
     out() << "Input file: " << settings_.input << std::endl;
 }
 
+void Pipeline::saveIfAsked(const std::string& path, const char* message, const char* timerLabel,
+                           const std::function<void(const std::string&)>& store) {
+    if (path.empty())
+        return;
+    out() << message << std::endl;
+    store(path);
+    timerLine(timer_, timerLabel, out());
+}
+
 void Pipeline::loadInput() {
     if (settings_.raw.empty()) {
         input_.read(settings_.input);
@@ -213,16 +222,11 @@ void Pipeline::loadInput() {
             input_.storeKqraw(settings_.translate);
     }
     timerLine(timer_, "Image load time: ", out());
-    if (!settings_.inputAsJpeg.empty()) {
-        out() << "Saving raw input file in jpeg format." << std::endl;
-        input_.storeJpeg(settings_.inputAsJpeg, settings_.jpegQuality);
-        timerLine(timer_, "JPEG image save time: ", out());
-    }
-    if (!settings_.inputAsBmp.empty()) {
-        out() << "Saving raw input file in bmp format." << std::endl;
-        input_.storeBmp(settings_.inputAsBmp);
-        timerLine(timer_, "BMP image save time: ", out());
-    }
+    saveIfAsked(settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
+                "JPEG image save time: ",
+                [&](const std::string& path) { input_.storeJpeg(path, settings_.jpegQuality); });
+    saveIfAsked(settings_.inputAsBmp, "Saving raw input file in bmp format.",
+                "BMP image save time: ", [&](const std::string& path) { input_.storeBmp(path); });
 }
 
 void Pipeline::decideBitDepth() {
@@ -517,21 +521,13 @@ void Pipeline::writeFlattenedImages() {
         return;
     BayerImage flattened = std::move(context_.corrected);
     flattened.copyMetadata(input_);
-    if (!settings_.flat.empty()) {
-        out() << "Writing flattened image." << std::endl;
-        flattened.storeKqraw(settings_.flat);
-        timerLine(timer_, "Flattened raw image save time: ", out());
-    }
-    if (!settings_.jpeg.empty()) {
-        out() << "Writing flattened jpeg image." << std::endl;
-        flattened.storeJpeg(settings_.jpeg, settings_.jpegQuality);
-        timerLine(timer_, "Flattened JPEG image save time: ", out());
-    }
-    if (!settings_.bmp.empty()) {
-        out() << "Writing flattened bmp image." << std::endl;
-        flattened.storeBmp(settings_.bmp);
-        timerLine(timer_, "Flattened BMP image save time: ", out());
-    }
+    saveIfAsked(settings_.flat, "Writing flattened image.", "Flattened raw image save time: ",
+                [&](const std::string& path) { flattened.storeKqraw(path); });
+    saveIfAsked(settings_.jpeg, "Writing flattened jpeg image.",
+                "Flattened JPEG image save time: ",
+                [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
+    saveIfAsked(settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
+                [&](const std::string& path) { flattened.storeBmp(path); });
 }
 
 void Pipeline::finish() {

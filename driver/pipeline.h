@@ -14,7 +14,9 @@
 #include <boost/date_time/posix_time/ptime.hpp>
 
 #include <cstdint>
+#include <functional>
 #include <memory>
+#include <string>
 
 class Pipeline {
 public:
@@ -48,6 +50,9 @@ private:
     void measureColourError();
     void writeFlattenedImages();
     void finish();
+    // When `path` is set: the message line, store(path), the timer line.
+    void saveIfAsked(const std::string& path, const char* message, const char* timerLabel,
+                     const std::function<void(const std::string&)>& store);
 
     boost::posix_time::ptime startTime_;
     StageTimer timer_;
