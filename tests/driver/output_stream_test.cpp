@@ -22,15 +22,7 @@ protected:
     }
     void TearDown() override { stream_.reset(); }
 
-    std::string written() {
-        std::fflush(file_);
-        std::rewind(file_);
-        std::string text;
-        int c;
-        while ((c = std::fgetc(file_)) != EOF)
-            text += static_cast<char>(c);
-        return text;
-    }
+    std::string written() { return testing_support::readStream(file_); }
 
     outputStream stream_;
     std::FILE* file_ = nullptr;

@@ -2,6 +2,7 @@
 
 #include "driver/output_stream.h"
 #include "driver/run.h"
+#include "tests/support/temp_dir.h"
 
 #include <gtest/gtest.h>
 
@@ -17,15 +18,7 @@ protected:
     }
     void TearDown() override { messageStream.reset(); }
 
-    std::string written() {
-        std::fflush(file_);
-        std::rewind(file_);
-        std::string text;
-        int c;
-        while ((c = std::fgetc(file_)) != EOF)
-            text += static_cast<char>(c);
-        return text;
-    }
+    std::string written() { return testing_support::readStream(file_); }
 
     int run(std::vector<const char*> args) {
         args.insert(args.begin(), "lsc");

@@ -67,13 +67,8 @@ ToolResult runOnFullDisk(const std::vector<std::string>& args, const std::string
     if (pipe(out) != 0 || pipe(err) != 0)
         return {};
     // Through the emulator in a cross build, like every other run.
-    std::vector<std::string> words(testing_support::toolPrefix());
-    words.push_back(LSC_BINARY);
-    words.insert(words.end(), args.begin(), args.end());
-    std::vector<char*> argv;
-    for (std::string& word : words)
-        argv.push_back(word.data());
-    argv.push_back(nullptr);
+    std::vector<std::string> words = testing_support::toolCommand(args);
+    std::vector<char*> argv = testing_support::argumentVector(words);
 
     const pid_t pid = fork();
     if (pid == 0) {

@@ -1,6 +1,7 @@
 #include "image/ppm_writer.h"
 
 #include "image/image_buffer.h"
+#include "tests/image/export_test_image.h"
 #include "tests/support/temp_dir.h"
 
 #include <gtest/gtest.h>
@@ -13,16 +14,6 @@
 namespace {
 
 using testing_support::TempDir;
-
-ImagePtr makeImage(std::int32_t width, std::int32_t height, std::uint16_t bits,
-                   std::uint16_t samples, std::uint32_t cfa1, std::uint32_t pixelType,
-                   std::uint32_t bufferType, std::uint32_t dataType) {
-    int result = 0;
-    ImagePtr image(imageCreate(width, height, bits, samples, 1, 0, cfa1, pixelType, bufferType,
-                               dataType, &result));
-    EXPECT_EQ(result, 0);
-    return image;
-}
 
 std::string written(const TempDir& dir, const ImageBuffer* image) {
     EXPECT_EQ(ppmWrite(dir.file("out.pnm").c_str(), image), 0);

@@ -1,6 +1,7 @@
 #include "image/tiff_writer.h"
 
 #include "image/image_buffer.h"
+#include "tests/image/export_test_image.h"
 #include "tests/support/temp_dir.h"
 
 #include <gtest/gtest.h>
@@ -21,16 +22,6 @@ struct TiffClose {
     void operator()(TIFF* tiff) const { TIFFClose(tiff); }
 };
 using TiffPtr = std::unique_ptr<TIFF, TiffClose>;
-
-ImagePtr makeImage(std::int32_t width, std::int32_t height, std::uint16_t bits,
-                   std::uint16_t samples, std::uint32_t cfa1, std::uint32_t pixelType,
-                   std::uint32_t bufferType, std::uint32_t dataType) {
-    int result = 0;
-    ImagePtr image(imageCreate(width, height, bits, samples, 1, 0, cfa1, pixelType, bufferType,
-                               dataType, &result));
-    EXPECT_EQ(result, 0);
-    return image;
-}
 
 std::uint16_t tag16(TIFF* tiff, ttag_t tag) {
     std::uint16_t value = 0;

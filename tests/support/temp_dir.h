@@ -1,6 +1,7 @@
 #pragma once
 // A fresh directory per test, removed with everything in it afterwards.
 
+#include <cstdio>
 #include <string>
 
 namespace testing_support {
@@ -21,6 +22,8 @@ private:
 };
 
 std::string readFile(const std::string& path);
+// Everything written to `file` so far, read from its start.
+std::string readStream(std::FILE* file);
 void writeFile(const std::string& path, const std::string& bytes);
 bool fileExists(const std::string& path);
 

@@ -6,22 +6,9 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "tests/support/temp_dir.h"
+
 namespace testing_support {
-
-namespace {
-
-std::string readAll(std::FILE* file) {
-    std::string text;
-    std::rewind(file);
-    char chunk[4096];
-    std::size_t n;
-    while ((n = std::fread(chunk, 1, sizeof chunk, file)) > 0)
-        text.append(chunk, n);
-    std::fclose(file);
-    return text;
-}
-
-} // namespace
 
 const std::vector<std::string>& toolPrefix() {
 #ifdef LSC_TOOL_PREFIX
@@ -43,6 +30,21 @@ std::string toolCommandPrefix() {
     return command;
 }
 
+std::vector<std::string> toolCommand(const std::vector<std::string>& args) {
+    std::vector<std::string> words(toolPrefix());
+    words.push_back(LSC_BINARY);
+    words.insert(words.end(), args.begin(), args.end());
+    return words;
+}
+
+std::vector<char*> argumentVector(std::vector<std::string>& words) {
+    std::vector<char*> argv;
+    for (std::string& word : words)
+        argv.push_back(word.data());
+    argv.push_back(nullptr);
+    return argv;
+}
+
 ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
                    const std::string& input) {
     std::FILE* out = std::tmpfile();
@@ -51,13 +53,8 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
     std::fwrite(input.data(), 1, input.size(), in);
     std::rewind(in);
 
-    std::vector<std::string> words(toolPrefix());
-    words.push_back(LSC_BINARY);
-    words.insert(words.end(), args.begin(), args.end());
-    std::vector<char*> argv;
-    for (std::string& word : words)
-        argv.push_back(word.data());
-    argv.push_back(nullptr);
+    std::vector<std::string> words = toolCommand(args);
+    std::vector<char*> argv = argumentVector(words);
 
     ToolResult result;
     const pid_t pid = fork();
@@ -74,8 +71,10 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
     waitpid(pid, &status, 0);
     if (WIFEXITED(status))
         result.status = WEXITSTATUS(status);
-    result.out = readAll(out);
-    result.err = readAll(err);
+    result.out = readStream(out);
+    result.err = readStream(err);
+    std::fclose(out);
+    std::fclose(err);
     std::fclose(in);
     return result;
 }

@@ -22,6 +22,12 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir 
 // emulator and its arguments, so tests run the target's programs on the host.
 const std::vector<std::string>& toolPrefix();
 
+// The words that start the tool with `args`: toolPrefix(), the tool, `args`.
+std::vector<std::string> toolCommand(const std::vector<std::string>& args);
+
+// execvp's argument vector over `words`, which must outlive it.
+std::vector<char*> argumentVector(std::vector<std::string>& words);
+
 // toolPrefix() as the start of a shell command: each word quoted, followed by
 // a space; empty natively.
 std::string toolCommandPrefix();
