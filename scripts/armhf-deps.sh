@@ -15,25 +15,10 @@ packages=(
     libgtest-dev:armhf
 )
 
-missing=()
-for p in "${packages[@]}"; do
-    if ! dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q 'install ok installed'; then
-        missing+=("$p")
+before_install() {
+    if ! dpkg --print-foreign-architectures | grep -qx armhf; then
+        $sudo dpkg --add-architecture armhf
     fi
-done
-
-if [ "${#missing[@]}" -eq 0 ]; then
-    exit 0
-fi
-
-echo "Installing: ${missing[*]}"
-sudo=""
-if [ "$(id -u)" -ne 0 ]; then
-    sudo="sudo"
-fi
-export DEBIAN_FRONTEND=noninteractive
-if ! dpkg --print-foreign-architectures | grep -qx armhf; then
-    $sudo dpkg --add-architecture armhf
-fi
-$sudo apt-get -o DPkg::Lock::Timeout=600 update -qq
-$sudo apt-get -o DPkg::Lock::Timeout=600 install -y -qq --no-install-recommends "${missing[@]}"
+}
+. "$(dirname "$0")/lib/apt-missing.sh"
+install_missing "${packages[@]}"

@@ -13,17 +13,8 @@ build_dir="${BUILD_DIR:-build}"
 update_docs=false
 [ "${1:-}" = "--update-docs" ] && update_docs=true
 
-missing=()
-command -v chromium >/dev/null 2>&1 || missing+=(chromium)
-command -v python3 >/dev/null 2>&1 || missing+=(python3)
-if [ "${#missing[@]}" -gt 0 ]; then
-    echo "Installing: ${missing[*]}"
-    sudo=""
-    [ "$(id -u)" -ne 0 ] && sudo="sudo"
-    export DEBIAN_FRONTEND=noninteractive
-    $sudo apt-get update -qq
-    $sudo apt-get install -y -qq --no-install-recommends "${missing[@]}"
-fi
+. scripts/lib/apt-missing.sh
+install_missing chromium python3
 [ -x "$build_dir/lsc" ] || BUILD_DIR="$build_dir" scripts/build.sh
 
 # The example's outputs go where scripts/run-example.sh puts them, so the
