@@ -201,7 +201,7 @@ std::string register_file_text(const config_node& config, const std::string& blo
     return out.text();
 }
 
-void write_register_file(const std::string& path, const config_node& config,
+std::string write_register_file(const std::string& path, const config_node& config,
                          const std::string& blockName, const std::string& controlPointInfix,
                          const std::string& commandLineText, const ProcessingContext& fit,
                          const BayerImage& image) {
@@ -213,4 +213,5 @@ void write_register_file(const std::string& path, const config_node& config,
     const bool written = std::fwrite(text.data(), 1, text.size(), file.stream()) == text.size();
     if (!written || !file.commit())
         throw std::runtime_error(config::msg::kCannotWriteCalibration);
+    return text;
 }

@@ -17,7 +17,10 @@
 // by a blank. Throws std::runtime_error for a geometry that leaves a patch
 // smaller than 2 pixels, a non-finite control point or target level, a serial
 // number holding a double quote, and any failure to create or write the file.
-void write_register_file(const std::string& path, const config_node& config,
+// Returns the text as written: whatever reads the calibration back in this
+// run takes it from here, never from the path, which another process or a
+// device (/dev/null, a pipe) may answer differently.
+std::string write_register_file(const std::string& path, const config_node& config,
                          const std::string& blockName, const std::string& controlPointInfix,
                          const std::string& commandLineText, const ProcessingContext& fit,
                          const BayerImage& image);

@@ -66,6 +66,8 @@ private:
     BayerImage input_;
     BayerImage prepared_;
     ProcessingContext context_;
+    // The register file as this run wrote it; the binary data are built from it.
+    std::string registerText_;
 
     // The calibration report (--report): filled as the stages go.
     std::string reportPath_;
