@@ -39,8 +39,10 @@ inline constexpr char kIdentityMismatch[] =
 inline constexpr char kBinaryNeedsCalibrate[] =
     "Binary calibration data (--binary) can only be built with a calibration register file "
     "(--calibrate).";
+inline constexpr char kAutofocusNeedsBinary[] =
+    "Autofocus calibration data (--autofocus) can only be included in binary calibration data "
+    "(--binary).";
 inline constexpr char kCannotStoreBinary[] = "Cannot store binary calibration file.";
-inline constexpr char kCannotLoadBinary[] = "Cannot load binary calibration file.";
 inline constexpr char kCannotWriteDump[] =
     "Cannot write the text of the binary calibration data to standard output.";
 

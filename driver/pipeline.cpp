@@ -11,6 +11,7 @@
 #include "driver/changed_settings.h"
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
+#include "driver/file_options.h"
 #include "driver/report_data.h"
 #include "driver/run_report_html.h"
 #include "driver/headerless_raw.h"
@@ -32,9 +33,7 @@
 
 #include <algorithm>
 #include <cmath>
-#include <fstream>
 #include <iostream>
-#include <iterator>
 #include <stdexcept>
 
 namespace {
@@ -50,17 +49,6 @@ constexpr blob::ToolVersion kBlobToolVersion = {lscversion::kMajor, lscversion::
                                                 lscversion::kPatch};
 constexpr char kBlobGeneratorName[] = "BlobGenerator";
 constexpr char kBlobGeneratorVersion[] = "1.7.2";
-
-std::vector<std::uint8_t> readWholeFile(const std::string& path) {
-    std::ifstream in(path, std::ios::binary);
-    if (!in)
-        throw std::runtime_error(msg::kCannotLoadBinary);
-    std::vector<std::uint8_t> bytes((std::istreambuf_iterator<char>(in)),
-                                    std::istreambuf_iterator<char>());
-    if (in.bad())
-        throw std::runtime_error(msg::kCannotLoadBinary);
-    return bytes;
-}
 
 // Prints "<label>R/G" and "<label>B/G" with six significant digits (G is the
 // larger green) and returns the two ratios.
@@ -93,6 +81,11 @@ int Pipeline::run(int argc, const char* const argv[]) {
     // nothing to build them from.
     if (!commandLine_.value("binary").empty() && commandLine_.value("calibrate").empty())
         throw std::runtime_error(msg::kBinaryNeedsCalibrate);
+    // The autofocus data go only into the binary data: without them the file
+    // would be silently ignored.
+    if (!commandLine_.value("autofocus").empty() && commandLine_.value("binary").empty())
+        throw std::runtime_error(msg::kAutofocusNeedsBinary);
+    checkOutputsReplaceNothing(commandLine_);
     reportPath_ = commandLine_.value("report");
     report_.toolVersion = lscversion::versionText();
     report_.commandLine = commandLine_.argumentsText();
@@ -410,16 +403,20 @@ void Pipeline::recordFitError() {
 void Pipeline::writeRegisterFile() {
     if (!settings_.calibrate.empty()) {
         out() << "Generating configuration file." << std::endl;
-        write_register_file(settings_.calibrate, *config_, settings_.blockName,
-                            settings_.controlPointInfix, commandLine_.argumentsText(), context_,
-                            input_);
+        registerText_ = write_register_file(settings_.calibrate, *config_, settings_.blockName,
+                                            settings_.controlPointInfix,
+                                            commandLine_.argumentsText(), context_, input_);
     }
     timerLine(timer_, "Lens shading calculation time: ", out());
 }
 
+// The calibration is read from the register text this run wrote and the
+// stored bytes are checked as this run wrote them: read back through their
+// paths they could be another run's files written over ours in the meantime,
+// or a device or pipe that gives nothing back (/dev/null, /dev/stdout).
 void Pipeline::writeBinaryData() {
     out() << "Reading calibration data." << std::endl;
-    read_config_file(settings_.calibrate, *config_);
+    parse_config_text(registerText_, *config_);
     if (!settings_.autofocus.empty()) {
         out() << "Reading autofocus calibration data." << std::endl;
         read_config_file(settings_.autofocus, *config_);
@@ -446,7 +443,7 @@ void Pipeline::writeBinaryData() {
     timerLine(timer_, "Binary data save time: ", out());
 
     out() << "Reading binary calibration data." << std::endl;
-    const std::vector<std::uint8_t> stored = readWholeFile(settings_.binary);
+    const std::vector<std::uint8_t>& stored = bytes;
     timerLine(timer_, "Binary data reading time: ", out());
     config_node_impl storedRoot("root");
     config_node& data = storedRoot.child("module").child("lsc");
