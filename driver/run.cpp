@@ -5,9 +5,41 @@
 #include "driver/output_stream.h"
 #include "driver/pipeline.h"
 
+#include "image/output_file.h"
+
+#include <csignal>
 #include <iostream>
+#include <unistd.h>
+
+namespace {
+
+// An operator's Ctrl-C, a station's kill or a closed terminal ends the run
+// at once; the outputs being written are left as they were (their
+// temporaries are removed) and the status tells which signal it was.
+extern "C" void endOnSignal(int signal) {
+    removeLiveTemporaries();
+    _exit(128 + signal);
+}
+
+void installSignalHandlers() {
+    struct sigaction action {};
+    action.sa_handler = endOnSignal;
+    sigemptyset(&action.sa_mask);
+    for (int signal : {SIGINT, SIGTERM, SIGHUP})
+        sigaddset(&action.sa_mask, signal);
+    for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
+        // A signal the caller chose to ignore (nohup) stays ignored.
+        struct sigaction previous {};
+        if (sigaction(signal, nullptr, &previous) == 0 && previous.sa_handler == SIG_IGN)
+            continue;
+        sigaction(signal, &action, nullptr);
+    }
+}
+
+} // namespace
 
 int runProgram(int argc, const char* const argv[]) {
+    installSignalHandlers();
     int status = 0;
     try {
         Pipeline pipeline;

@@ -2,11 +2,62 @@
 
 #include <cerrno>
 #include <climits>
+#include <csignal>
 #include <cstdlib>
+#include <cstring>
 #include <sys/stat.h>
 #include <unistd.h>
 
 namespace {
+
+#ifndef NAME_MAX
+#define NAME_MAX 255
+#endif
+
+// The temporaries being written, in storage made before any signal can come:
+// a handler may read it at any moment, so a slot is filled before it is
+// marked live and marked dead only after its file is renamed or removed.
+struct TemporarySlot {
+    volatile std::sig_atomic_t live;
+    char path[PATH_MAX];
+};
+TemporarySlot liveTemporaries[kMaxOpenOutputs];
+
+// Creates the temporary from `pattern` (ending in XXXXXX) in a free slot.
+// Returns the descriptor (or -1) and the slot (or -1).
+int createRegisteredTemporary(const std::string& pattern, int& slot) {
+    slot = -1;
+    if (pattern.size() >= PATH_MAX)
+        return -1;
+    for (int i = 0; i < kMaxOpenOutputs; ++i) {
+        if (liveTemporaries[i].live)
+            continue;
+        std::memcpy(liveTemporaries[i].path, pattern.c_str(), pattern.size() + 1);
+        liveTemporaries[i].live = 1;
+        const int fd = mkstemp(liveTemporaries[i].path);
+        if (fd < 0) {
+            liveTemporaries[i].live = 0;
+            return -1;
+        }
+        slot = i;
+        return fd;
+    }
+    return -1;
+}
+
+void releaseSlot(int& slot) {
+    if (slot >= 0)
+        liveTemporaries[slot].live = 0;
+    slot = -1;
+}
+
+// ".<name>.tmp-XXXXXX" beside the target; a long name is cut so that the
+// temporary's name stays within the file-name limit.
+std::string temporaryPattern(const std::string& dir, const std::string& name) {
+    constexpr std::size_t kDecoration = sizeof(".") - 1 + sizeof(".tmp-XXXXXX") - 1;
+    const std::size_t keep = NAME_MAX > kDecoration ? NAME_MAX - kDecoration : 0;
+    return dir + "." + name.substr(0, keep) + ".tmp-XXXXXX";
+}
 
 // Devices, pipes and everything under /dev and /proc are written in place:
 // /dev/stdout may resolve to a regular file that the shell holds open.
@@ -46,7 +97,12 @@ std::FILE* openDirect(const std::string& path) {
     return stream;
 }
 
-mode_t creationMode() {
+// A file that is replaced keeps its permissions (a 0600 calibration stays
+// private); a new one gets what the umask leaves of 0666.
+mode_t creationMode(const std::string& target) {
+    struct stat existing;
+    if (stat(target.c_str(), &existing) == 0 && S_ISREG(existing.st_mode))
+        return existing.st_mode & 0777;
     const mode_t mask = umask(0);
     umask(mask);
     return 0666 & ~mask;
@@ -84,18 +140,17 @@ bool OutputFile::open(const std::string& path) {
     const std::size_t slash = target_.rfind('/');
     const std::string dir = slash == std::string::npos ? "" : target_.substr(0, slash + 1);
     const std::string name = slash == std::string::npos ? target_ : target_.substr(slash + 1);
-    std::string pattern = dir + "." + name + ".tmp-XXXXXX";
-    const int fd = mkstemp(pattern.data());
+    const int fd = createRegisteredTemporary(temporaryPattern(dir, name), registrySlot_);
     if (fd < 0)
         return false;
-    fchmod(fd, creationMode());
+    temporary_ = liveTemporaries[registrySlot_].path;
+    fchmod(fd, creationMode(target_));
     stream_ = fdopen(fd, "wb");
     if (!stream_) {
         ::close(fd);
-        unlink(pattern.c_str());
+        abort();
         return false;
     }
-    temporary_ = pattern;
     return true;
 }
 
@@ -110,10 +165,12 @@ bool OutputFile::commit() {
         return ok;
     if (ok && std::rename(temporary_.c_str(), target_.c_str()) == 0) {
         temporary_.clear();
+        releaseSlot(registrySlot_);
         return true;
     }
     unlink(temporary_.c_str());
     temporary_.clear();
+    releaseSlot(registrySlot_);
     return false;
 }
 
@@ -126,6 +183,13 @@ void OutputFile::abort() {
         unlink(temporary_.c_str());
         temporary_.clear();
     }
+    releaseSlot(registrySlot_);
+}
+
+void removeLiveTemporaries() noexcept {
+    for (TemporarySlot& slot : liveTemporaries)
+        if (slot.live)
+            unlink(slot.path);
 }
 
 bool writeWholeFile(const std::string& path, const void* data, std::size_t size) {

@@ -6,7 +6,8 @@
 // directly, never renamed over; a path that names the file standard output or
 // standard error already writes to is written through that descriptor, so
 // nothing printed before is truncated or overwritten. Without commit() the
-// temporary is removed.
+// temporary is removed, and so it is when the process is ended by a signal
+// (removeLiveTemporaries). A file that is replaced keeps its permission bits.
 //
 // Procedural like the rest of the image library: no exceptions, results as bool.
 
@@ -36,7 +37,16 @@ private:
     std::FILE* stream_ = nullptr;
     std::string target_;
     std::string temporary_;  // empty for a direct write
+    int registrySlot_ = -1;  // this file's entry among the live temporaries
 };
+
+// Removes every temporary file of this process that is not yet committed or
+// aborted. Async-signal-safe (it only calls unlink): meant for the handler of
+// a signal that ends the run, so an interrupted write leaves nothing behind.
+void removeLiveTemporaries() noexcept;
+
+// Up to this many outputs may be open for writing at once.
+constexpr int kMaxOpenOutputs = 8;
 
 // STDOUT_FILENO or STDERR_FILENO when `path` names the file that descriptor
 // writes to (/dev/stdout, /proc/self/fd/2, the same terminal), else -1.
