@@ -13,6 +13,7 @@
 #include "image/raw_metadata.h"
 #include "image/raw_reader.h"
 #include "image/sample_scaling.h"
+#include "image/sample_memory.h"
 
 namespace {
 
@@ -83,7 +84,7 @@ void BayerImage::read(const std::string& path) {
     int rc = img::kOk;
     ImagePtr raw(rawRead(path.c_str(), &rc));
     if (!raw)
-        fail(img::msg::kCannotReadKqraw);
+        fail(rc == img::kImageTooLarge ? img::msg::kImageTooLarge : img::msg::kCannotReadKqraw);
     // The image takes over the raw samples' block, widened to floats where
     // the reader left room for them: loading then never holds the raw samples
     // and a float copy at once.
@@ -109,6 +110,10 @@ void BayerImage::createFromHeaderless(std::int32_t width, std::int32_t height, s
                                       const std::string& serialNumber,
                                       const std::string& sensorGuid, bool fixedHeader) {
     buffer_.reset();
+    if (width >= 0 && height >= 0 &&
+        img::checkSampleMemory(static_cast<std::uint64_t>(width),
+                               static_cast<std::uint64_t>(height)) != img::kOk)
+        fail(img::msg::kImageTooLarge);
     int rc = img::kOk;
     ImagePtr image(
         imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));

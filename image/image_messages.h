@@ -5,6 +5,9 @@ namespace img::msg {
 
 // Bayer image object: the texts of its runtime errors.
 inline constexpr char kCannotReadKqraw[] = "Cannot read kqraw image.";
+inline constexpr char kImageTooLarge[] =
+    "Image too large: its samples would take more than 1 GiB of memory (at most 268435456 "
+    "samples, for example 16384 x 16384 pixels).";
 inline constexpr char kCannotAllocateImage[] = "Unable to allocate image memory.";
 inline constexpr char kCannotAllocateMetadataHeaderless[] =
     "Unable to allocate kqraw image metadata";

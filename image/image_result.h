@@ -14,5 +14,6 @@ constexpr int kUnsupported = -6;  // unsupported combination
 constexpr int kRawBadContainer = -21;  // container without header/pixel block, fixed-header file of wrong size
 constexpr int kRawBadNkraw = -22;      // NKRAW file of the wrong size
 constexpr int kRawBadLayout = -23;     // interactive raw layout does not match the file
+constexpr int kImageTooLarge = -24;    // declared image beyond the sample memory limit (sample_memory.h)
 
 } // namespace img

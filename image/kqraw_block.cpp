@@ -307,6 +307,9 @@ int readPixels(img::ByteSource& source, KqRawBlock* block) {
     if (!source.read(block->lead, kKqRawPixelLeadSize))
         return img::kIoError;
     block->sampleCount = (block->size - kKqRawPixelLeadSize) / 2;
+    const int fits = img::checkSampleMemory(block->sampleCount, 1);
+    if (fits != img::kOk)
+        return fits;
     // With room for floats: the samples usually become the input image.
     block->samples = static_cast<std::uint16_t*>(
         img::allocateWidenableSamples(block->sampleCount, sizeof(std::uint16_t)));

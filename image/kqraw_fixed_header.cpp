@@ -11,6 +11,7 @@
 #include "image/image_warning.h"
 #include "image/malloc_ptr.h"
 #include "image/raw_samples.h"
+#include "image/sample_memory.h"
 
 namespace {
 
@@ -137,6 +138,9 @@ int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** out) noexcep
     const std::uint64_t count = std::uint64_t{width} * height;
     if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2) // a pixel block size is 32 bits
         return img::kRawBadContainer;
+    const int fits = img::checkSampleMemory(width, height);
+    if (fits != img::kOk)
+        return fits;
 
     KqRawContainerPtr container(kqrawContainerCreate());
     KqRawBlock* headerBlock = kqrawBlockCreateHeader();

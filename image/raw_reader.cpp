@@ -10,6 +10,7 @@
 #include "image/nkraw.h"
 #include "image/raw_prompt.h"
 #include "image/raw_samples.h"
+#include "image/sample_memory.h"
 
 namespace img {
 namespace {
@@ -87,7 +88,9 @@ int readWithLayout(ByteSource& source, const RawLayout& layout, ImageBuffer** ou
     if (bytes == 0 || layout.bitDepth < 1 || layout.bitDepth > (wide ? 16u : 8u))
         return kRawBadLayout;
     const bool colour = bytes == 3 || bytes == 6;
-    int rc = kOk;
+    int rc = checkSampleMemory(layout.width, layout.height, colour ? 3 : 1, layout.images);
+    if (rc != kOk)
+        return rc;
     ImagePtr image(imageCreate(
         static_cast<std::int32_t>(layout.width), static_cast<std::int32_t>(layout.height),
         static_cast<std::uint16_t>(layout.bitDepth), colour ? 3 : 1, layout.images, 0, layout.cfa,

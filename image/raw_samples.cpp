@@ -85,7 +85,9 @@ int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
     if (width == 0 || height == 0 || width > INT32_MAX || height > INT32_MAX ||
         !samplesFit(source.size(), offset, width, height))
         return kSizeMismatch;
-    int rc = kOk;
+    int rc = checkSampleMemory(width, height);
+    if (rc != kOk)
+        return rc;
     ImagePtr image(imageCreate(static_cast<std::int32_t>(width), static_cast<std::int32_t>(height),
                                16, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataNone, &rc));
     if (!image)

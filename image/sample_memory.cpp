@@ -1,6 +1,9 @@
 #include "image/sample_memory.h"
 
 #include <cstdlib>
+#include <initializer_list>
+
+#include "image/image_result.h"
 
 #if defined(__GLIBC__) || defined(__BIONIC__)
 #include <malloc.h>
@@ -14,6 +17,20 @@ namespace {
 constexpr std::size_t kHugePage = std::size_t{2} << 20;
 constexpr std::size_t kLargeBlock = 4 * kHugePage;
 } // namespace
+
+int checkSampleMemory(std::uint64_t width, std::uint64_t height, std::uint64_t samplesPerPixel,
+                      std::uint64_t images) noexcept {
+    // Divided rather than multiplied: no product of the factors can wrap.
+    std::uint64_t room = kMaxImageSamples;
+    for (std::uint64_t factor : {width, height, samplesPerPixel, images}) {
+        if (factor == 0)
+            return kOk;
+        if (factor > room)
+            return kImageTooLarge;
+        room /= factor;
+    }
+    return kOk;
+}
 
 void* allocateSamples(std::size_t bytes) noexcept {
 #if defined(MADV_HUGEPAGE)

@@ -7,6 +7,20 @@
 
 namespace img {
 
+// The largest image the tool loads: 1 GiB of float samples (268,435,456
+// samples, for example 16384 x 16384 pixels of one sample). A declared size
+// beyond it is refused before anything is allocated, whatever the input
+// (a raw container, a fixed-header file, a headerless dump, a stream).
+constexpr std::uint64_t kMaxSampleMemory = std::uint64_t{1} << 30;
+constexpr std::uint64_t kMaxImageSamples = kMaxSampleMemory / sizeof(float);
+
+// kOk when an image of width x height pixels of `samplesPerPixel` samples
+// (and `images` images) stays within kMaxSampleMemory, else kImageTooLarge
+// (image_result.h), whose text is msg::kImageTooLarge. Every loader asks
+// this before it allocates samples.
+int checkSampleMemory(std::uint64_t width, std::uint64_t height,
+                      std::uint64_t samplesPerPixel = 1, std::uint64_t images = 1) noexcept;
+
 // malloc for small blocks. A block of several megabytes is aligned to 2 MiB
 // and, where the system offers it, advised for transparent huge pages: a
 // 12-megapixel float image otherwise takes some 12000 page faults to touch,
