@@ -53,6 +53,8 @@ inline constexpr char kSerialTooLong[] = " is too long for the binary calibratio
 inline constexpr char kTooManyPairs[] =
     " has more than 255 pairs, more than the binary calibration data can hold.";
 inline constexpr char kEmptyPosture[] = " is empty, a posture character is needed.";
+inline constexpr char kLongPosture[] = " must be a single posture character.";
+inline constexpr char kNotAPair[] = " must hold two values, a pair of focus distances.";
 inline constexpr char kTooLarge[] =
     "Binary calibration data too large: block offsets must stay below 64 KiB.";
 

@@ -178,10 +178,16 @@ Block focusBlock(const config_node& config, const config_node& set) {
     const std::size_t count = focusPairCount(config, set);
     out.u8(static_cast<std::uint8_t>(count));
     const config_node& pairs = set.find("FDN_dist_pair");
-    for (std::size_t k = 0; k < count; ++k)
+    for (std::size_t k = 0; k < count; ++k) {
+        const config_node& pair = requiredChild(config, pairs, k);
+        // A third value would be dropped without a word.
+        if (pair.size() > 2)
+            throw std::runtime_error(msg::kValueFor + config_relative_path(config, pair) +
+                                     msg::kNotAPair);
         for (std::size_t half = 0; half < 2; ++half)
-            out.u32(static_cast<std::uint32_t>(fieldValue(
-                config, requiredChild(config, requiredChild(config, pairs, k), half), 0, kMaxU32)));
+            out.u32(static_cast<std::uint32_t>(
+                fieldValue(config, requiredChild(config, pair, half), 0, kMaxU32)));
+    }
     return block;
 }
 

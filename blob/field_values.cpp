@@ -100,6 +100,9 @@ char postureCharacter(const config_node& config, const config_node& node) {
         return text[1];
     if (text.empty())
         refuse(config, node, msg::kEmptyPosture);
+    // The block holds one character: the rest of a longer text would be lost.
+    if (text.size() != 1)
+        refuse(config, node, msg::kLongPosture);
     return text[0];
 }
 

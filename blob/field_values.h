@@ -37,8 +37,8 @@ std::string unquoted(const std::string& text);
 std::vector<std::uint8_t> serialBytes(const config_node& config, const config_node& node);
 
 // The posture character: the one between single quotes ('H', as the
-// configuration parser keeps it), else the first character. Throws
-// std::runtime_error for an empty text.
+// configuration parser keeps it), or a text of that one character. Throws
+// std::runtime_error for an empty or longer text.
 char postureCharacter(const config_node& config, const config_node& node);
 
 } // namespace blob

@@ -12,5 +12,8 @@
 // file cannot be read, std::runtime_error when its text does not parse.
 void read_config_file(const std::string& path, config_node& config);
 
+// The whole text of a configuration file, unparsed (errors as read_config_file).
+std::string read_config_text(const std::string& path);
+
 // Parses configuration text held in memory (errors as read_config_file).
 void parse_config_text(std::string_view text, config_node& config);

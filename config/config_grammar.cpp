@@ -17,6 +17,7 @@
 #include <boost/variant.hpp>
 
 #include "config/config_file.h"
+#include "config/config_limits.h"
 #include "config/config_messages.h"
 #include "config/value_text.h"
 
@@ -27,11 +28,14 @@ namespace phx = boost::phoenix;
 
 using Iterator = const char*;
 using Range = boost::iterator_range<Iterator>;
-using Value = boost::variant<std::string, std::vector<std::int32_t>, std::vector<double>>;
+// Integer lists hold 64-bit numbers: read as 32-bit, a focus distance of
+// 2^31 or more would fall through to the float list and be rounded to single
+// precision, so a value would change on its way through the text dump.
+using Value = boost::variant<std::string, std::vector<std::int64_t>, std::vector<double>>;
 
-// Limits that keep hostile or broken input from building an absurd tree:
-// every node's name holds its whole key, so long keys multiply memory.
-constexpr std::ptrdiff_t kMaxKeyLength = 256;
+// Limits that keep hostile or broken input from building an absurd tree
+// (the key length in config_limits.h).
+constexpr auto kMaxKeyLength = static_cast<std::ptrdiff_t>(config::kMaxKeyLength);
 constexpr std::uint64_t kMaxIndex = 65535;
 constexpr std::size_t kMaxNewEntries = 262144; // nodes one text may add
 
@@ -64,7 +68,9 @@ public:
 
         spaces_ = +char_(" \t");
         comment_ = '#' >> *(char_ - char_("\r\n")) >> (qi::eol | qi::eoi);
-        name_ = qi::raw[char_("a-zA-Z") >> *char_("a-zA-Z0-9_")];
+        // A dash as well: every block name the parameter table accepts
+        // (cam-A) must read back from the register file written with it.
+        name_ = qi::raw[char_("a-zA-Z") >> *char_("a-zA-Z0-9_-")];
         identifier_ =
             qi::raw[name_][phx::bind(&ConfigGrammar::navigate_first_impl, this, qi::_1)] >>
             *(qi::raw['[' >> +digit >> ']']
@@ -74,7 +80,7 @@ public:
         parameter_ = qi::raw[+(char_("a-zA-Z0-9") | char_('_') | char_('/') | char_('\\') |
                                char_(':') | char_('-') | char_('.'))];
         character_ = qi::raw['\'' >> (char_ - '\'') >> '\''];
-        integerList_ = '{' >> -spaces_ >> (qi::int_ % separator) >> -spaces_ >> '}';
+        integerList_ = '{' >> -spaces_ >> (qi::long_long % separator) >> -spaces_ >> '}';
         floatSyntax_ =
             -char_("+-") >> (qi::no_case["infinity"] | qi::no_case["inf"] | qi::no_case["nan"] |
                              ((+digit >> -('.' >> *digit) | '.' >> +digit) >>
@@ -157,8 +163,8 @@ private:
     void set_value_impl(const Value& value) {
         if (const auto* text = boost::get<std::string>(&value))
             current_->set(*text);
-        else if (const auto* integers = boost::get<std::vector<std::int32_t>>(&value))
-            setList(*integers, [](std::int32_t n) { return integerText(n); });
+        else if (const auto* integers = boost::get<std::vector<std::int64_t>>(&value))
+            setList(*integers, [](std::int64_t n) { return integerText(n); });
         else
             setList(boost::get<std::vector<double>>(value), [](double d) { return doubleText(d); });
     }
@@ -178,7 +184,7 @@ private:
 
     qi::rule<Iterator> settings_, setting_, identifier_, comment_, spaces_, floatSyntax_;
     qi::rule<Iterator, std::string()> name_, string_, parameter_, character_;
-    qi::rule<Iterator, std::vector<std::int32_t>()> integerList_;
+    qi::rule<Iterator, std::vector<std::int64_t>()> integerList_;
     qi::rule<Iterator, double()> floatElement_;
     qi::rule<Iterator, std::vector<double>()> floatList_;
     qi::rule<Iterator, Value()> value_;
@@ -210,7 +216,7 @@ void parse_config_text(std::string_view text, config_node& config) {
     throw std::runtime_error(message);
 }
 
-void read_config_file(const std::string& path, config_node& config) {
+std::string read_config_text(const std::string& path) {
     std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
     if (!file)
         throw std::invalid_argument(config::msg::kCannotOpenConfig);
@@ -224,5 +230,9 @@ void read_config_file(const std::string& path, config_node& config) {
     }
     if (std::ferror(file.get()))
         throw std::invalid_argument(config::msg::kCannotOpenConfig);
-    parse_config_text(text, config);
+    return text;
+}
+
+void read_config_file(const std::string& path, config_node& config) {
+    parse_config_text(read_config_text(path), config);
 }

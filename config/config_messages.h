@@ -12,7 +12,7 @@ inline constexpr char kIndexTooLargePrefix[] = "Index ";
 inline constexpr char kIndexTooLargeMiddle[] = " of ";
 inline constexpr char kIndexTooLargeSuffix[] = " is too large, the largest allowed index is 65535.";
 inline constexpr char kBadPathPrefix[] = "Invalid configuration path: ";
-inline constexpr char kPathTooLongPrefix[] = "Configuration path longer than 256 characters: ";
+inline constexpr char kPathTooLongPrefix[] = "Configuration path longer than 1024 characters: ";
 inline constexpr char kPathTooManyEntriesPrefix[] =
     "Configuration path would add more than 262144 new entries: ";
 
@@ -24,7 +24,7 @@ inline constexpr char kStoppedAt[] = "Stopped at: ";
 inline constexpr char kParseExpecting[] =
     "Failed to parse configuration file parameters, expecting ";
 inline constexpr char kKeyTooLong[] =
-    "Failed to parse configuration file parameters, key longer than 256 characters:";
+    "Failed to parse configuration file parameters, key longer than 1024 characters:";
 inline constexpr char kKeyIndexTooLarge[] =
     "Failed to parse configuration file parameters, index larger than 65535:";
 inline constexpr char kTooManyEntries[] =
@@ -40,9 +40,13 @@ inline constexpr char kEmptyBlockName[] = "Empty string not allowed for shared.b
 inline constexpr char kBadBlockName[] =
     "Value for shared.block_name may only consist of letters, digits, dashes, and underscores "
     "and must start with a letter.";
+inline constexpr char kBlockNameTooLong[] =
+    "Value for shared.block_name may be at most 987 characters long.";
 inline constexpr char kInvalidDate[] = "Invalid ISO 8601 date value (must be YYYY-MM-DDTHH:MM).";
 
 // Fit settings
+inline constexpr char kDeltaAbBlocksNotTwo[] =
+    "apply_lsc.delta_ab_blocks must hold two values: the block columns and rows.";
 inline constexpr char kNoDeltaAbBlocksPrefix[] = "The image size (";
 inline constexpr char kNoDeltaAbBlocksSuffix[] =
     ") gives no usable delta ab block counts; set apply_lsc.delta_ab_blocks in the configuration "

@@ -9,6 +9,7 @@
 
 #include "config/config_messages.h"
 #include "config/value_text.h"
+#include "config/config_limits.h"
 
 namespace {
 
@@ -17,10 +18,10 @@ namespace {
 constexpr std::size_t kMaxIndex = 65535;
 
 // A path created in one go names one setting, so it is held to what the
-// configuration file allows one key and one file: at most 256 characters and
-// 262144 new entries. Without them a short text such as a[65535][65535]...
+// configuration file allows one key and one file: at most
+// config::kMaxKeyLength characters and 262144 new entries. Without them a short text such as a[65535][65535]...
 // adds 65536 nodes a step, and a long dotted one builds names of quadratic size.
-constexpr std::size_t kMaxPathLength = 256;
+constexpr std::size_t kMaxPathLength = config::kMaxKeyLength;
 constexpr std::size_t kMaxNewEntries = 262144;
 
 [[noreturn]] void throwNoneHasNoValue() {
@@ -45,8 +46,10 @@ struct PathStep {
     throw std::invalid_argument(config::msg::kBadPathPrefix + path);
 }
 
+// As the configuration grammar's names (block names may hold a dash).
 bool isNameChar(char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_';
+    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_' ||
+           c == '-';
 }
 
 // Reads the next step at `pos`; false at the end of the path.

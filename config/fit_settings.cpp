@@ -35,6 +35,9 @@ void loadPatchFractions(const config_node& config, double width, double height,
 void loadDeltaAbBlocks(const config_node& config, std::int32_t width, std::int32_t height,
                        ProcessingContext& context) {
     const config_node& blocks = setting(config, "apply_lsc", "delta_ab_blocks");
+    // Columns and rows: a third value would be ignored without a word.
+    if (blocks.size() != 2)
+        throw std::range_error(config::msg::kDeltaAbBlocksNotTwo);
     const int horizontal = blocks.find(0).as_int();
     const int vertical = blocks.find(1).as_int();
     if (horizontal != 0 || vertical != 0) {

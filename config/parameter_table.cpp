@@ -4,6 +4,7 @@
 #include <cmath>
 #include <stdexcept>
 
+#include "config/config_limits.h"
 #include "config/config_messages.h"
 #include "config/value_text.h"
 
@@ -110,6 +111,10 @@ void checkEntry(const config_node& config, const Parameter& parameter) {
 void checkBlockName(const std::string& name) {
     if (name.empty())
         throw std::range_error(config::msg::kEmptyBlockName);
+    // Every register key starts with it; the longest must stay a valid key.
+    static_assert(config::kMaxBlockNameLength == 987, "kBlockNameTooLong names the limit");
+    if (name.size() > config::kMaxBlockNameLength)
+        throw std::range_error(config::msg::kBlockNameTooLong);
     auto isLetter = [](char c) { return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z'); };
     auto isNameChar = [&](char c) {
         return isLetter(c) || (c >= '0' && c <= '9') || c == '-' || c == '_';
@@ -146,6 +151,12 @@ std::int64_t daysFromCivil(std::int64_t year, std::int64_t month, std::int64_t d
     const std::int64_t dayOfYear = (153 * (month + (month > 2 ? -3 : 9)) + 2) / 5 + day - 1;
     const std::int64_t dayOfEra = yearOfEra * 365 + yearOfEra / 4 - yearOfEra / 100 + dayOfYear;
     return era * 146097 + dayOfEra - 719468;
+}
+
+std::int64_t daysInMonth(std::int64_t year, std::int64_t month) {
+    static constexpr std::int64_t kDays[12] = {31, 28, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31};
+    const bool leap = (year % 4 == 0 && year % 100 != 0) || year % 400 == 0;
+    return month == 2 && leap ? 29 : kDays[month - 1];
 }
 
 // Reads one or more digits at `pos` (at most nine, so the arithmetic below
@@ -219,9 +230,9 @@ std::string block_prefix(const config_node& root) {
     return prefix + ".";
 }
 
-// Out-of-range fields carry over as a calendar conversion does (month 13 is
-// January of the next year, minute 60 the next hour); results outside the
-// years 0000..9999, which the date text cannot show, are refused.
+// Only a date and time that exist: month 13, February 30 or 24:00 would
+// otherwise become another date in the calibration data without a word.
+// Years outside 0000..9999, which the date text cannot show, are refused.
 std::int64_t config_date_seconds(const std::string& text) {
     std::int64_t year = 0, month = 0, day = 0, hour = 0, minute = 0;
     std::size_t pos = 0;
@@ -230,16 +241,8 @@ std::int64_t config_date_seconds(const std::string& text) {
                     readNumber(text, pos, day) && readSeparator(text, pos, 'T') &&
                     readNumber(text, pos, hour) && readSeparator(text, pos, ':') &&
                     readNumber(text, pos, minute) && pos == text.size();
-    if (!ok)
+    if (!ok || year > 9999 || month < 1 || month > 12 || day < 1 ||
+        day > daysInMonth(year, month) || hour > 23 || minute > 59)
         throw std::invalid_argument(config::msg::kInvalidDate);
-    const std::int64_t monthIndex = month - 1; // may be -1
-    year += monthIndex >= 0 ? monthIndex / 12 : -1;
-    month = (monthIndex % 12 + 12) % 12 + 1;
-    const std::int64_t seconds =
-        (daysFromCivil(year, month, 1) + day - 1) * 86400 + hour * 3600 + minute * 60;
-    constexpr std::int64_t kYear0 = -62167219200;     // 0000-01-01T00:00
-    constexpr std::int64_t kYear10000 = 253402300800; // 10000-01-01T00:00
-    if (seconds < kYear0 || seconds >= kYear10000)
-        throw std::invalid_argument(config::msg::kInvalidDate);
-    return seconds;
+    return daysFromCivil(year, month, day) * 86400 + hour * 3600 + minute * 60;
 }

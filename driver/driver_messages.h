@@ -26,6 +26,9 @@ inline constexpr char kInfoFileOpenHint[] = "Likely a file protection issue.";
 // Pipeline
 inline constexpr char kMedianTooLarge[] =
     "The value of proc.median_filter_size in the configuration file is too large.";
+inline constexpr char kUnknownBayerOrder[] =
+    "Unknown Bayer order in the input image: its Bayer code is none of RGGB, GRBG, GBRG and "
+    "BGGR.";
 inline constexpr char kNoInput[] = "An input flat field image must be specified.";
 inline constexpr char kDimensionsPrefix[] = "Input image dimensions (";
 inline constexpr char kDimensionsMiddle[] = ") do not match expected dimensions for sensor (";

@@ -137,9 +137,6 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 
     checkSerial(details.serialNumber);
     details.cfa = cfaOf(order);
-    if (details.sensorGuid.size() > 16 || !isHex(details.sensorGuid))
-        throw std::invalid_argument("Invalid image.sensor_guid value '" + details.sensorGuid +
-                                    "' in headerless raw details file.");
 
     WideInt bits = defaultBits;
     if (map.count("image.bit_res"))
@@ -165,6 +162,12 @@ void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
     details.push(strip_comments('#'));
     details.push(detailsSource);
     const HeaderlessRawDetails d = parseHeaderlessDetails(details, defaultBits);
+    // The GUID is a model name (IMX219) to a container; only the fixed
+    // header stores it, as a 64-bit number.
+    if (fixedHeader && !d.sensorGuid.empty() && !img::isHexGuid(d.sensorGuid))
+        throw std::invalid_argument("Invalid image.sensor_guid value '" + d.sensorGuid +
+                                    "' in headerless raw details file (with raw.legacy_format = 1 "
+                                    "it must be 1 to 16 hexadecimal digits).");
 
     std::unique_ptr<std::FILE, FileClose> file(std::fopen(rawPath.c_str(), "rb"));
     // A directory opens for reading but holds no samples.

@@ -8,6 +8,7 @@
 #include "config/parameter_table.h"
 #include "config/patch_geometry_check.h"
 #include "config/register_file.h"
+#include "driver/autofocus_file.h"
 #include "driver/changed_settings.h"
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
@@ -17,6 +18,7 @@
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
 #include "driver/version.h"
+#include "image/hex_text.h"
 #include "image/output_file.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
@@ -110,8 +112,16 @@ void Pipeline::runStages() {
     beginStage("Checking the input image");
     decideBitDepth();
     checkSettingsAgainstImage();
-    if (!settings_.sensorGuid.empty())
+    if (!settings_.sensorGuid.empty()) {
+        // Stored only in a fixed header, as a 64-bit number: a text that is
+        // not one would be stored as 0.
+        if (input_.hasFixedHeader() && !img::isHexGuid(settings_.sensorGuid))
+            throw std::invalid_argument("Invalid shared.sensor_guid value '" +
+                                        settings_.sensorGuid +
+                                        "' (a fixed-header raw image stores it as 1 to 16 "
+                                        "hexadecimal digits).");
         input_.setSensorGuid(settings_.sensorGuid);
+    }
     inspectInput();
     beginStage("Preparing the image");
     prepareImage();
@@ -206,10 +216,18 @@ void Pipeline::saveIfAsked(const std::string& path, const char* message, const c
 void Pipeline::loadInput() {
     if (settings_.raw.empty()) {
         input_.read(settings_.input);
+        // A code the reader does not know leaves no Bayer order: every later
+        // stage would fail with a message that points elsewhere.
+        const std::uint32_t cfa = input_.cfa();
+        if (cfa != kCfaRggb && cfa != kCfaGrbg && cfa != kCfaGbrg && cfa != kCfaBggr)
+            throw std::runtime_error(msg::kUnknownBayerOrder);
     } else {
         const int bits = settings_.bitRes == 0 ? 10 : settings_.bitRes;
+        // Read only here: a run without --raw never looks at it.
+        const config_node& legacyFormat = config_->find_path("raw.legacy_format");
+        check_int_range(*config_, legacyFormat, 0, 1);
         loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
-                          settings_.legacyFormat);
+                          legacyFormat.as_bool());
         if (!settings_.translate.empty())
             input_.storeKqraw(settings_.translate);
     }
@@ -419,7 +437,7 @@ void Pipeline::writeBinaryData() {
     parse_config_text(registerText_, *config_);
     if (!settings_.autofocus.empty()) {
         out() << "Reading autofocus calibration data." << std::endl;
-        read_config_file(settings_.autofocus, *config_);
+        readAutofocusFile(settings_.autofocus, *config_);
     }
     const blob::BlobSources sources = blob::blobSourcesFromConfig(*config_);
     timerLine(timer_, "Read calibration time: ", out());

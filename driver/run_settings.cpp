@@ -36,7 +36,6 @@ RunSettings readRunSettings(const CommandLine& line, const config_node& config) 
     s.blockName = config.find_path("shared.block_name").as_string();
     s.avgLuma = config.find_path("lsc.avg_luma").as_int();
     s.bitRes = config.find_path("shared.bit_res").as_int();
-    s.legacyFormat = config.find_path("raw.legacy_format").as_bool();
     if (s.blockNumFlag)
         s.controlPointInfix = ".ctrlPoints[" + std::to_string(s.blockNum) + "]";
     return s;

@@ -25,7 +25,6 @@ struct RunSettings {
     std::string blockName;
     int avgLuma = 0;
     int bitRes = 0;
-    bool legacyFormat = false;
     // ".ctrlPoints[<block_num>]" with shared.block_num_flag, else empty.
     std::string controlPointInfix;
 };

@@ -34,8 +34,7 @@ void checkAccepted(const HeaderlessRawDetails& d) {
         d.cfa == kCfaRggb || d.cfa == kCfaGrbg || d.cfa == kCfaBggr || d.cfa == kCfaGbrg;
     const bool serial =
         d.serialNumber.size() % 2 == 0 && d.serialNumber.size() <= 32 && isHexText(d.serialNumber);
-    const bool guid = d.sensorGuid.size() <= 16 && isHexText(d.sensorGuid);
-    if (!(sizes && bits && cfa && serial && guid))
+    if (!(sizes && bits && cfa && serial))
         std::abort();
 }
 

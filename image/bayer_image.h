@@ -49,6 +49,9 @@ public:
     // maxLength characters unless maxLength is 0. KQRAW: maxLength / 2 bytes
     // of the 16-byte binary field (all 16 at most) as lowercase hex digits.
     std::string serialNumber(std::size_t maxLength) const;
+    // True when the image carries a fixed header, the one raw header with a
+    // sensor GUID field.
+    bool hasFixedHeader() const;
     // KQRAW only: the text read as a hexadecimal number into the header.
     void setSensorGuid(const std::string& guidHex);
     bool samePixels(const BayerImage& other) const;

@@ -71,6 +71,10 @@ std::string BayerImage::serialNumber(std::size_t maxLength) const {
     return std::string();
 }
 
+bool BayerImage::hasFixedHeader() const {
+    return fixedHeaderOf(buffer_.get()) != nullptr;
+}
+
 void BayerImage::setSensorGuid(const std::string& guidHex) {
     if (!fixedHeaderOf(buffer_.get()))
         return;

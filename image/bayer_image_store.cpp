@@ -47,8 +47,12 @@ void BayerImage::storeKqraw(const std::string& path) const {
     if (img::copyRawMetadata(raw.get(), image) != img::MetadataCopy::kCopied)
         fail(img::msg::kCannotStoreKqraw);
     // An NKRAW image goes out as a fixed-header file: the KQRAW writer
-    // translates its capture data.
+    // translates its capture data. A capture described on the console has
+    // no raw file type to keep: written as a bare dump it could not be read
+    // back, so it is refused.
     const std::uint32_t fileType = raw->fileType == kFileNkRaw ? kFileKqRaw : raw->fileType;
+    if (fileType != kFileKqRaw && fileType != kFileKqRaw2)
+        fail(img::msg::kCannotStoreKqraw);
     if (rawWrite(path.c_str(), raw.get(), fileType) != img::kOk)
         fail(img::msg::kCannotStoreKqraw);
 }

@@ -54,4 +54,13 @@ std::string hexOfBytes(const std::uint8_t* bytes, std::size_t count) {
     return text;
 }
 
+bool isHexGuid(const std::string& text) noexcept {
+    if (text.empty() || text.size() > 16)
+        return false;
+    for (char c : text)
+        if (hexDigit(c) < 0)
+            return false;
+    return true;
+}
+
 } // namespace img

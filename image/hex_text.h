@@ -20,6 +20,10 @@ std::uint64_t parseHex64(const char* text) noexcept;
 // bytes. Returns the number of bytes stored.
 std::size_t parseHexBytes(const char* text, std::uint8_t* bytes, std::size_t capacity) noexcept;
 
+// True when `text` can be a sensor GUID of a fixed-header file: 1 to 16
+// hexadecimal digits (the 64-bit field), nothing else.
+bool isHexGuid(const std::string& text) noexcept;
+
 // Two lowercase hexadecimal digits a byte.
 std::string hexOfBytes(const std::uint8_t* bytes, std::size_t count);
 

@@ -55,6 +55,11 @@ inline constexpr char kGainAboveSuffix[] =
 inline constexpr char kPatchNotFoundPrefix[] = "patch containing ";
 inline constexpr char kPatchNotFoundSuffix[] = " not found.";
 
+// Sample count (lsc/sample_limit.h).
+inline constexpr char kTooManySamples[] =
+    "More than 250000 sample points: a fit takes at most 250000 (raise lsc.sampling_factor, or "
+    "use a sample file with fewer points).";
+
 // Progress lines.
 inline constexpr char kSampleCount[] = "Number of sample points = ";
 inline constexpr char kTargetValue[] = "Target value[";

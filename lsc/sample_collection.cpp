@@ -9,6 +9,7 @@
 
 #include "lsc/bayer_phase.h"
 #include "lsc/lsc_messages.h"
+#include "lsc/sample_limit.h"
 #include "lsc/patch_geometry.h"
 #include "lsc/sample_window.h"
 #include "lsc/target_levels.h"
@@ -144,6 +145,7 @@ void collectSamples(ProcessingContext& context, std::ostream& messages) {
     SampleTaker taker(image, margin, context.sampleWindow, samples);
     takeSineGrid(taker, image, context.sampleAngleStep);
     takeBorderLines(taker, image, breaks);
+    lsc::checkSampleCount(samples.size());
     context.samples = std::move(samples);
 
     const int filter = context.awbFilterSize / (2 * context.procSamplingFactor);

@@ -1,6 +1,7 @@
 #include "prep/sample_file.h"
 
 #include "image/output_file.h"
+#include "lsc/sample_limit.h"
 #include "prep/image_checks.h"
 #include "prep/number_line.h"
 #include "prep/prep_image.h"
@@ -162,6 +163,7 @@ SampleSet parseSampleFile(std::string_view text, std::int32_t width, std::int32_
         sample.x = static_cast<std::uint32_t>(x / factor);
         sample.y = static_cast<std::uint32_t>(y / factor);
         set.samples.push_back(sample);
+        lsc::checkSampleCount(set.samples.size());
     }
     return set;
 }

@@ -94,11 +94,17 @@ TEST_F(FieldValues, SerialLongerThanTheTrackingBlockIsRefused) {
 TEST_F(FieldValues, PostureIsTheCharacterBetweenQuotes) {
     EXPECT_EQ(postureCharacter(config, set("module.af.set[0].posture", "'H'")), 'H');
     EXPECT_EQ(postureCharacter(config, set("module.af.set[0].posture", "V")), 'V');
-    EXPECT_EQ(postureCharacter(config, set("module.af.set[0].posture", "Up")), 'U');
     EXPECT_EQ(postureCharacter(config, set("module.af.set[0].posture", "' '")), ' ');
     const config_node& empty = set("module.af.set[0].posture", "");
     EXPECT_EQ(failure([&] { postureCharacter(config, empty); }),
               "Value for module.af.set[0].posture is empty, a posture character is needed.");
+    // The block holds one character: the rest would be lost.
+    for (const char* text : {"Up", "'HV'"}) {
+        const config_node& longer = set("module.af.set[0].posture", text);
+        EXPECT_EQ(failure([&] { postureCharacter(config, longer); }),
+                  "Value for module.af.set[0].posture must be a single posture character.")
+            << text;
+    }
 }
 
 } // namespace

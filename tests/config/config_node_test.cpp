@@ -298,13 +298,13 @@ TEST_F(ConfigNodeTest, EntriesThatExistDoNotCountAgainstAPath) {
 
 TEST_F(ConfigNodeTest, PathLongerThanAKeyIsRefused) {
     std::string path = "a";
-    while (path.size() < 256)
+    while (path.size() < 1024)
         path += ".a";
-    path.resize(256);
+    path.resize(1024);
     path.back() = 'b';
     EXPECT_EQ(config.child_path(path).name(), "root.config." + path);
     EXPECT_EQ(messageOf([&] { config.child_path(path + "c"); }),
-              "Configuration path longer than 256 characters: " + path);
+              "Configuration path longer than 1024 characters: " + path);
     EXPECT_FALSE(config.find_path(path + "c").valid());
 }
 

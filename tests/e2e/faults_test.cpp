@@ -563,26 +563,5 @@ TEST_F(OutputPlacement, StandardOutputAsInformationFileKeepsEveryLine) {
     EXPECT_EQ(actual.back(), "Completed.");
 }
 
-TEST_F(OutputPlacement, FlattenedImageMayReplaceTheInputItWasMadeFrom) {
-    prepare();
-    const std::string input = read("flat.kqraw");
-    const auto elsewhere = calibrate({"--flat", "other.kqraw"});
-    ASSERT_EQ(elsewhere.status, 0) << elsewhere.out;
-    const auto over = calibrate({"--flat", "flat.kqraw"});
-    ASSERT_EQ(over.status, 0) << over.out;
-    EXPECT_NE(read("flat.kqraw"), input);
-    EXPECT_EQ(withoutCreationTime(read("flat.kqraw")), withoutCreationTime(read("other.kqraw")));
-}
-
-TEST_F(OutputPlacement, PreparedImageOverTheInputStillPassesTheIdentityTest) {
-    // Unfiltered and full size, the prepared image is the input itself.
-    prepare("proc.median_filter_flag = 0;\nshared.proc_sampling_factor = 1;\n");
-    const auto result = calibrate({"--kq", "--debug", "--preproc", "flat.kqraw"});
-    ASSERT_EQ(result.status, 0) << result.out;
-    EXPECT_TRUE(hasLine(result.out, "Performing identity test."));
-    EXPECT_FALSE(
-        hasLine(result.out, "WARNING - Not all output image pixels match input image pixels."));
-}
-
 } // namespace
 } // namespace e2e

@@ -1,0 +1,14 @@
+#include "lsc/sample_limit.h"
+
+#include "lsc/lsc_messages.h"
+
+#include <stdexcept>
+
+namespace lsc {
+
+void checkSampleCount(std::size_t count) {
+    if (count > kMaxSamples)
+        throw std::runtime_error(msg::kTooManySamples);
+}
+
+} // namespace lsc
