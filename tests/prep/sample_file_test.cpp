@@ -122,6 +122,17 @@ TEST(SampleFileParse, RefusesPointsOutsideTheImage) {
     EXPECT_EQ(parseError(head + "2591,1943,1,2,3,4\n"), "(no error)");
 }
 
+// The fit's limit: 250000 points pass, one more is refused while reading.
+TEST(SampleFileParse, SampleCountIsCapped) {
+    std::string text = "1,2,3,4\n648,486,4\n";
+    for (int i = 0; i < 250000; ++i)
+        text += "0,0,1,2,3,4\n";
+    EXPECT_EQ(prep::parseSampleFile(text, 162, 121, {1023, 4}).samples.size(), 250000u);
+    EXPECT_EQ(parseError(text + "0,0,1,2,3,4\n", 162, 121),
+              "More than 250000 sample points: a fit takes at most 250000 (raise "
+              "lsc.sampling_factor, or use a sample file with fewer points).");
+}
+
 TEST(SampleFile, WrittenFileReadsBackWithSamplingFactor) {
     TempDir dir;
     ProcessingContext written = contextWithImage(648, 486, 4);
