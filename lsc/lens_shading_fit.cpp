@@ -11,6 +11,7 @@
 #include "lsc/lsc_messages.h"
 #include "lsc/patch_geometry.h"
 #include "lsc/patch_surface.h"
+#include "lsc/sample_deviation.h"
 #include "lsc/working_image.h"
 
 namespace {
@@ -123,6 +124,9 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
         targets.push_back(
             targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], context.quiet, messages));
 
+    // Judged on the measured values, before they become gains.
+    FitDeviation deviations[kChannels];
+    measureSampleDeviations(image, context.samples, context.sampleWindow, deviations);
     turnSamplesIntoGains(context.samples, targets, context.greenBalance);
     checkGainSamples(context.samples, w, h, context.maxGain);
 
@@ -138,9 +142,8 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
                 surface.addValueConstraint(s.x, s.y, s.value[k]);
         surface.fit(kPatchTolerance, messages);
         surface.copyToGrid(grids[k]);
-        const FitDeviation deviation = fitDeviation(surface, context.samples, k, w, h, messages);
-        context.fitDeviationMax[k] = static_cast<float>(deviation.max);
-        context.fitDeviationRms[k] = static_cast<float>(deviation.rms);
+        context.fitDeviationMax[k] = static_cast<float>(deviations[k].max);
+        context.fitDeviationRms[k] = static_cast<float>(deviations[k].rms);
         if (context.logFitError && !context.quiet)
             messages << deviationLine(k, context.fitDeviationMax[k], context.fitDeviationRms[k])
                      << std::endl;
