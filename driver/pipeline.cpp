@@ -24,6 +24,7 @@
 #include "prep/delta_ab.h"
 #include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
+#include "prep/luminance_residual.h"
 #include "prep/mosaic_preparation.h"
 #include "prep/sample_file.h"
 #include "prep/white_balance.h"
@@ -31,6 +32,7 @@
 #include <boost/date_time/posix_time/posix_time.hpp>
 
 #include <algorithm>
+#include <charconv>
 #include <cmath>
 #include <fstream>
 #include <iostream>
@@ -74,6 +76,15 @@ std::pair<float, float> printColourRatios(const char* label, const float (&level
     out() << label << "R/G: " << red << std::endl;
     out() << label << "B/G: " << blue << std::endl;
     return {red, blue};
+}
+
+// Fixed-point text with `decimals` decimals, whatever the locale and the
+// message stream's state.
+std::string fixedText(double value, int decimals) {
+    char buffer[64];
+    const auto result =
+        std::to_chars(buffer, buffer + sizeof buffer, value, std::chars_format::fixed, decimals);
+    return result.ec == std::errc() ? std::string(buffer, result.ptr) : "?";
 }
 
 // The report's block grid: 16 blocks along the longer side, about square.
@@ -140,8 +151,10 @@ void Pipeline::runStages() {
     correct();
     beginStage("White balance");
     balanceWhite();
+    measureLuminance();
     beginStage("Delta ab");
     measureColourError();
+    checkLuminance();
     beginStage("Writing the flattened images");
     writeFlattenedImages();
 }
@@ -509,6 +522,24 @@ void Pipeline::measureColourError() {
         prep::writeStatsFile(settings_.stats, context_);
     prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
     timerLine(timer_, "Calculate delta ab time: ", out());
+}
+
+// Before delta ab, which turns the corrected image into display values.
+void Pipeline::measureLuminance() {
+    context_.lumaResidual = prep::luminanceResidual(context_);
+    report_.haveLuma = context_.lumaResidual >= 0.0f;
+    report_.lumaResidual = context_.lumaResidual;
+    report_.lumaBound = context_.maxLumaResidual;
+    // Only runs that set the bound print the figure, so that every other
+    // run's output stays as it was.
+    if (context_.maxLumaResidual > 0.0f && report_.haveLuma)
+        out() << "Maximum luminance residual: " << fixedText(100.0 * context_.lumaResidual, 2)
+              << " %" << std::endl;
+}
+
+// After delta ab, so that its files are written for a failed run too.
+void Pipeline::checkLuminance() {
+    prep::checkLuminanceResidual(context_.lumaResidual, context_.maxLumaResidual);
 }
 
 void Pipeline::writeFlattenedImages() {

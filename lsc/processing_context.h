@@ -48,6 +48,8 @@ struct ProcessingContext {
     int procSamplingFactor = 1;    // shared.proc_sampling_factor
     unsigned applyStep = 1;        // apply_lsc.sampling_factor
     float maxDeltaAb = 10.0f;
+    float maxLumaResidual = 0.0f;  // apply_lsc.max_luma_residual, per cent; 0: no bound
+    bool autoPatchLayout = false;  // lsc.patch_layout = auto: the fit picks the patch factors
     float lumaNormalizeFactor = 0.75f;
     int deltaAbBlocks[2] = {0, 0}; // horizontal, vertical
     float ccm[3][3] = {{1, 0, 0}, {0, 1, 0}, {0, 0, 1}};
@@ -69,4 +71,5 @@ struct ProcessingContext {
     float meanChroma = 0.0f;
     float maxDelta = 0.0f;
     float deltaStdDev = 0.0f;
+    float lumaResidual = -1.0f;     // fraction; negative: not measured
 };
