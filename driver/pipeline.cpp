@@ -19,6 +19,7 @@
 #include "image/output_file.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
+#include "lsc/patch_layout_choice.h"
 #include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
 #include "prep/delta_ab.h"
@@ -87,6 +88,14 @@ std::string fixedText(double value, int decimals) {
     return result.ec == std::errc() ? std::string(buffer, result.ptr) : "?";
 }
 
+// Up to six significant digits, as the register file writes the factors.
+std::string generalText(double value) {
+    char buffer[64];
+    const auto result =
+        std::to_chars(buffer, buffer + sizeof buffer, value, std::chars_format::general, 6);
+    return result.ec == std::errc() ? std::string(buffer, result.ptr) : "?";
+}
+
 // The report's block grid: 16 blocks along the longer side, about square.
 ChannelBlockMeans reportBlockMeans(const BayerImage& image) {
     const BlockGrid grid = blockGridFor(image.width(), image.height(), 16);
@@ -137,6 +146,10 @@ void Pipeline::runStages() {
     checkPreparedImage();
     writePreparedImage();
     buildSampleSet();
+    if (context_.autoPatchLayout) {
+        beginStage("Choosing the patch layout");
+        choosePatchLayout();
+    }
     beginStage("Obtaining the samples");
     obtainSamples();
     beginStage("Fitting the lens shading surface");
@@ -522,6 +535,36 @@ void Pipeline::measureColourError() {
         prep::writeStatsFile(settings_.stats, context_);
     prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
     timerLine(timer_, "Calculate delta ab time: ", out());
+}
+
+// The samples, the fit, the register file and the binary data then use the
+// chosen factors. Configured factors are replaced in the configuration too,
+// so that the binary data's geometry check compares with what was used.
+void Pipeline::choosePatchLayout() {
+    config_node& lsc = config_->child("lsc");
+    if (!lsc.find("left_patch_width").is_default() && lsc.find("leftPatchFactor").is_default())
+        throw std::runtime_error(msg::kAutoLayoutNeedsFactors);
+    const LayoutChoice choice = chooseLayout(prepared_, context_);
+    const PatchLayout& layout = choice.layout;
+    context_.leftFraction = layout.left;
+    context_.centerFraction = layout.center;
+    context_.topFraction = layout.top;
+    context_.middleFraction = layout.middle;
+    const std::pair<const char*, double> factors[] = {{"leftPatchFactor", layout.left},
+                                                      {"centerPatchFactor", layout.center},
+                                                      {"topPatchFactor", layout.top},
+                                                      {"middlePatchFactor", layout.middle}};
+    const bool configured = !lsc.find("leftPatchFactor").is_default();
+    std::string text;
+    for (const auto& [key, value] : factors) {
+        const std::string number = generalText(value);
+        if (configured)
+            lsc.child(key).set(number);
+        text += std::string(text.empty() ? "" : ", ") + key + " " + number;
+    }
+    out() << "Patch layout: " << text << " (the flattest of " << choice.candidates << ")"
+          << std::endl;
+    timerLine(timer_, "Patch layout time: ", out());
 }
 
 // Before delta ab, which turns the corrected image into display values.

@@ -49,6 +49,7 @@ private:
     void balanceWhite();
     void measureColourError();
     void measureLuminance();
+    void choosePatchLayout();
     void checkLuminance();
     void writeFlattenedImages();
     void finish();
