@@ -23,7 +23,9 @@ bool sameLayout(const PatchLayout& a, const PatchLayout& b) {
 void copyFitSettings(const ProcessingContext& from, ProcessingContext& to) {
     to.greenBalance = from.greenBalance;
     to.blackLevel = from.blackLevel;
-    to.sampleAngleStep = from.sampleAngleStep;
+    // Half the sample grid's density along each axis: a quarter of the fit's
+    // cost, and enough to rank the layouts (the run's own fit then uses all).
+    to.sampleAngleStep = 2 * from.sampleAngleStep;
     to.sampleMargin = from.sampleMargin;
     to.falloff = from.falloff;
     to.averageChannels = from.averageChannels;
