@@ -1,5 +1,6 @@
 #include "lsc/lens_shading_fit.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <ostream>
@@ -125,8 +126,10 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
             targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], context.quiet, messages));
 
     // Judged on the measured values, before they become gains.
+    const bool trial = context.trialChannel >= 0 && context.trialChannel < kChannels;
     FitDeviation deviations[kChannels];
-    measureSampleDeviations(image, context.samples, context.sampleWindow, deviations);
+    if (!trial)
+        measureSampleDeviations(image, context.samples, context.sampleWindow, deviations);
     turnSamplesIntoGains(context.samples, targets, context.greenBalance);
     checkGainSamples(context.samples, w, h, context.maxGain);
 
@@ -134,6 +137,8 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
     const std::vector<double> yBreaks(breaks.y, breaks.y + 4);
     float grids[kChannels][kGridPoints];
     for (int k = 0; k < kChannels; ++k) {
+        if (trial && k != context.trialChannel)
+            continue;
         if (!context.quiet)
             messages << lsc::msg::kFittingSurface << kChannelNames[k] << std::endl;
         patchSurface surface(3, 3, xBreaks, yBreaks);
@@ -148,6 +153,10 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
             messages << deviationLine(k, context.fitDeviationMax[k], context.fitDeviationRms[k])
                      << std::endl;
     }
+    if (trial)
+        for (int k = 0; k < kChannels; ++k)
+            std::copy(grids[context.trialChannel], grids[context.trialChannel] + kGridPoints,
+                      grids[k]);
     context.fitDeviationMeasured = true;
     checkDeviationBounds(context.fitDeviationRms, context.fitDeviationMax, context.maxRmsError,
                          context.maxError);

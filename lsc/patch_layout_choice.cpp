@@ -14,6 +14,9 @@ namespace {
 
 constexpr double kOuterFactors[] = {0.2, 0.3, 0.35, 0.4};
 constexpr std::uint32_t kFlatnessBlock = 16;
+// The trials fit and judge green/red alone: a quarter of the fit's cost, and
+// green carries the luminance shading whose steep corners decide the layout.
+constexpr int kTrialChannel = 1;
 
 bool sameLayout(const PatchLayout& a, const PatchLayout& b) {
     return a.left == b.left && a.center == b.center && a.top == b.top && a.middle == b.middle;
@@ -37,6 +40,7 @@ void copyFitSettings(const ProcessingContext& from, ProcessingContext& to) {
     to.procSamplingFactor = from.procSamplingFactor;
     to.quiet = true;
     to.logFitError = false;
+    to.trialChannel = kTrialChannel;
     to.applyStep = 1;
 }
 
@@ -58,7 +62,7 @@ std::vector<PatchLayout> candidateLayouts(const ProcessingContext& settings, std
     return layouts;
 }
 
-double correctedFlatness(const BayerImage& corrected) {
+double correctedFlatness(const BayerImage& corrected, int channel) {
     const std::uint32_t width = static_cast<std::uint32_t>(corrected.width());
     const std::uint32_t height = static_cast<std::uint32_t>(corrected.height());
     const std::uint32_t columns = width / kFlatnessBlock, rows = height / kFlatnessBlock;
@@ -77,6 +81,8 @@ double correctedFlatness(const BayerImage& corrected) {
     double worst = 0.0;
     const std::size_t blocks = std::size_t(columns) * rows;
     for (int k = 0; k < kChannels; ++k) {
+        if (channel >= 0 && k != channel)
+            continue;
         double mean = 0.0;
         for (std::size_t b = 0; b < blocks; ++b)
             mean += sums[b * kChannels + k];
@@ -116,7 +122,7 @@ LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& s
             fitLensShading(trial, quiet);
             trial.image.copy(prepared);  // the fit took the black level out of its copy
             applyLensShading(trial);
-            flatness = correctedFlatness(trial.corrected);
+            flatness = correctedFlatness(trial.corrected, kTrialChannel);
         } catch (const std::bad_alloc&) {
             throw;
         } catch (...) {

@@ -21,11 +21,11 @@ struct PatchLayout {
 std::vector<PatchLayout> candidateLayouts(const ProcessingContext& settings, std::uint32_t width,
                                           std::uint32_t height);
 
-// How far the corrected image is from flat: over the four channels, the
-// largest |16 x 16-pixel block mean / channel mean - 1| (blocks wholly inside
-// the image). Blocks that large keep the noise of one capture small against
-// what the layouts change.
-double correctedFlatness(const BayerImage& corrected);
+// How far the corrected image is from flat: the largest |16 x 16-pixel block
+// mean / channel mean - 1| of `channel` (blocks wholly inside the image), or
+// over the four channels for -1. Blocks that large keep the noise of one
+// capture small against what the layouts change.
+double correctedFlatness(const BayerImage& corrected, int channel = -1);
 
 struct LayoutChoice {
     PatchLayout layout;
@@ -34,9 +34,10 @@ struct LayoutChoice {
     std::vector<double> flatness;    // per candidate; negative when its fit failed
 };
 
-// Collects the samples, fits and corrects the prepared image (black level
-// included, as the run holds it) with each candidate, using the fit settings
-// of `settings` quietly, and picks the flattest; a candidate whose fit fails
+// Collects the samples (at half the grid's density along each axis), fits
+// and corrects the prepared image (black level included, as the run holds
+// it) with each candidate, using the fit settings of `settings` quietly but
+// for green/red alone, and picks the one that leaves green/red flattest; a candidate whose fit fails
 // is skipped, and when all fail the configured layout stays (the run's own
 // fit then reports why). The first of equally flat candidates wins.
 LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& settings);

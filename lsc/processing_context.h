@@ -43,6 +43,10 @@ struct ProcessingContext {
     float maxRmsError = 0.2f;      // lsc.max_rms_err: bound of each channel's RMS fit deviation
     float maxError = 0.2f;         // lsc.max_err: bound of each channel's largest fit deviation
     bool logFitError = false;      // lsc.log_err_flag: print the fit deviation of each channel
+    // The automatic layout's trial fits: 0..3 fits that channel alone (the
+    // other grids get copies of it) and skips the sample deviation check,
+    // which does not depend on the layout; -1 (the run's fit): everything.
+    int trialChannel = -1;
 
     // Preparation and evaluation settings
     int procSamplingFactor = 1;    // shared.proc_sampling_factor
