@@ -75,7 +75,7 @@ const Setting kSettings[] = {
     {"default", ""},
     {"window5", "lsc.sample_window = 5;\n"},
     {"recommended", "lsc.sample_window = 5;\nlsc.patch_layout = auto;\n"
-                    "apply_lsc.max_luma_residual = 5;\n"},
+                    "apply_lsc.max_luma_residual = 3;\n"},
 };
 
 bool quick() {

@@ -259,8 +259,9 @@ std::string shadingSection(const RunReport& report) {
                 (report.lumaBound > 0.0f
                      ? "bound <span id=\"luma-bound\">" + formatGeneral(report.lumaBound, 6) +
                            " %</span>, " +
-                           (within ? "<span class=\"ok\">within</span>"
-                                   : "<span class=\"bad\">above the bound</span>")
+                           (within ? "<span id=\"luma-result\" class=\"ok\">within</span>"
+                                   : "<span id=\"luma-result\" class=\"bad\">above the "
+                                     "bound</span>")
                      : std::string("no bound set")) +
                 ").</p>";
     }
