@@ -129,7 +129,9 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
     const bool trial = context.trialChannel >= 0 && context.trialChannel < kChannels;
     FitDeviation deviations[kChannels];
     if (!trial)
-        measureSampleDeviations(image, context.samples, context.sampleWindow, deviations);
+        measureSampleDeviations(image, context.samples, context.sampleWindow,
+                                context.samplesFromImage,
+                                context.samplesFromImage ? 0.0f : context.blackLevel, deviations);
     turnSamplesIntoGains(context.samples, targets, context.greenBalance);
     checkGainSamples(context.samples, w, h, context.maxGain);
 

@@ -61,6 +61,9 @@ struct ProcessingContext {
     // Fit results
     float targetLevels[kChannels] = {0, 0, 0, 0};
     std::vector<shadingSample> samples;
+    // True when collectSamples took the samples from the working image (and
+    // took the black level out of it); false for samples read from a file.
+    bool samplesFromImage = false;
     float controlGrids[kChannels][kGridPoints] = {};
     // How far each channel's fitted surface lies from its gain samples, in
     // gain units; set once all four channels are fitted, also when a bound

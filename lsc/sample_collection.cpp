@@ -145,6 +145,7 @@ void collectSamples(ProcessingContext& context, std::ostream& messages) {
     takeSineGrid(taker, image, context.sampleAngleStep);
     takeBorderLines(taker, image, breaks);
     context.samples = std::move(samples);
+    context.samplesFromImage = true;
 
     const int filter = context.awbFilterSize / (2 * context.procSamplingFactor);
     const int windowSize = filter > 0 ? (filter & ~1) | 1 : 1;

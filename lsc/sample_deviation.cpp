@@ -64,12 +64,15 @@ double bend(const double t[3], const float v[3], int sample) {
 } // namespace
 
 void measureSampleDeviations(const WorkingImage& image, const std::vector<shadingSample>& samples,
-                             int sampleWindow, FitDeviation deviations[kChannels]) {
+                             int sampleWindow, bool samplesFromImage, float blackLevel,
+                             FitDeviation deviations[kChannels]) {
     const int window = std::max(kCheckWindow, sampleWindow);
     const int phase = bayerPhase(image.cfa);
     auto medianLevels = [&](std::int64_t x, std::int64_t y, float levels[kChannels]) {
         windowMedians(image, phase, std::uint32_t(x) & ~1u, std::uint32_t(y) & ~1u, window,
                       levels);
+        for (int k = 0; k < kChannels; ++k)
+            levels[k] = std::max(0.0f, levels[k] - blackLevel);
     };
     const std::int64_t width = image.width, height = image.height;
     // Neighbours' windows just clear of the sample's (2 x window pixels wide).
@@ -110,9 +113,12 @@ void measureSampleDeviations(const WorkingImage& image, const std::vector<shadin
             }
         }
         for (int k = 0; k < kChannels; ++k) {
-            double worst = std::fabs(std::log(double(s.value[k]) / centre[k]));
-            if (!std::isfinite(worst))
-                worst = kInfinity;
+            double worst = 0.0;
+            if (samplesFromImage) {
+                worst = std::fabs(std::log(double(s.value[k]) / centre[k]));
+                if (!std::isfinite(worst))
+                    worst = kInfinity;
+            }
             if (haveX)
                 worst = std::max(worst, bend(tx, alongX[k], sampleX));
             if (haveY)

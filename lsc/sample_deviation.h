@@ -32,7 +32,11 @@ inline constexpr int kCheckWindow = 5;
 // borders, so it bends by a per cent or two between points that close; a
 // blotch of 15 % on the sample bends it by about 0.3, a defect or a blotch
 // that the sample sees and its window does not shows as an outlier.
+// Samples read from a file may come from another capture: then only the
+// bend counts, and the image, which still holds the black level, has
+// `blackLevel` taken off its medians (with samples from the image, pass 0).
 // max and rms are over the samples; a level that is not positive gives
 // infinity.
 void measureSampleDeviations(const WorkingImage& image, const std::vector<shadingSample>& samples,
-                             int sampleWindow, FitDeviation deviations[kChannels]);
+                             int sampleWindow, bool samplesFromImage, float blackLevel,
+                             FitDeviation deviations[kChannels]);
