@@ -167,6 +167,7 @@ void Pipeline::runStages() {
     measureLuminance();
     beginStage("Delta ab");
     measureColourError();
+    beginStage("Luminance residual");
     checkLuminance();
     beginStage("Writing the flattened images");
     writeFlattenedImages();
