@@ -36,6 +36,7 @@ inline constexpr char kTooLow[] = " is too low, value must be between ";
 inline constexpr char kTooHigh[] = " is too high, value must be between ";
 inline constexpr char kAnd[] = " and ";
 inline constexpr char kMustBeOdd[] = " must be odd.";
+inline constexpr char kMustBeConfigOrAuto[] = " must be config or auto.";
 inline constexpr char kEmptyBlockName[] = "Empty string not allowed for shared.block_name.";
 inline constexpr char kBadBlockName[] =
     "Value for shared.block_name may only consist of letters, digits, dashes, and underscores "

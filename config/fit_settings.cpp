@@ -86,6 +86,8 @@ void load_fit_settings(const config_node& config, const BayerImage& image,
     context.logFitError = setting(config, "lsc", "log_err_flag").as_int() != 0;
     context.sampleWindow = setting(config, "lsc", "sample_window").as_int();
     context.maxDeltaAb = setting(config, "apply_lsc", "max_delta_ab").as_float();
+    context.maxLumaResidual = setting(config, "apply_lsc", "max_luma_residual").as_float();
+    context.autoPatchLayout = setting(config, "lsc", "patch_layout").as_string() == "auto";
     context.awbFilterSize = setting(config, "lsc", "awb_avg_filter_size").as_int();
     context.lumaNormalizeFactor = setting(config, "apply_lsc", "luma_normalize_factor").as_float();
     loadDeltaAbBlocks(config, width, height, context);

@@ -10,7 +10,8 @@
 
 namespace {
 
-enum class Check { None, Int, OddInt, Float };
+// Layout: the words "config" and "auto".
+enum class Check { None, Int, OddInt, Float, Layout };
 
 struct Parameter {
     const char* section;
@@ -73,10 +74,12 @@ constexpr Parameter kTable[] = {
     {"lsc", "avg_luma", "0", Check::Int, 0, 1},
     {"lsc", "awb_avg_filter_size", "100", Check::None, 0, 0},
     {"lsc", "sample_window", "1", Check::OddInt, 1, 15},
+    {"lsc", "patch_layout", "config", Check::Layout, 0, 0},
     {"apply_lsc", "max_delta_ab", "10.0", Check::Float, 0, 10},
     {"apply_lsc", "test_max_delta_ab", "0.0", Check::Float, 0, 10},
     {"apply_lsc", "sampling_factor", "4", Check::Int, 1, 100},
     {"apply_lsc", "luma_normalize_factor", "0.75", Check::Float, 0, 1.0},
+    {"apply_lsc", "max_luma_residual", "0", Check::Float, 0, 100},
 };
 
 const config_node& settingOf(const config_node& config, const Parameter& parameter) {
@@ -100,6 +103,14 @@ void checkEntry(const config_node& config, const Parameter& parameter) {
     }
     if (parameter.check == Check::None)
         return;
+    if (parameter.check == Check::Layout) {
+        const std::string value = node.as_string();
+        if (value != "config" && value != "auto")
+            throw std::range_error(config::msg::kValueSpecifiedFor +
+                                   config_relative_path(config, node) +
+                                   config::msg::kMustBeConfigOrAuto);
+        return;
+    }
     check_int_range(config, node, static_cast<int>(parameter.low),
                     static_cast<int>(parameter.high));
     // A window centred on a sample needs an odd size.

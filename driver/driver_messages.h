@@ -39,6 +39,9 @@ inline constexpr char kIdentityMismatch[] =
     "WARNING - Not all output image pixels match input image pixels.";
 
 // Binary calibration data
+inline constexpr char kAutoLayoutNeedsFactors[] =
+    "lsc.patch_layout = auto chooses patch factors; it cannot be used with patch sizes in pixels "
+    "(lsc.left_patch_width and the others).";
 inline constexpr char kBinaryNeedsCalibrate[] =
     "Binary calibration data (--binary) can only be built with a calibration register file "
     "(--calibrate).";

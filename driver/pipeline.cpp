@@ -22,11 +22,13 @@
 #include "image/output_file.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
+#include "lsc/patch_layout_choice.h"
 #include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
 #include "prep/delta_ab.h"
 #include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
+#include "prep/luminance_residual.h"
 #include "prep/mosaic_preparation.h"
 #include "prep/sample_file.h"
 #include "prep/white_balance.h"
@@ -34,6 +36,7 @@
 #include <boost/date_time/posix_time/posix_time.hpp>
 
 #include <algorithm>
+#include <charconv>
 #include <cmath>
 #include <iostream>
 #include <stdexcept>
@@ -64,6 +67,23 @@ std::pair<float, float> printColourRatios(const char* label, const float (&level
     out() << label << "R/G: " << red << std::endl;
     out() << label << "B/G: " << blue << std::endl;
     return {red, blue};
+}
+
+// Fixed-point text with `decimals` decimals, whatever the locale and the
+// message stream's state.
+std::string fixedText(double value, int decimals) {
+    char buffer[64];
+    const auto result =
+        std::to_chars(buffer, buffer + sizeof buffer, value, std::chars_format::fixed, decimals);
+    return result.ec == std::errc() ? std::string(buffer, result.ptr) : "?";
+}
+
+// Up to six significant digits, as the register file writes the factors.
+std::string generalText(double value) {
+    char buffer[64];
+    const auto result =
+        std::to_chars(buffer, buffer + sizeof buffer, value, std::chars_format::general, 6);
+    return result.ec == std::errc() ? std::string(buffer, result.ptr) : "?";
 }
 
 // The report's block grid: 16 blocks along the longer side, about square.
@@ -129,6 +149,10 @@ void Pipeline::runStages() {
     checkPreparedImage();
     writePreparedImage();
     buildSampleSet();
+    if (context_.autoPatchLayout) {
+        beginStage("Choosing the patch layout");
+        choosePatchLayout();
+    }
     beginStage("Obtaining the samples");
     obtainSamples();
     beginStage("Fitting the lens shading surface");
@@ -143,8 +167,11 @@ void Pipeline::runStages() {
     correct();
     beginStage("White balance");
     balanceWhite();
+    measureLuminance();
     beginStage("Delta ab");
     measureColourError();
+    beginStage("Luminance residual");
+    checkLuminance();
     beginStage("Writing the flattened images");
     writeFlattenedImages();
 }
@@ -524,6 +551,54 @@ void Pipeline::measureColourError() {
         prep::writeStatsFile(settings_.stats, context_);
     prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
     timerLine(timer_, "Calculate delta ab time: ", out());
+}
+
+// The samples, the fit, the register file and the binary data then use the
+// chosen factors. Configured factors are replaced in the configuration too,
+// so that the binary data's geometry check compares with what was used.
+void Pipeline::choosePatchLayout() {
+    config_node& lsc = config_->child("lsc");
+    if (!lsc.find("left_patch_width").is_default() && lsc.find("leftPatchFactor").is_default())
+        throw std::runtime_error(msg::kAutoLayoutNeedsFactors);
+    const LayoutChoice choice = chooseLayout(prepared_, context_);
+    const PatchLayout& layout = choice.layout;
+    context_.leftFraction = layout.left;
+    context_.centerFraction = layout.center;
+    context_.topFraction = layout.top;
+    context_.middleFraction = layout.middle;
+    const std::pair<const char*, double> factors[] = {{"leftPatchFactor", layout.left},
+                                                      {"centerPatchFactor", layout.center},
+                                                      {"topPatchFactor", layout.top},
+                                                      {"middlePatchFactor", layout.middle}};
+    const bool configured = !lsc.find("leftPatchFactor").is_default();
+    std::string text;
+    for (const auto& [key, value] : factors) {
+        const std::string number = generalText(value);
+        if (configured)
+            lsc.child(key).set(number);
+        text += std::string(text.empty() ? "" : ", ") + key + " " + number;
+    }
+    out() << "Patch layout: " << text << " (the flattest of " << choice.candidates << ")"
+          << std::endl;
+    timerLine(timer_, "Patch layout time: ", out());
+}
+
+// Before delta ab, which turns the corrected image into display values.
+void Pipeline::measureLuminance() {
+    context_.lumaResidual = prep::luminanceResidual(context_);
+    report_.haveLuma = context_.lumaResidual >= 0.0f;
+    report_.lumaResidual = context_.lumaResidual;
+    report_.lumaBound = context_.maxLumaResidual;
+    // Only runs that set the bound print the figure, so that every other
+    // run's output stays as it was.
+    if (context_.maxLumaResidual > 0.0f && report_.haveLuma)
+        out() << "Maximum luminance residual: " << fixedText(100.0 * context_.lumaResidual, 2)
+              << " %" << std::endl;
+}
+
+// After delta ab, so that its files are written for a failed run too.
+void Pipeline::checkLuminance() {
+    prep::checkLuminanceResidual(context_.lumaResidual, context_.maxLumaResidual);
 }
 
 void Pipeline::writeFlattenedImages() {

@@ -48,6 +48,9 @@ private:
     void correct();
     void balanceWhite();
     void measureColourError();
+    void measureLuminance();
+    void choosePatchLayout();
+    void checkLuminance();
     void writeFlattenedImages();
     void finish();
     // When `path` is set: the message line, store(path), the timer line.

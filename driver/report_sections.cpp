@@ -250,6 +250,21 @@ std::string shadingSection(const RunReport& report) {
     body += "<table id=\"shading-figures\" class=\"numbers\"><thead>" + header +
             "</tr></thead><tbody>" + darkest + "</tr>" + residual + "</tr>";
     body += "</tbody></table>";
+    if (report.haveLuma) {
+        const bool within =
+            report.lumaBound <= 0.0f || report.lumaResidual * 100.0f <= report.lumaBound;
+        body += "<p id=\"luma-residual\">Largest luminance residual over the delta ab blocks: "
+                "&#177;<span id=\"luma-residual-value\">" +
+                percent(100.0 * report.lumaResidual, 2) + "</span> (" +
+                (report.lumaBound > 0.0f
+                     ? "bound <span id=\"luma-bound\">" + formatGeneral(report.lumaBound, 6) +
+                           " %</span>, " +
+                           (within ? "<span id=\"luma-result\" class=\"ok\">within</span>"
+                                   : "<span id=\"luma-result\" class=\"bad\">above the "
+                                     "bound</span>")
+                     : std::string("no bound set")) +
+                ").</p>";
+    }
     return section("shading", title, body);
 }
 

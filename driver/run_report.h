@@ -60,6 +60,11 @@ struct RunReport {
     float measuredRatios[2] = {0, 0};   // R/G, B/G before correction (target levels)
     float flattenedRatios[2] = {0, 0};  // R/G, B/G after white balance
 
+    // Luminance residual of the white-balanced image over the delta-ab grid
+    bool haveLuma = false;
+    float lumaResidual = 0.0f;  // fraction
+    float lumaBound = 0.0f;     // per cent; 0: no bound
+
     // Delta ab, when the stage ran
     bool haveDelta = false;
     int deltaColumns = 0, deltaRows = 0;

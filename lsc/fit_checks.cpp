@@ -33,27 +33,6 @@ std::string gainText(float value) {
 
 } // namespace
 
-FitDeviation fitDeviation(const patchSurface& surface, const std::vector<shadingSample>& samples,
-                          int channel, std::uint32_t width, std::uint32_t height,
-                          std::ostream& messages) {
-    FitDeviation deviation;
-    double sumOfSquares = 0.0;
-    std::size_t count = 0;
-    for (const shadingSample& s : samples) {
-        if (s.x >= width || s.y >= height)
-            continue;
-        const double difference = std::fabs(surface.value(s.x, s.y, messages) - s.value[channel]);
-        // Written so that a NaN difference becomes the maximum.
-        if (!(difference <= deviation.max))
-            deviation.max = difference;
-        sumOfSquares += difference * difference;
-        ++count;
-    }
-    if (count > 0)
-        deviation.rms = std::sqrt(sumOfSquares / static_cast<double>(count));
-    return deviation;
-}
-
 std::string deviationLine(int channel, float max, float rms) {
     return kChannelNames[channel] + std::string(lsc::msg::kDeviationLine) + " " +
            numberText(max, std::chars_format::fixed, 5) + " " +

@@ -8,24 +8,16 @@
 #include <string>
 #include <vector>
 
-#include "lsc/patch_surface.h"
 #include "lsc/processing_context.h"
 
-// Absolute differences, in gain units, between a fitted surface and the
-// gains it was fitted to.
+// The largest and the RMS deviation of one channel (see sample_deviation.h).
 struct FitDeviation {
     double max = 0.0;
     double rms = 0.0;
 };
 
-// Deviation of `surface` from channel `channel` of the samples the fit used
-// (those inside width x height); zeros when there are none.
-FitDeviation fitDeviation(const patchSurface& surface, const std::vector<shadingSample>& samples,
-                          int channel, std::uint32_t width, std::uint32_t height,
-                          std::ostream& messages);
-
 // "<channel name> deviation max, rms: <max> <rms>", both figures in
-// fixed-point with five decimals (gain units), e.g.
+// fixed-point with five decimals, e.g.
 // "red deviation max, rms: 0.00412 0.00131".
 std::string deviationLine(int channel, float max, float rms);
 

@@ -1,5 +1,6 @@
 #include "lsc/lens_shading_fit.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <ostream>
@@ -11,6 +12,7 @@
 #include "lsc/lsc_messages.h"
 #include "lsc/patch_geometry.h"
 #include "lsc/patch_surface.h"
+#include "lsc/sample_deviation.h"
 #include "lsc/working_image.h"
 
 namespace {
@@ -123,6 +125,13 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
         targets.push_back(
             targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], context.quiet, messages));
 
+    // Judged on the measured values, before they become gains.
+    const bool trial = context.trialChannel >= 0 && context.trialChannel < kChannels;
+    FitDeviation deviations[kChannels];
+    if (!trial)
+        measureSampleDeviations(image, context.samples, context.sampleWindow,
+                                context.samplesFromImage,
+                                context.samplesFromImage ? 0.0f : context.blackLevel, deviations);
     turnSamplesIntoGains(context.samples, targets, context.greenBalance);
     checkGainSamples(context.samples, w, h, context.maxGain);
 
@@ -130,6 +139,8 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
     const std::vector<double> yBreaks(breaks.y, breaks.y + 4);
     float grids[kChannels][kGridPoints];
     for (int k = 0; k < kChannels; ++k) {
+        if (trial && k != context.trialChannel)
+            continue;
         if (!context.quiet)
             messages << lsc::msg::kFittingSurface << kChannelNames[k] << std::endl;
         patchSurface surface(3, 3, xBreaks, yBreaks);
@@ -138,13 +149,16 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
                 surface.addValueConstraint(s.x, s.y, s.value[k]);
         surface.fit(kPatchTolerance, messages);
         surface.copyToGrid(grids[k]);
-        const FitDeviation deviation = fitDeviation(surface, context.samples, k, w, h, messages);
-        context.fitDeviationMax[k] = static_cast<float>(deviation.max);
-        context.fitDeviationRms[k] = static_cast<float>(deviation.rms);
+        context.fitDeviationMax[k] = static_cast<float>(deviations[k].max);
+        context.fitDeviationRms[k] = static_cast<float>(deviations[k].rms);
         if (context.logFitError && !context.quiet)
             messages << deviationLine(k, context.fitDeviationMax[k], context.fitDeviationRms[k])
                      << std::endl;
     }
+    if (trial)
+        for (int k = 0; k < kChannels; ++k)
+            std::copy(grids[context.trialChannel], grids[context.trialChannel] + kGridPoints,
+                      grids[k]);
     context.fitDeviationMeasured = true;
     checkDeviationBounds(context.fitDeviationRms, context.fitDeviationMax, context.maxRmsError,
                          context.maxError);

@@ -43,11 +43,17 @@ struct ProcessingContext {
     float maxRmsError = 0.2f;      // lsc.max_rms_err: bound of each channel's RMS fit deviation
     float maxError = 0.2f;         // lsc.max_err: bound of each channel's largest fit deviation
     bool logFitError = false;      // lsc.log_err_flag: print the fit deviation of each channel
+    // The automatic layout's trial fits: 0..3 fits that channel alone (the
+    // other grids get copies of it) and skips the sample deviation check,
+    // which does not depend on the layout; -1 (the run's fit): everything.
+    int trialChannel = -1;
 
     // Preparation and evaluation settings
     int procSamplingFactor = 1;    // shared.proc_sampling_factor
     unsigned applyStep = 1;        // apply_lsc.sampling_factor
     float maxDeltaAb = 10.0f;
+    float maxLumaResidual = 0.0f;  // apply_lsc.max_luma_residual, per cent; 0: no bound
+    bool autoPatchLayout = false;  // lsc.patch_layout = auto: the fit picks the patch factors
     float lumaNormalizeFactor = 0.75f;
     int deltaAbBlocks[2] = {0, 0}; // horizontal, vertical
     float ccm[3][3] = {{1, 0, 0}, {0, 1, 0}, {0, 0, 1}};
@@ -55,6 +61,9 @@ struct ProcessingContext {
     // Fit results
     float targetLevels[kChannels] = {0, 0, 0, 0};
     std::vector<shadingSample> samples;
+    // True when collectSamples took the samples from the working image (and
+    // took the black level out of it); false for samples read from a file.
+    bool samplesFromImage = false;
     float controlGrids[kChannels][kGridPoints] = {};
     // How far each channel's fitted surface lies from its gain samples, in
     // gain units; set once all four channels are fitted, also when a bound
@@ -69,4 +78,5 @@ struct ProcessingContext {
     float meanChroma = 0.0f;
     float maxDelta = 0.0f;
     float deltaStdDev = 0.0f;
+    float lumaResidual = -1.0f;     // fraction; negative: not measured
 };

@@ -147,6 +147,7 @@ void collectSamples(ProcessingContext& context, std::ostream& messages) {
     takeBorderLines(taker, image, breaks);
     lsc::checkSampleCount(samples.size());
     context.samples = std::move(samples);
+    context.samplesFromImage = true;
 
     const int filter = context.awbFilterSize / (2 * context.procSamplingFactor);
     const int windowSize = filter > 0 ? (filter & ~1) | 1 : 1;

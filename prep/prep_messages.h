@@ -61,5 +61,10 @@ inline constexpr char kNoGreenSignal[] =
 inline constexpr char kCannotOpenFile[] = "Cannot open file : ";
 inline constexpr char kCannotWriteFile[] = "Cannot write file : ";
 inline constexpr char kDeltaAboveThreshold[] = "Maximum delta ab is greater than threshold of ";
+inline constexpr char kLumaAboveThreshold[] =
+    "Maximum luminance residual is greater than threshold of ";
+inline constexpr char kLumaNotMeasured[] =
+    "The luminance residual cannot be measured: the flattened image does not fill the delta ab "
+    "block grid or holds no light.";
 
 } // namespace prep::msg

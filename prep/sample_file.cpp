@@ -193,6 +193,7 @@ void readSampleFile(const std::string& path, ProcessingContext& context, std::ui
                                     {fullScale, context.procSamplingFactor});
     std::copy(std::begin(set.targetLevels), std::end(set.targetLevels), context.targetLevels);
     context.samples = std::move(set.samples);
+    context.samplesFromImage = false;
 }
 
 } // namespace prep

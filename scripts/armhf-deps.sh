@@ -13,6 +13,7 @@ packages=(
     libboost-iostreams-dev:armhf libboost-date-time-dev:armhf
     libjpeg-dev:armhf libtiff-dev:armhf libssl-dev:armhf
     libgtest-dev:armhf
+    nlohmann-json3-dev      # header-only (any architecture): flatgen and the tests
 )
 
 before_install() {

@@ -8,6 +8,7 @@ packages=(
     libboost-dev libboost-program-options-dev libboost-iostreams-dev libboost-date-time-dev
     libjpeg-dev libtiff-dev libssl-dev
     libgtest-dev libbenchmark-dev
+    nlohmann-json3-dev      # flatgen and the tests read the tuning files of measured modules
     libjpeg-turbo-progs libtiff-tools
     python3                 # the report tests check the page with Python's HTML parser
 )

@@ -4,6 +4,7 @@
 
 #include "image/output_file.h"
 #include "tests/support/flat_field.h"
+#include "tests/support/module_shading.h"
 
 #include <charconv>
 #include <cstdio>
@@ -36,7 +37,16 @@ const char kHelp[] =
     "  --channel-levels R,GR,GB,B\n"
     "                          channel levels relative to green [0.55,1,1,0.65]\n"
     "  --colour-shading F      extra fall of red and rise of blue at the corners [0.08]\n"
+    "  --shading FILE          render the shading measured on a real module: a tuning file\n"
+    "                          with an rpi.alsc block (luminance and colour tables); the\n"
+    "                          brightest green lies at --level; --corner, --centre,\n"
+    "                          --channel-levels and --colour-shading are then unused\n"
+    "  --ct K                  colour temperature whose colour tables --shading takes\n"
+    "                          (the nearest one) [5000]\n"
     "  --noise F               noise standard deviation, fraction of full scale [0]\n"
+    "  --full-well E           photon shot noise of a pixel holding E electrons at full\n"
+    "                          scale; 0: none [0]\n"
+    "  --read-noise N          read noise standard deviation, in sample units [0]\n"
     "  --defects N             hot and dead pixels at random positions [0]\n"
     "  --black-level N         pedestal added to every sample, in sample units [0]\n"
     "  --seed N                seed of the noise and defect positions [1]\n"
@@ -52,6 +62,8 @@ struct Options {
     std::string format = "kqraw2";
     std::string output;
     std::string details;
+    std::string shadingFile;
+    double colourTemperature = 5000.0;
 };
 
 class UsageError : public std::runtime_error {
@@ -128,8 +140,16 @@ void applyOption(Options& options, const std::string& name, const std::string& v
             shape.channelLevel[k] = levels[std::size_t(k)];
     } else if (name == "colour-shading" || name == "color-shading") {
         shape.colourShading = parseDouble(name, value);
+    } else if (name == "shading") {
+        options.shadingFile = value;
+    } else if (name == "ct") {
+        options.colourTemperature = parseDouble(name, value);
     } else if (name == "noise") {
         shape.noise = parseDouble(name, value);
+    } else if (name == "full-well") {
+        shape.fullWell = parseDouble(name, value);
+    } else if (name == "read-noise") {
+        shape.readNoise = parseDouble(name, value);
     } else if (name == "defects") {
         shape.defects = parseInt<int>(name, value);
     } else if (name == "black-level") {
@@ -188,7 +208,11 @@ void writeOrThrow(const std::string& path, const std::string& bytes) {
 }
 
 void generate(const Options& options) {
-    const FlatField field = makeFlatField(options.shape);
+    FlatFieldShape shape = options.shape;
+    if (!options.shadingFile.empty())
+        shape.module = std::make_shared<const ModuleShading>(
+            ModuleShading::fromTuningFile(options.shadingFile, options.colourTemperature));
+    const FlatField field = makeFlatField(shape);
     if (options.format == "kqraw") {
         writeOrThrow(options.output, fixedHeaderFileBytes(field, options.capture));
     } else if (options.format == "raw") {

@@ -133,6 +133,18 @@ TEST_F(ParameterTableTest, SectionsAreCheckedInTableOrder) {
               "and 100.");
 }
 
+TEST_F(ParameterTableTest, PatchLayoutAndLuminanceBoundHaveTheirOwnChecks) {
+    EXPECT_EQ(config.find_path("lsc.patch_layout").as_string(), "config");
+    EXPECT_EQ(config.find_path("apply_lsc.max_luma_residual").as_string(), "0");
+    EXPECT_EQ(validationError("lsc.patch_layout = auto; apply_lsc.max_luma_residual = 100;"),
+              "(valid)");
+    EXPECT_EQ(validationError("apply_lsc.max_luma_residual = 100.5;"),
+              "Value specified for apply_lsc.max_luma_residual is too high, value must be "
+              "between 0 and 100.");
+    EXPECT_EQ(validationError("apply_lsc.max_luma_residual = 0; lsc.patch_layout = Auto;"),
+              "Value specified for lsc.patch_layout must be config or auto.");
+}
+
 TEST_F(ParameterTableTest, SampleWindowMustBeOddFromOneToFifteen) {
     EXPECT_EQ(config.find_path("lsc.sample_window").as_string(), "1");
     EXPECT_TRUE(config.find_path("lsc.sample_window").is_default());

@@ -130,6 +130,17 @@ TEST_F(ReportPage, ShowsTheShadingBeforeAndTheResidualAfterInPerCent) {
                                                                "1.25 %"});
 }
 
+TEST_F(ReportPage, ShowsTheLuminanceResidualAgainstItsBound) {
+    RunReport report = report_test::exampleRunReport();
+    report.haveLuma = true;
+    report.lumaResidual = 0.0234f;
+    report.lumaBound = 3.0f;
+    expectValidPage(report, {"--expect=luma-residual-value=2.34 %", "--expect=luma-bound=3 %",
+                             "--expect=luma-result=within"});
+    report.lumaBound = 2.0f;
+    expectValidPage(report, {"--expect=luma-result=above the bound"});
+}
+
 TEST_F(ReportPage, InDebugModeExposureAndGainsShowThreeDecimals) {
     RunReport report = report_test::exampleRunReport();
     report.inspectionInFixedNotation = true;

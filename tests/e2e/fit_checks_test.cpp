@@ -147,6 +147,16 @@ TEST_F(FitChecks, CornerTooDarkToCorrectMeetsTheGainCeiling) {
     EXPECT_EQ(result.status, 0) << result.out;
 }
 
+TEST_F(FitChecks, SamplesFromAFileAreJudgedOnTheCaptureWithoutItsBlackLevel) {
+    FlatFieldShape shape = smallShape();
+    shape.blackLevel = 64;
+    prepare("proc.black_level = 64;", shape);
+    const auto first = calibrate({"--kq", "--outsamples", "samples.txt"});
+    ASSERT_EQ(first.status, 0) << first.out;
+    const auto second = calibrate({"--kq", "--samples", "samples.txt"});
+    EXPECT_EQ(second.status, 0) << second.out;
+}
+
 TEST_F(FitChecks, SampleWindowMustBeOddFromOneToFifteen) {
     prepare();
     const std::pair<const char*, const char*> cases[] = {

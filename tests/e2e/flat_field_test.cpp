@@ -2,6 +2,7 @@
 // and the bundled example files.
 
 #include "tests/support/flat_field.h"
+#include "tests/support/module_shading.h"
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
 
@@ -13,6 +14,7 @@
 #include <map>
 #include <set>
 #include <sstream>
+#include <tuple>
 
 #include <gtest/gtest.h>
 
@@ -555,3 +557,108 @@ TEST(ExampleFiles, ConfigurationValuesLieInTheirRanges) {
 }
 
 } // namespace
+
+// ---- shading measured on real modules ------------------------------------------
+
+// A tuning file whose cell (column c, row r) has luminance gain 1 + c / 16 +
+// r / 8 and colour gains Cr = 2 and Cb = 1.5 at 3000 K, 1.5 and 2 at 6000 K.
+std::string syntheticTuning() {
+    std::ostringstream lum, cr3000, cb3000, cr6000, cb6000;
+    for (int r = 0; r < 12; ++r)
+        for (int c = 0; c < 16; ++c) {
+            const char* comma = r + c > 0 ? ", " : "";
+            lum << comma << 1.0 + c / 16.0 + r / 8.0;
+            cr3000 << comma << 2.0;
+            cb3000 << comma << 1.5;
+            cr6000 << comma << 1.5;
+            cb6000 << comma << 2.0;
+        }
+    return "{\"version\": 2.0, \"algorithms\": [{\"rpi.black_level\": {}}, {\"rpi.alsc\": {"
+           "\"luminance_lut\": [" + lum.str() + "],"
+           "\"calibrations_Cr\": [{\"ct\": 3000, \"table\": [" + cr3000.str() + "]},"
+           "{\"ct\": 6000, \"table\": [" + cr6000.str() + "]}],"
+           "\"calibrations_Cb\": [{\"ct\": 3000, \"table\": [" + cb3000.str() + "]},"
+           "{\"ct\": 6000, \"table\": [" + cb6000.str() + "]}]}}]}";
+}
+
+TEST(ModuleShadingRender, CellCentresCarryTheTableValuesAtTheNearestColourTemperature) {
+    TempDir dir;
+    writeFile(dir.file("tuning.json"), syntheticTuning());
+    // 41 pixels a cell: every cell centre falls on a pixel centre.
+    FlatFieldShape shape;
+    shape.width = 16 * 41;
+    shape.height = 12 * 41;
+    shape.bits = 16;
+    for (const auto& [temperature, cr, cb] : {std::tuple{3500.0, 2.0, 1.5}, {5000.0, 1.5, 2.0}}) {
+        shape.module = std::make_shared<const ModuleShading>(
+            ModuleShading::fromTuningFile(dir.file("tuning.json"), temperature));
+        const FlatField field = makeFlatField(shape);
+        for (int r = 0; r < 12; ++r)
+            for (int c = 0; c < 16; ++c) {
+                const int x = 41 * c + 20, y = 41 * r + 20;
+                const int k = field.channelAt(x, y);
+                // Relative to the brightest green, 1 / lum of cell (0, 0) = 1 / 1.
+                const double lum = 1.0 + c / 16.0 + r / 8.0;
+                const double colour = k == 0 ? cr : k == 3 ? cb : 1.0;
+                const double expected = shape.centerLevel / (lum * colour);
+                EXPECT_NEAR(field.exact[std::size_t(y) * shape.width + x], expected, 1e-6)
+                    << temperature << " cell " << c << "," << r;
+                EXPECT_NEAR(field.samples[std::size_t(y) * shape.width + x] / 65535.0, expected,
+                            1e-5);
+            }
+        // Beyond the outer centres the shading keeps falling.
+        EXPECT_LT(field.exact[std::size_t(shape.height - 1) * shape.width + shape.width - 2],
+                  field.exact[std::size_t(12 * 41 - 21) * shape.width + 16 * 41 - 22]);
+    }
+}
+
+TEST(ModuleShadingRender, ReadsTheModulesTablesAndRefusesFilesItCannotUse) {
+    const ModuleShading imx219 = ModuleShading::fromTuningFile(
+        std::string(LSC_SOURCE_DIR) + "/tests/data/real_modules/rpi_imx219.json", 5900);
+    EXPECT_EQ(imx219.crTemperature, 6000);
+    // Green 1 / lum relative to the brightest (lum 1.004); red also / Cr.
+    EXPECT_NEAR(imx219.cell(1, 0, 0), 1.004 / 2.716, 1e-12);
+    EXPECT_NEAR(imx219.cell(0, 0, 0), 1.004 / (2.716 * 2.179), 1e-12);
+    EXPECT_NEAR(imx219.cell(3, 0, 0), 1.004 / (2.716 * 1.374), 1e-12);
+
+    TempDir dir;
+    const std::pair<const char*, const char*> bad[] = {
+        {"not json", "not a JSON file"},
+        {"{\"algorithms\": [{\"rpi.awb\": {}}]}", "no rpi.alsc block"},
+        {"{\"rpi.alsc\": {\"luminance_lut\": [1, 2], \"calibrations_Cr\": [], "
+         "\"calibrations_Cb\": []}}",
+         "expected 192 gains"},
+    };
+    for (const auto& [text, message] : bad) {
+        writeFile(dir.file("bad.json"), text);
+        try {
+            ModuleShading::fromTuningFile(dir.file("bad.json"), 5000);
+            ADD_FAILURE() << text;
+        } catch (const std::runtime_error& error) {
+            EXPECT_NE(std::string(error.what()).find(message), std::string::npos) << error.what();
+        }
+    }
+}
+
+TEST(ModuleShadingRender, PhotonNoiseGrowsWithTheSquareRootOfTheLevel) {
+    FlatFieldShape shape;
+    shape.width = 16 * 41;
+    shape.height = 12 * 41;
+    shape.fullWell = 5000;
+    shape.module = std::make_shared<const ModuleShading>(ModuleShading::fromTuningFile(
+        std::string(LSC_SOURCE_DIR) + "/tests/data/real_modules/rpi_ov5647.json", 5000));
+    const FlatField field = makeFlatField(shape);
+    // Green pixels near the brightest level (0.8): sqrt(0.8 / 5000) of full scale.
+    double sum = 0, sumOfSquares = 0;
+    int count = 0;
+    for (std::size_t i = 0; i < field.samples.size(); ++i)
+        if (field.exact[i] > 0.78f) {
+            const double difference = field.samples[i] / 1023.0 - field.exact[i];
+            sum += difference;
+            sumOfSquares += difference * difference;
+            ++count;
+        }
+    ASSERT_GT(count, 1000);
+    EXPECT_NEAR(std::sqrt(sumOfSquares / count - (sum / count) * (sum / count)),
+                std::sqrt(0.8 / 5000), 0.0015);
+}

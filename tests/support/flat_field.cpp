@@ -10,6 +10,7 @@
 #include <stdexcept>
 
 #include "image/hex_text.h"
+#include "tests/support/module_shading.h"
 
 namespace testing_support {
 
@@ -120,7 +121,8 @@ void validate(const FlatFieldShape& shape) {
         throw std::invalid_argument("flat field: cfa is not one of the four Bayer orders");
     if (!(shape.cornerLevel > 0.0 && shape.cornerLevel <= 1.0))
         throw std::invalid_argument("flat field: corner level must lie in (0, 1]");
-    if (!(shape.noise >= 0.0) || shape.defects < 0)
+    if (!(shape.noise >= 0.0) || shape.defects < 0 || !(shape.fullWell >= 0.0) ||
+        !(shape.readNoise >= 0.0))
         throw std::invalid_argument("flat field: noise and defects must not be negative");
 }
 
@@ -195,6 +197,9 @@ int FlatField::channelAt(int x, int y) const {
 }
 
 double FlatField::level(int channel, double x, double y) const {
+    if (shape.module)
+        return shape.centerLevel *
+               shape.module->at(channel, x + 0.5, y + 0.5, shape.width, shape.height);
     return shadedLevel(shape, channel, Geometry(shape).radiusSquared(x, y));
 }
 
@@ -215,12 +220,25 @@ FlatField makeFlatField(const FlatFieldShape& shape) {
     const double scale = field.fullScale();
     GaussianSource random(shape.seed);
     const int phase = findOrder(shape.cfa)->phase;
+    if (shape.module) {
+        const std::vector<double> shading = shape.module->mosaic(shape.width, shape.height, phase);
+        field.exact.resize(shading.size());
+        for (std::size_t i = 0; i < shading.size(); ++i)
+            field.exact[i] = float(shape.centerLevel * shading[i]);
+    }
     std::size_t at = 0;
     for (int y = 0; y < shape.height; ++y) {
         for (int x = 0; x < shape.width; ++x) {
-            double value = shadedLevel(shape, channelOf(phase, x, y), geometry.radiusSquared(x, y));
+            double value = shape.module ? double(field.exact[at])
+                                        : shadedLevel(shape, channelOf(phase, x, y),
+                                                      geometry.radiusSquared(x, y));
             if (shape.noise > 0.0)
                 value += shape.noise * random.next();
+            // Shot noise: sqrt(electrons) electrons, in fractions of full scale.
+            if (shape.fullWell > 0.0)
+                value += std::sqrt(std::max(value, 0.0) / shape.fullWell) * random.next();
+            if (shape.readNoise > 0.0)
+                value += shape.readNoise / scale * random.next();
             value = std::floor(value * scale + 0.5) + shape.blackLevel;
             field.samples[at++] = std::uint16_t(std::clamp(value, 0.0, scale));
         }

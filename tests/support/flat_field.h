@@ -7,10 +7,13 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
 namespace testing_support {
+
+class ModuleShading;
 
 struct FlatFieldShape {
     int width = 640;
@@ -23,6 +26,15 @@ struct FlatFieldShape {
     double channelLevel[4] = {0.55, 1.0, 1.0, 0.65};  // R, GR, GB, B relative to green
     double colourShading = 0.08;            // extra relative fall of red and rise of blue at the corners
     double noise = 0.0;                     // standard deviation, fraction of full scale
+    // When set, the shading measured on a real module replaces the radial
+    // model (corner level, centre and colour shading are then unused), scaled
+    // so that its brightest green is centerLevel.
+    std::shared_ptr<const ModuleShading> module;
+    // Photon-transfer noise, added to `noise`: photon shot noise of a pixel
+    // whose full scale holds fullWell electrons (0: none), and read noise in
+    // sample units.
+    double fullWell = 0.0;
+    double readNoise = 0.0;
     int defects = 0;                        // hot and dead pixels, placed at random
     int blackLevel = 0;                     // pedestal added to every sample, in sample units
     std::uint32_t seed = 1;
@@ -41,6 +53,8 @@ struct FlatField {
     // The noiseless level of channel k at pixel position (x, y), fraction of full scale,
     // without the black level, before quantisation and clipping.
     double level(int channel, double x, double y) const;
+    // With a module's shading: level() of every pixel's own channel, row-major.
+    std::vector<float> exact;
     // Samples as fractions of full scale, (s & (2^bits - 1)) / (2^bits - 1).
     std::vector<float> normalized() const;
 };

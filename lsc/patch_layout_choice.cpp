@@ -1,0 +1,140 @@
+#include "lsc/patch_layout_choice.h"
+
+#include <cmath>
+#include <new>
+#include <sstream>
+
+#include "lsc/bayer_phase.h"
+#include "lsc/lens_shading_correction.h"
+#include "lsc/lens_shading_fit.h"
+#include "lsc/patch_geometry.h"
+#include "lsc/sample_collection.h"
+
+namespace {
+
+constexpr double kOuterFactors[] = {0.2, 0.3, 0.35, 0.4};
+constexpr std::uint32_t kFlatnessBlock = 16;
+// The trials fit and judge green/red alone: a quarter of the fit's cost, and
+// green carries the luminance shading whose steep corners decide the layout.
+constexpr int kTrialChannel = 1;
+
+bool sameLayout(const PatchLayout& a, const PatchLayout& b) {
+    return a.left == b.left && a.center == b.center && a.top == b.top && a.middle == b.middle;
+}
+
+// A context that fits and corrects as the run would, without messages.
+void copyFitSettings(const ProcessingContext& from, ProcessingContext& to) {
+    to.greenBalance = from.greenBalance;
+    to.blackLevel = from.blackLevel;
+    // Half the sample grid's density along each axis: a quarter of the fit's
+    // cost, and enough to rank the layouts (the run's own fit then uses all).
+    to.sampleAngleStep = 2 * from.sampleAngleStep;
+    to.sampleMargin = from.sampleMargin;
+    to.falloff = from.falloff;
+    to.averageChannels = from.averageChannels;
+    to.awbFilterSize = from.awbFilterSize;
+    to.sampleWindow = from.sampleWindow;
+    to.maxGain = from.maxGain;
+    to.maxRmsError = from.maxRmsError;
+    to.maxError = from.maxError;
+    to.procSamplingFactor = from.procSamplingFactor;
+    to.quiet = true;
+    to.logFitError = false;
+    to.trialChannel = kTrialChannel;
+    to.applyStep = 1;
+}
+
+} // namespace
+
+std::vector<PatchLayout> candidateLayouts(const ProcessingContext& settings, std::uint32_t width,
+                                          std::uint32_t height) {
+    const PatchLayout configured = {settings.leftFraction, settings.centerFraction,
+                                    settings.topFraction, settings.middleFraction};
+    std::vector<PatchLayout> layouts = {configured};
+    for (double outer : kOuterFactors) {
+        const PatchLayout layout = {outer, 1.0 - 2.0 * outer, outer, 1.0 - 2.0 * outer};
+        if (sameLayout(layout, configured) ||
+            !patchGeometryUsable(patchBreakpoints(width, height, layout.left, layout.center,
+                                                  layout.top, layout.middle)))
+            continue;
+        layouts.push_back(layout);
+    }
+    return layouts;
+}
+
+double correctedFlatness(const BayerImage& corrected, int channel) {
+    const std::uint32_t width = static_cast<std::uint32_t>(corrected.width());
+    const std::uint32_t height = static_cast<std::uint32_t>(corrected.height());
+    const std::uint32_t columns = width / kFlatnessBlock, rows = height / kFlatnessBlock;
+    if (columns == 0 || rows == 0)
+        return 0.0;
+    const int phase = bayerPhase(corrected.cfa());
+    // Per block and channel: sum (the counts are equal, 64 each, for an even block side).
+    std::vector<double> sums(std::size_t(columns) * rows * kChannels, 0.0);
+    const float* pixels = corrected.pixels();
+    for (std::uint32_t y = 0; y < rows * kFlatnessBlock; ++y) {
+        const float* row = pixels + std::size_t(y) * width;
+        double* blockRow = &sums[std::size_t(y / kFlatnessBlock) * columns * kChannels];
+        for (std::uint32_t x = 0; x < columns * kFlatnessBlock; ++x)
+            blockRow[(x / kFlatnessBlock) * kChannels + bayerChannel(x, y, phase)] += row[x];
+    }
+    double worst = 0.0;
+    const std::size_t blocks = std::size_t(columns) * rows;
+    for (int k = 0; k < kChannels; ++k) {
+        if (channel >= 0 && k != channel)
+            continue;
+        double mean = 0.0;
+        for (std::size_t b = 0; b < blocks; ++b)
+            mean += sums[b * kChannels + k];
+        mean /= static_cast<double>(blocks);
+        for (std::size_t b = 0; b < blocks; ++b) {
+            const double deviation = std::fabs(sums[b * kChannels + k] / mean - 1.0);
+            // Written so that a NaN counts as the worst.
+            if (!(deviation <= worst))
+                worst = deviation;
+        }
+    }
+    return worst;
+}
+
+LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& settings) {
+    const std::uint32_t width = static_cast<std::uint32_t>(prepared.width());
+    const std::uint32_t height = static_cast<std::uint32_t>(prepared.height());
+    const std::vector<PatchLayout> layouts = candidateLayouts(settings, width, height);
+    LayoutChoice choice;
+    choice.layout = layouts.front();
+    choice.candidates = layouts.size();
+    double best = 0.0;
+    bool found = false;
+    std::ostringstream quiet;
+    for (std::size_t i = 0; i < layouts.size(); ++i) {
+        const PatchLayout& layout = layouts[i];
+        ProcessingContext trial;
+        copyFitSettings(settings, trial);
+        trial.leftFraction = layout.left;
+        trial.centerFraction = layout.center;
+        trial.topFraction = layout.top;
+        trial.middleFraction = layout.middle;
+        double flatness = -1.0;
+        try {
+            trial.image.copy(prepared);
+            collectSamples(trial, quiet);
+            fitLensShading(trial, quiet);
+            trial.image.copy(prepared);  // the fit took the black level out of its copy
+            applyLensShading(trial);
+            flatness = correctedFlatness(trial.corrected, kTrialChannel);
+        } catch (const std::bad_alloc&) {
+            throw;
+        } catch (...) {
+            // Not usable: this layout is left out.
+        }
+        choice.flatness.push_back(flatness);
+        if (flatness >= 0.0 && (!found || flatness < best)) {
+            best = flatness;
+            found = true;
+            choice.layout = layout;
+            choice.index = i;
+        }
+    }
+    return choice;
+}

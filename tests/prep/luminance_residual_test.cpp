@@ -1,0 +1,65 @@
+#include <stdexcept>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "prep/luminance_residual.h"
+#include "test_images.h"
+
+namespace {
+
+// A 16 x 8 grey mosaic, 2 x 2 delta-ab blocks of 4 x 2 RGB pixels; the pixel
+// (x, y) of the mosaic scaled by `factor`.
+float residualWithPixel(int x, int y, float factor, int columns = 2, int rows = 2) {
+    ProcessingContext context;
+    context.corrected = prep_test::makeImage(16, 8);
+    prep_test::fill(context.corrected, 0.5f);
+    context.corrected.pixels()[y * 16 + x] *= factor;
+    context.deltaAbBlocks[0] = columns;
+    context.deltaAbBlocks[1] = rows;
+    return prep::luminanceResidual(context);
+}
+
+TEST(LuminanceResidual, WeighsEachChannelByItsShareOfTheLuminance) {
+    // Grey 0.5 gives every RGB pixel luminance 0.5 and every block (8 RGB
+    // pixels) 4. Doubling one pixel adds 0.5 w, w its channel's weight (a
+    // green half of green's); the mean of the four blocks rises by 0.125 w.
+    const struct {
+        int x, y;
+        double weight;
+    } cases[] = {{0, 0, 0.2126}, {1, 0, 0.7152 / 2}, {0, 1, 0.7152 / 2}, {1, 1, 0.0722}};
+    for (const auto& c : cases)
+        EXPECT_NEAR(residualWithPixel(c.x, c.y, 2.0f), 0.375 * c.weight / (4 + 0.125 * c.weight),
+                    1e-6)
+            << c.x << c.y;
+    EXPECT_NEAR(residualWithPixel(0, 0, 1.0f), 0.0, 1e-7);
+}
+
+TEST(LuminanceResidual, GridThatDoesNotFitIsNotMeasured) {
+    EXPECT_LT(residualWithPixel(0, 0, 1.0f, 0, 2), 0.0f);
+    EXPECT_LT(residualWithPixel(0, 0, 1.0f, 9, 2), 0.0f);  // blocks of no RGB pixel
+}
+
+TEST(LuminanceResidual, BoundInPerCentFailsPastItAndZeroIsOff) {
+    const auto error = [](float residual, float bound) -> std::string {
+        try {
+            prep::checkLuminanceResidual(residual, bound);
+        } catch (const std::exception& e) {
+            return e.what();
+        }
+        return "(passed)";
+    };
+    EXPECT_EQ(error(0.03f, 3.0f), "(passed)");
+    EXPECT_EQ(error(0.5f, 0.0f), "(passed)");
+    EXPECT_EQ(error(-1.0f, 0.0f), "(passed)");
+    EXPECT_EQ(error(0.031f, 3.0f),
+              "Maximum luminance residual is greater than threshold of 3 %\nSome possible causes "
+              "include light is not on, light in bad position, missing diffuser, poor quality flat "
+              "field input image, damaged sensor, or invalid configuration for the sensor being "
+              "used.");
+    EXPECT_EQ(error(-1.0f, 3.0f),
+              "The luminance residual cannot be measured: the flattened image does not fill the "
+              "delta ab block grid or holds no light.");
+}
+
+} // namespace
