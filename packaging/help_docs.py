@@ -120,8 +120,8 @@ def line_safe(text):
     return "\\&" + text if text[:1] in (".", "'") else text
 
 
-def readme_table(readme, heading):
-    """The rows (lists of cells) of the first table under `heading`."""
+def readme_table(readme, heading, columns):
+    """The rows (lists of `columns` cells) of the first table under `heading`."""
     lines = readme.splitlines()
     try:
         start = lines.index(heading)
@@ -136,9 +136,13 @@ def readme_table(readme, heading):
         elif rows:
             break
     cells = [[cell.strip() for cell in re.split(r"(?<!\\)\|", row)[1:-1]] for row in rows]
-    body = [row for row in cells[2:]]  # after the header and the rule
+    body = cells[2:]  # after the header and the rule
     if not body:
         sys.exit("help_docs.py: README section '%s' has no table" % heading)
+    for row in body:
+        if len(row) != columns:
+            sys.exit("help_docs.py: README section '%s': a row of %d cells, not %d: %s"
+                     % (heading, len(row), columns, " | ".join(row)))
     return body
 
 
@@ -173,7 +177,7 @@ def sentence(roff_text):
 
 def keys_roff(readme):
     out = []
-    for key, default, allowed, meaning in readme_table(readme, "## Configuration"):
+    for key, default, allowed, meaning in readme_table(readme, "## Configuration", 4):
         details = "default " + (inline(default) if default else "empty")
         if allowed:
             details += "; " + inline(allowed)
@@ -183,7 +187,7 @@ def keys_roff(readme):
 
 def exit_status_roff(readme):
     out = []
-    for status, meaning in readme_table(readme, "## Exit status"):
+    for status, meaning in readme_table(readme, "## Exit status", 2):
         out += [".TP", "\\fB" + roff_escape(status) + "\\fR", line_safe(sentence(inline(meaning)))]
     return "\n".join(out)
 
