@@ -4,18 +4,18 @@
 // or a message fails here. scripts/update-golden.sh rewrites the kept outputs;
 // every diff it makes is reviewed before it is committed.
 
-#include "blob/md5.h"
-#include "tests/support/temp_dir.h"
-#include "tests/support/tool_runner.h"
-
-#include <gtest/gtest.h>
-
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "blob/md5.h"
+#include "tests/support/temp_dir.h"
+#include "tests/support/tool_runner.h"
 
 namespace e2e {
 namespace {
@@ -43,7 +43,8 @@ struct GoldenCase {
 // exports and the translation of a headerless raw file.
 const GoldenCase kCases[] = {
     {"case0", "kqraw2", 640, 480, 10, "RGGB", 4, 1, 3, 1, ""},
-    {"case1", "kqraw2", 640, 480, 10, "GRBG", 2, 1, 3, 3, "--inputasjpeg in.jpg --inputasbmp in.bmp"},
+    {"case1", "kqraw2", 640, 480, 10, "GRBG", 2, 1, 3, 3,
+     "--inputasjpeg in.jpg --inputasbmp in.bmp"},
     {"case2", "kqraw2", 800, 600, 12, "GBRG", 1, 0, 3, 1, ""},
     {"case3", "kqraw2", 1024, 768, 10, "BGGR", 4, 1, 5, 5, ""},
     {"case4", "kqraw", 1000, 750, 12, "RGGB", 2, 1, 3, 1, "--inputasbmp in.bmp"},
@@ -56,9 +57,9 @@ const GoldenCase kCases[] = {
     {"case11", "raw", 900, 700, 11, "RGGB", 2, 1, 4, 1, ""},
 };
 
-const char* const kTextOutputs[] = {"stdout.txt", "stderr.txt", "cal.txt",
-                                    "samples.txt", "delta.csv", "stats.csv"};
-const char* const kBinaryOutputs[] = {"cal.bin", "flat.out", "flat.jpg", "flat.bmp",
+const char* const kTextOutputs[] = {"stdout.txt",  "stderr.txt", "cal.txt",
+                                    "samples.txt", "delta.csv",  "stats.csv"};
+const char* const kBinaryOutputs[] = {"cal.bin",   "flat.out", "flat.jpg", "flat.bmp",
                                       "pre.kqraw", "in.jpg",   "in.bmp",   "in.kqraw"};
 
 bool updating() {
@@ -163,14 +164,14 @@ void checkOutputs(const std::string& name, const testing_support::TempDir& dir) 
     for (const auto& output : outputs) {
         ASSERT_TRUE(testing_support::fileExists(golden + output.first))
             << "no kept output " << golden + output.first;
-        expectSameText(name + "/" + output.first, readFile(golden + output.first),
-                       output.second);
+        expectSameText(name + "/" + output.first, readFile(golden + output.first), output.second);
     }
 }
 
 void runTool(const testing_support::TempDir& dir, std::vector<std::string> args) {
     const testing_support::ToolResult result = testing_support::runTool(args, dir.path());
-    writeFile(dir.file("stdout.txt"), result.out + "status " + std::to_string(result.status) + "\n");
+    writeFile(dir.file("stdout.txt"),
+              result.out + "status " + std::to_string(result.status) + "\n");
     writeFile(dir.file("stderr.txt"), result.err);
 }
 
@@ -189,8 +190,8 @@ TEST_P(GoldenOutputs, EveryOutputIsUnchanged) {
              << c.format << " --width " << c.width << " --height " << c.height << " --bits "
              << c.bits << " --order " << c.order
              << " --noise 0.004 --defects 40 --corner 0.5 --seed " << seed
-             << " --serial 0123456789abcdef0123456789abcd" << (seed < 10 ? "e" : "") << seed << " " << name << extension
-             << " >/dev/null 2>&1";
+             << " --serial 0123456789abcdef0123456789abcd" << (seed < 10 ? "e" : "") << seed << " "
+             << name << extension << " >/dev/null 2>&1";
     ASSERT_EQ(std::system(generate.str().c_str()), 0) << generate.str();
     writeFile(dir.file(name + ".cfg"), configText(c));
 
@@ -208,8 +209,8 @@ TEST_P(GoldenOutputs, EveryOutputIsUnchanged) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Captures, GoldenOutputs, ::testing::ValuesIn(kCases),
-                         [](const ::testing::TestParamInfo<GoldenCase>& info) {
-                             return std::string(info.param.name);
+                         [](const ::testing::TestParamInfo<GoldenCase>& param) {
+                             return std::string(param.param.name);
                          });
 
 // The bundled example with its own configuration, as the README runs it.
