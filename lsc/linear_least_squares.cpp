@@ -6,19 +6,11 @@
 #include <memory>
 #include <utility>
 
+#include "image/simd_clones.h"
 #include "lsc/apan_exception.h"
 #include "lsc/lsc_messages.h"
 
 namespace apan {
-
-// The row kernels below are built a second time for AVX2 where the processor
-// has it: wider vectors, same operations on each column, same digits (there is
-// no contraction into fused multiply-adds).
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__SANITIZE_ADDRESS__)
-#define LSC_ROW_KERNEL __attribute__((target_clones("avx2", "default")))
-#else
-#define LSC_ROW_KERNEL
-#endif
 
 namespace {
 
@@ -59,8 +51,8 @@ inline void addColumnTerms(const double* a, std::size_t n, std::size_t r0, std::
 }
 
 // Adds the squares of rows from..m-1, columns from..n-1, to `measure`.
-LSC_ROW_KERNEL void addSquares(const double* a, std::size_t n, std::size_t m, std::size_t from,
-                               double* measure) {
+LSC_VECTOR_CLONES void addSquares(const double* a, std::size_t n, std::size_t m, std::size_t from,
+                                  double* measure) {
     for (std::size_t r = from; r < m; ++r) {
         const double* row = a + r * n;
         for (std::size_t c = from; c < n; ++c)
@@ -90,8 +82,8 @@ std::size_t downdate(const double* a, std::size_t n, std::size_t j, double* meas
 
 // s[c] = v0 * A[j][c] + sum over r = j+1..m-1 of A[r][j] * A[r][c] for the
 // columns c = j+1..n-1, and the same for b in s[n].
-LSC_ROW_KERNEL void reflectionSums(const double* a, const double* b, std::size_t n, std::size_t m,
-                                   std::size_t j, double v0, double* s) {
+LSC_VECTOR_CLONES void reflectionSums(const double* a, const double* b, std::size_t n,
+                                      std::size_t m, std::size_t j, double v0, double* s) {
     const double* top = a + j * n;
     for (std::size_t c = j + 1; c < n; ++c)
         s[c] = v0 * top[c];
@@ -109,8 +101,9 @@ LSC_ROW_KERNEL void reflectionSums(const double* a, const double* b, std::size_t
 // `squares` is given, the next step's pivot choice has started: the squares
 // of the reflected rows are added to it, and the largest magnitude of each
 // column over those rows is kept in `largest`.
-LSC_ROW_KERNEL void reflectBelow(double* a, double* b, std::size_t n, std::size_t m, std::size_t j,
-                                 const double* f, double* squares, double* largest) {
+LSC_VECTOR_CLONES void reflectBelow(double* a, double* b, std::size_t n, std::size_t m,
+                                    std::size_t j, const double* f, double* squares,
+                                    double* largest) {
     for (std::size_t r0 = j + 1; r0 < m; r0 += kTileRows) {
         const std::size_t r1 = std::min(m, r0 + kTileRows);
         for (std::size_t r = r0; r < r1; ++r) {

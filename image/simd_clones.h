@@ -1,0 +1,11 @@
+#pragma once
+// A hot kernel marked LSC_VECTOR_CLONES is built a second time for AVX2 and
+// picked at load time where the processor has it. The wider vectors do the
+// same operations on each element (there is no contraction into fused
+// multiply-adds), so results are the same bits on every build.
+
+#if defined(__x86_64__) && defined(__GNUC__) && !defined(__SANITIZE_ADDRESS__)
+#define LSC_VECTOR_CLONES __attribute__((target_clones("avx2", "default")))
+#else
+#define LSC_VECTOR_CLONES
+#endif
