@@ -81,9 +81,14 @@ KqRawFixedHeader* headerlessFixedHeader(float exposureTime, float gain, const st
 void BayerImage::read(const std::string& path) {
     buffer_.reset();
     int rc = img::kOk;
-    ImagePtr raw(rawRead(path.c_str(), &rc));
+    adoptRaw(ImagePtr(rawRead(path.c_str(), &rc)));
+}
+
+void BayerImage::adoptRaw(ImagePtr raw) {
+    buffer_.reset();
     if (!raw)
         fail(img::msg::kCannotReadKqraw);
+    int rc = img::kOk;
     // The image takes over the raw samples' block, widened to floats where
     // the reader left room for them: loading then never holds the raw samples
     // and a float copy at once.
@@ -104,16 +109,31 @@ void BayerImage::read(const std::string& path) {
     buffer_ = std::move(image);
 }
 
+void BayerImage::adoptHeader(const ImageBuffer& raw) {
+    buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr image(imageCreate(raw.width, raw.height, raw.bitsPerSample, raw.samplesPerPixel,
+                               raw.numberOfImages, raw.cfa[0], raw.cfa[1], raw.pixelType,
+                               raw.bufferType, kDataNone, &rc));
+    if (!image)
+        fail(img::msg::kCannotAllocateImage);
+    copyMetadataOrThrow(image.get(), &raw);
+    image->dataType = kDataReal32;
+    buffer_ = std::move(image);
+}
+
 void BayerImage::createFromHeaderless(std::int32_t width, std::int32_t height, std::uint16_t bits,
                                       std::uint32_t cfa, float exposureTime, float gain,
                                       const std::string& serialNumber,
-                                      const std::string& sensorGuid, bool fixedHeader) {
+                                      const std::string& sensorGuid, bool fixedHeader,
+                                      bool withSamples) {
     buffer_.reset();
     int rc = img::kOk;
-    ImagePtr image(
-        imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
+    ImagePtr image(imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa,
+                               withSamples ? kDataReal32 : kDataNone, &rc));
     if (!image)
         fail(img::msg::kCannotAllocateImage);
+    image->dataType = kDataReal32;
     if (fixedHeader) {
         image->rawHeader = headerlessFixedHeader(exposureTime, gain, serialNumber, sensorGuid);
         image->fileType = kFileKqRaw;
