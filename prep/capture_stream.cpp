@@ -1,0 +1,81 @@
+#include "prep/capture_stream.h"
+
+#include <algorithm>
+#include <memory>
+#include <stdexcept>
+#include <vector>
+
+#include "image/image_messages.h"
+#include "image/image_result.h"
+#include "image/raw_reader.h"
+#include "image/raw_samples.h"
+#include "prep/bayer_planes.h"
+#include "prep/mosaic_stream.h"
+
+namespace prep {
+namespace {
+
+[[noreturn]] void cannotRead() {
+    throw std::runtime_error(img::msg::kCannotReadKqraw);
+}
+
+// Rows are read a band at a time: large enough for few reads, small enough
+// to stay in the cache on their way to the preparation.
+constexpr std::size_t kBandBytes = 256 * 1024;
+
+} // namespace
+
+CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
+                         BayerImage& input, BayerImage& prepared) {
+    input.reset();
+    int rc = img::kOk;
+    std::unique_ptr<img::ByteSource> source(img::openSource(path.c_str(), &rc));
+    if (!source)
+        cannotRead();
+    ImageBuffer* header = nullptr;
+    std::uint64_t samplesAt = 0;
+    rc = img::rawReadHeaderOnly(*source, &header, &samplesAt);
+    ImagePtr raw(header);
+    if (rc == img::kWrongFormat) {
+        // Other formats, and files of no known type (asked on the console).
+        if (!source->seek(0))
+            cannotRead();
+        input.adoptRaw(ImagePtr(img::rawReadSource(*source, img::askOnConsole, nullptr, &rc)));
+        return CaptureLoad::kWholeImage;
+    }
+    if (rc != img::kOk || !raw)
+        cannotRead();
+
+    const std::int32_t width = raw->width, height = raw->height;
+    if (patternSize(raw->cfa[0], raw->cfa[1]) != 2 || raw->samplesPerPixel != 1 ||
+        !MosaicStream::accepts(width, height, settings)) {
+        if (img::readDeferredSamples(*source, samplesAt, raw.get()) != img::kOk)
+            cannotRead();
+        input.adoptRaw(std::move(raw));
+        return CaptureLoad::kWholeImage;
+    }
+
+    MosaicStream stream(width, height, settings);
+    const std::size_t rowSamples = static_cast<std::size_t>(width);
+    const std::size_t bandRows = std::max<std::size_t>(1, kBandBytes / (2 * rowSamples));
+    std::vector<std::uint16_t> band(bandRows * rowSamples);
+    if (!source->seek(samplesAt))
+        cannotRead();
+    for (std::int32_t y = 0; y < height;) {
+        const std::size_t rows =
+            std::min<std::size_t>(bandRows, static_cast<std::size_t>(height - y));
+        if (!img::readSamplesLE(*source, band.data(), rows * rowSamples))
+            cannotRead();
+        for (std::size_t r = 0; r < rows; ++r)
+            stream.addRow(band.data() + r * rowSamples);
+        y += static_cast<std::int32_t>(rows);
+    }
+    // The depth comes from the largest sample, as when the image is read whole.
+    const std::uint16_t bits = img::bitsForLargestSample(stream.largest());
+    img::applySampleDepth(raw.get(), bits);
+    prepared = stream.finish(bits, raw->cfa[0], raw->cfa[1]);
+    input.adoptHeader(*raw);
+    return CaptureLoad::kPrepared;
+}
+
+} // namespace prep
