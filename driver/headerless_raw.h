@@ -3,6 +3,7 @@
 // by a small text "details" file (size, bit depth, Bayer order, capture data).
 
 #include "image/bayer_image.h"
+#include "prep/mosaic_preparation.h"
 
 #include <cstdint>
 #include <string>
@@ -25,7 +26,11 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 
 // Loads the raw file described by the details file into `target`.
 // `fixedHeader` selects the raw header the image carries (and so the format
-// in which it is later stored). Throws apan::exception 202, 210, 262, 263, 264.
-void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
+// in which it is later stored). With `preparation` and `prepared`, the rows
+// go straight into the preparation when it accepts the size: `target` then
+// holds the capture data only, `prepared` the prepared mosaic, and the result
+// is true. Throws apan::exception 202, 210, 262, 263, 264.
+bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
                        std::uint16_t defaultBits, const std::string& detailsPath,
-                       bool fixedHeader);
+                       bool fixedHeader, const prep::MosaicPreparation* preparation = nullptr,
+                       BayerImage* prepared = nullptr);

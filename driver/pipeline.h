@@ -9,6 +9,7 @@
 #include "driver/run_settings.h"
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
+#include "prep/mosaic_preparation.h"
 #include "lsc/processing_context.h"
 
 #include <boost/date_time/posix_time/ptime.hpp>
@@ -32,6 +33,8 @@ private:
     void readConfiguration();
     void openMessages();
     void loadInput();
+    bool needsInputImage() const;
+    prep::MosaicPreparation preparation() const;
     void decideBitDepth();
     void checkSettingsAgainstImage();
     void inspectInput();
@@ -65,6 +68,9 @@ private:
     std::uint32_t fullScale_ = 0;  // 2^depth - 1
     BayerImage input_;
     BayerImage prepared_;
+    // The capture went through the preparation as it was read: input_ holds
+    // its header and capture data only.
+    bool preparedWhileLoading_ = false;
     ProcessingContext context_;
 
     // The calibration report (--report): filled as the stages go.
