@@ -57,6 +57,11 @@ const GoldenCase kCases[] = {
     {"case11", "raw", 900, 700, 11, "RGGB", 2, 1, 4, 1, ""},
 };
 
+// Test names and failure traces show the case's name, not its bytes.
+void PrintTo(const GoldenCase& c, std::ostream* out) {
+    *out << c.name;
+}
+
 const char* const kTextOutputs[] = {"stdout.txt",  "stderr.txt", "cal.txt",
                                     "samples.txt", "delta.csv",  "stats.csv"};
 const char* const kBinaryOutputs[] = {"cal.bin",   "flat.out", "flat.jpg", "flat.bmp",
