@@ -154,7 +154,8 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 
 bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
                        const std::string& detailsPath, bool fixedHeader,
-                       const prep::MosaicPreparation* preparation, BayerImage* prepared) {
+                       const prep::MosaicPreparation* preparation, BayerImage* prepared,
+                       prep::SampleStatistics* inputStatistics) {
     namespace io = boost::iostreams;
     std::string detailsText;
     if (!readDetailsText(detailsPath, detailsText))
@@ -187,10 +188,13 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
     target.createFromHeaderless(width, height, d.bits, d.cfa, d.exposureTime, d.gain,
                                 d.serialNumber, d.sensorGuid, fixedHeader, !streamed);
     std::unique_ptr<prep::MosaicStream> stream;
-    if (streamed)
-        stream = std::make_unique<prep::MosaicStream>(width, height, *preparation);
-
     const std::uint32_t mask = (1u << d.bits) - 1;
+    if (streamed) {
+        stream = std::make_unique<prep::MosaicStream>(width, height, *preparation);
+        if (inputStatistics)
+            stream->measureSamples(mask);
+    }
+
     const float scale = static_cast<float>(mask);
     std::vector<unsigned char> row(static_cast<std::size_t>(rowBytes));
     std::vector<std::uint16_t> samples(streamed ? d.width : 0);
@@ -212,7 +216,10 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
     }
     if (std::fgetc(file.get()) != EOF)
         throw apan::exception(202, msg::kRawTooLong, msg::kRawTooLongHint);
-    if (streamed)
+    if (streamed) {
         *prepared = stream->finish(d.bits, 0, d.cfa);
+        if (inputStatistics)
+            *inputStatistics = stream->statistics();
+    }
     return streamed;
 }

@@ -2,11 +2,12 @@
 // Headerless raw input: a bare dump of little-endian 16-bit samples, described
 // by a small text "details" file (size, bit depth, Bayer order, capture data).
 
-#include "image/bayer_image.h"
-#include "prep/mosaic_preparation.h"
-
 #include <cstdint>
 #include <string>
+
+#include "image/bayer_image.h"
+#include "prep/image_checks.h"
+#include "prep/mosaic_preparation.h"
 
 struct HeaderlessRawDetails {
     std::uint32_t width = 0;
@@ -29,8 +30,10 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 // in which it is later stored). With `preparation` and `prepared`, the rows
 // go straight into the preparation when it accepts the size: `target` then
 // holds the capture data only, `prepared` the prepared mosaic, and the result
-// is true. Throws apan::exception 202, 210, 262, 263, 264.
-bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
-                       std::uint16_t defaultBits, const std::string& detailsPath,
-                       bool fixedHeader, const prep::MosaicPreparation* preparation = nullptr,
-                       BayerImage* prepared = nullptr);
+// is true; `inputStatistics`, if given, then receives the statistics of the
+// input samples. Throws apan::exception 202, 210, 262, 263, 264.
+bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
+                       const std::string& detailsPath, bool fixedHeader,
+                       const prep::MosaicPreparation* preparation = nullptr,
+                       BayerImage* prepared = nullptr,
+                       prep::SampleStatistics* inputStatistics = nullptr);

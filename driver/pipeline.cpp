@@ -221,27 +221,37 @@ prep::MosaicPreparation Pipeline::preparation() const {
 }
 
 // Unless something needs the input image itself (its exports and
-// translation, and in debug mode its statistics and the identity test), the
-// capture is prepared as it is read and never held at full resolution.
+// translation, the identity test), the capture is prepared as it is read and
+// never held at full resolution.
 bool Pipeline::needsInputImage() const {
-    return settings_.debug || !settings_.inputAsJpeg.empty() || !settings_.inputAsBmp.empty() ||
-           !settings_.translate.empty();
+    return !settings_.inputAsJpeg.empty() || !settings_.inputAsBmp.empty() ||
+           !settings_.translate.empty() || identityTest();
+}
+
+// In debug mode, when the stored prepared image should be the input again.
+bool Pipeline::identityTest() const {
+    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
+    return settings_.debug && !settings_.preproc.empty() && unfiltered &&
+           settings_.procSamplingFactor == 1;
 }
 
 void Pipeline::loadInput() {
     const prep::MosaicPreparation preparation = this->preparation();
     const bool stream = !needsInputImage();
+    // Debug mode shows the input's statistics.
+    prep::SampleStatistics* statistics = settings_.debug ? &inputStatistics_ : nullptr;
     if (settings_.raw.empty()) {
         if (stream)
-            preparedWhileLoading_ = prep::loadPrepared(settings_.input, preparation, input_,
-                                                       prepared_) == prep::CaptureLoad::kPrepared;
+            preparedWhileLoading_ =
+                prep::loadPrepared(settings_.input, preparation, input_, prepared_, statistics) ==
+                prep::CaptureLoad::kPrepared;
         else
             input_.read(settings_.input);
     } else {
         const int bits = settings_.bitRes == 0 ? 10 : settings_.bitRes;
         preparedWhileLoading_ = loadHeaderlessRaw(
             input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
-            settings_.legacyFormat, stream ? &preparation : nullptr, &prepared_);
+            settings_.legacyFormat, stream ? &preparation : nullptr, &prepared_, statistics);
         if (!settings_.translate.empty())
             input_.storeKqraw(settings_.translate);
     }
@@ -309,7 +319,10 @@ void Pipeline::checkSettingsAgainstImage() {
 void Pipeline::inspectInput() {
     if (settings_.debug) {
         out() << "Input image data:" << std::endl;
-        prep::writeStatistics(input_, depth_, out());
+        if (input_.hasSamples())
+            prep::writeStatistics(input_, depth_, out());
+        else
+            prep::writeStatistics(inputStatistics_, depth_, out());
         out() << std::endl;
     }
     out().precision(3);
@@ -352,8 +365,7 @@ void Pipeline::writePreparedImage() {
         return;
     out() << "Preprocessed image file: " << settings_.preproc << std::endl;
     prepared_.storeKqraw(settings_.preproc);
-    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
-    if (settings_.debug && unfiltered && settings_.procSamplingFactor == 1) {
+    if (identityTest()) {
         out() << "Performing identity test." << std::endl;
         BayerImage stored;
         stored.read(settings_.preproc);

@@ -3,21 +3,22 @@
 // in a fixed order. Anything that ends the run early is thrown and reported
 // by the caller (driver/run.h).
 
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+
+#include <boost/date_time/posix_time/ptime.hpp>
+
 #include "config/config_node.h"
 #include "driver/command_line.h"
 #include "driver/run_report.h"
 #include "driver/run_settings.h"
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
-#include "prep/mosaic_preparation.h"
 #include "lsc/processing_context.h"
-
-#include <boost/date_time/posix_time/ptime.hpp>
-
-#include <cstdint>
-#include <functional>
-#include <memory>
-#include <string>
+#include "prep/image_checks.h"
+#include "prep/mosaic_preparation.h"
 
 class Pipeline {
 public:
@@ -34,6 +35,7 @@ private:
     void openMessages();
     void loadInput();
     bool needsInputImage() const;
+    bool identityTest() const;
     prep::MosaicPreparation preparation() const;
     void decideBitDepth();
     void checkSettingsAgainstImage();
@@ -64,13 +66,14 @@ private:
     std::shared_ptr<config_node_impl> root_;
     config_node_impl* config_ = nullptr;
 
-    int depth_ = 0;             // bit depth of the run
-    std::uint32_t fullScale_ = 0;  // 2^depth - 1
+    int depth_ = 0;               // bit depth of the run
+    std::uint32_t fullScale_ = 0; // 2^depth - 1
     BayerImage input_;
     BayerImage prepared_;
     // The capture went through the preparation as it was read: input_ holds
     // its header and capture data only.
     bool preparedWhileLoading_ = false;
+    prep::SampleStatistics inputStatistics_; // of such a capture, in debug mode
     ProcessingContext context_;
 
     // The calibration report (--report): filled as the stages go.

@@ -10,6 +10,7 @@
 #include "image/raw_reader.h"
 #include "image/raw_samples.h"
 #include "prep/bayer_planes.h"
+#include "prep/image_checks.h"
 #include "prep/mosaic_stream.h"
 
 namespace prep {
@@ -23,10 +24,31 @@ namespace {
 // to stay in the cache on their way to the preparation.
 constexpr std::size_t kBandBytes = 256 * 1024;
 
+// Hands the width x height samples at `samplesAt` to addRows(rows, count),
+// a band of rows at a time.
+template <typename AddRows>
+void readBands(img::ByteSource& source, std::uint64_t samplesAt, std::int32_t width,
+               std::int32_t height, std::vector<std::uint16_t>& band, const AddRows& addRows) {
+    const std::size_t rowSamples = static_cast<std::size_t>(width);
+    const std::size_t bandRows = std::max<std::size_t>(1, kBandBytes / (2 * rowSamples));
+    band.resize(bandRows * rowSamples);
+    if (!source.seek(samplesAt))
+        cannotRead();
+    for (std::int32_t y = 0; y < height;) {
+        const std::size_t rows =
+            std::min<std::size_t>(bandRows, static_cast<std::size_t>(height - y));
+        if (!img::readSamplesLE(source, band.data(), rows * rowSamples))
+            cannotRead();
+        addRows(band.data(), rows);
+        y += static_cast<std::int32_t>(rows);
+    }
+}
+
 } // namespace
 
 CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
-                         BayerImage& input, BayerImage& prepared) {
+                         BayerImage& input, BayerImage& prepared,
+                         SampleStatistics* inputStatistics) {
     input.reset();
     int rc = img::kOk;
     std::unique_ptr<img::ByteSource> source(img::openSource(path.c_str(), &rc));
@@ -57,24 +79,29 @@ CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& setti
 
     MosaicStream stream(width, height, settings);
     const std::size_t rowSamples = static_cast<std::size_t>(width);
-    const std::size_t bandRows = std::max<std::size_t>(1, kBandBytes / (2 * rowSamples));
-    std::vector<std::uint16_t> band(bandRows * rowSamples);
-    if (!source->seek(samplesAt))
-        cannotRead();
-    for (std::int32_t y = 0; y < height;) {
-        const std::size_t rows =
-            std::min<std::size_t>(bandRows, static_cast<std::size_t>(height - y));
-        if (!img::readSamplesLE(*source, band.data(), rows * rowSamples))
-            cannotRead();
-        for (std::size_t r = 0; r < rows; ++r)
-            stream.addRow(band.data() + r * rowSamples);
-        y += static_cast<std::int32_t>(rows);
+    std::vector<std::uint16_t> band;
+    if (inputStatistics) {
+        // The statistics convert every sample at the depth that the largest
+        // sample sets: one pass to find it before the one that measures.
+        std::uint16_t largest = 0;
+        readBands(*source, samplesAt, width, height, band,
+                  [&](const std::uint16_t* rows, std::size_t count) {
+                      largest = std::max(largest, img::largestSample(rows, count * rowSamples));
+                  });
+        stream.measureSamples(fullScale(img::bitsForLargestSample(largest)));
     }
+    readBands(*source, samplesAt, width, height, band,
+              [&](const std::uint16_t* rows, std::size_t count) {
+                  for (std::size_t r = 0; r < count; ++r)
+                      stream.addRow(rows + r * rowSamples);
+              });
     // The depth comes from the largest sample, as when the image is read whole.
     const std::uint16_t bits = img::bitsForLargestSample(stream.largest());
     img::applySampleDepth(raw.get(), bits);
     prepared = stream.finish(bits, raw->cfa[0], raw->cfa[1]);
     input.adoptHeader(*raw);
+    if (inputStatistics)
+        *inputStatistics = stream.statistics();
     return CaptureLoad::kPrepared;
 }
 

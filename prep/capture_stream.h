@@ -5,10 +5,11 @@
 // something needs the input image itself (its exports, its statistics, the
 // identity test).
 
-#include "image/bayer_image.h"
-#include "prep/mosaic_preparation.h"
-
 #include <string>
+
+#include "image/bayer_image.h"
+#include "prep/image_checks.h"
+#include "prep/mosaic_preparation.h"
 
 namespace prep {
 
@@ -21,8 +22,12 @@ enum class CaptureLoad {
 // of a single-channel 2 x 2 Bayer mosaic is prepared as it is read; any other
 // file (other formats, patterns or sizes the preparation refuses) is loaded
 // whole, as BayerImage::read does. Failures throw as BayerImage::read does
-// ("Cannot read kqraw image." and the allocation message).
+// ("Cannot read kqraw image." and the allocation message). With
+// `inputStatistics`, a prepared capture's samples are also measured there as
+// sampleStatistics would measure the whole image (the samples are then read
+// twice: the depth that converts them is known after the last one).
 CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
-                         BayerImage& input, BayerImage& prepared);
+                         BayerImage& input, BayerImage& prepared,
+                         SampleStatistics* inputStatistics = nullptr);
 
 } // namespace prep

@@ -109,12 +109,33 @@ const std::uint16_t* MosaicStream::planeRow(std::int64_t row, int channel) const
     return ring_.data() + (slot * kChannels + channel) * static_cast<std::size_t>(planeWidth_);
 }
 
+void MosaicStream::measureSamples(std::uint32_t mask) {
+    measuring_ = true;
+    measureMask_ = mask;
+}
+
 void MosaicStream::addRow(const std::uint16_t* samples) {
     const std::int64_t y = rowsIn_++;
     std::uint16_t largest = largest_;
     for (std::int64_t x = 0; x < width_; ++x)
         largest = std::max(largest, samples[x]);
     largest_ = largest;
+    if (measuring_) {
+        // The extremes of the floats are the floats of the extremes (the
+        // conversion is monotonic); the sum goes sample by sample.
+        std::uint16_t smallest = smallest_, highest = 0;
+        double sum = statistics_.sum;
+        for (std::int64_t x = 0; x < width_; ++x) {
+            smallest = std::min(smallest, samples[x]);
+            highest = std::max(highest, samples[x]);
+            sum += normalised(samples[x], measureMask_);
+        }
+        smallest_ = smallest;
+        statistics_.sum = sum;
+        statistics_.count += static_cast<std::size_t>(width_);
+        statistics_.minimum = normalised(smallest_, measureMask_);
+        statistics_.maximum = std::max(statistics_.maximum, normalised(highest, measureMask_));
+    }
     // A last row of an odd height belongs to no plane row.
     if (y >= 2 * planeHeight_)
         return;

@@ -16,6 +16,7 @@
 
 #include "image/bayer_image.h"
 #include "image/mosaic_rows.h"
+#include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
 
 namespace prep {
@@ -36,6 +37,12 @@ public:
 
     // The largest sample of the rows so far.
     std::uint16_t largest() const { return largest_; }
+
+    // From the next row on, also gathers the statistics of the samples as
+    // floats of the depth whose mask is given (before the first row: those of
+    // the whole input image, as sampleStatistics would find them).
+    void measureSamples(std::uint32_t mask);
+    const SampleStatistics& statistics() const { return statistics_; }
 
     // After the last row: the prepared mosaic (REAL32, one channel, pixel
     // type RAW with the cfa words), samples converted at `bits` bits.
@@ -67,6 +74,10 @@ private:
     std::vector<std::uint16_t> low_, high_;
     std::vector<std::uint16_t> gather_; // window values of a run of outputs
     std::uint16_t largest_ = 0;
+    bool measuring_ = false;
+    std::uint32_t measureMask_ = 0;
+    std::uint16_t smallest_ = 0xFFFF;
+    SampleStatistics statistics_;
 };
 
 } // namespace prep
