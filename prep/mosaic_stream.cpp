@@ -1,6 +1,10 @@
 #include "prep/mosaic_stream.h"
 
 #include <algorithm>
+#if defined(__arm__) && defined(__GNUC__) && !defined(__clang__) && !defined(__ARM_NEON)
+#include <asm/hwcap.h>
+#include <sys/auxv.h>
+#endif
 #include <cstring>
 #include <stdexcept>
 
@@ -17,7 +21,7 @@ namespace {
 constexpr int kChannels = 4;     // of a 2 x 2 pattern
 constexpr std::size_t kRun = 64; // outputs whose windows are sorted together
 
-inline void exchange(std::uint16_t* a, std::uint16_t* b) {
+__attribute__((always_inline)) inline void exchange(std::uint16_t* a, std::uint16_t* b) {
     for (std::size_t i = 0; i < kRun; ++i) {
         const std::uint16_t low = std::min(a[i], b[i]);
         const std::uint16_t high = std::max(a[i], b[i]);
@@ -30,7 +34,7 @@ inline void exchange(std::uint16_t* a, std::uint16_t* b) {
 // 19-exchange network on nine rows of kRun values, branch-free, so that the
 // compiler turns each exchange into vector minima and maxima. Row 4 ends up
 // holding the medians.
-LSC_VECTOR_CLONES void medianOfNine(std::uint16_t* v) {
+__attribute__((always_inline)) inline void sortNine(std::uint16_t* v) {
     auto p = [v](int i) { return v + i * kRun; };
     exchange(p(1), p(2));
     exchange(p(4), p(5));
@@ -52,6 +56,28 @@ LSC_VECTOR_CLONES void medianOfNine(std::uint16_t* v) {
     exchange(p(6), p(4));
     exchange(p(4), p(2));
 }
+
+#if defined(__arm__) && defined(__GNUC__) && !defined(__clang__) && !defined(__ARM_NEON)
+// 32-bit ARM builds do not assume NEON (Debian's armhf baseline has none): the
+// network is built a second time for it and chosen where the processor has it.
+__attribute__((target("fpu=neon"))) void medianOfNineNeon(std::uint16_t* v) {
+    sortNine(v);
+}
+void medianOfNinePlain(std::uint16_t* v) {
+    sortNine(v);
+}
+void medianOfNine(std::uint16_t* v) {
+    static const bool neon = (getauxval(AT_HWCAP) & HWCAP_NEON) != 0;
+    if (neon)
+        medianOfNineNeon(v);
+    else
+        medianOfNinePlain(v);
+}
+#else
+LSC_VECTOR_CLONES void medianOfNine(std::uint16_t* v) {
+    sortNine(v);
+}
+#endif
 
 // Raw sample to the image object's float: (s & mask) / mask, 0 without bits.
 inline float normalised(std::uint16_t sample, std::uint32_t mask) {
