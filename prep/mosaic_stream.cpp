@@ -79,6 +79,14 @@ LSC_VECTOR_CLONES void medianOfNine(std::uint16_t* v) {
 }
 #endif
 
+// The largest of n samples and `largest`.
+LSC_VECTOR_CLONES std::uint16_t largestOf(const std::uint16_t* samples, std::size_t n,
+                                          std::uint16_t largest) {
+    for (std::size_t i = 0; i < n; ++i)
+        largest = std::max(largest, samples[i]);
+    return largest;
+}
+
 // Raw sample to the image object's float: (s & mask) / mask, 0 without bits.
 inline float normalised(std::uint16_t sample, std::uint32_t mask) {
     return mask == 0 ? 0.0f : static_cast<float>(sample & mask) / static_cast<float>(mask);
@@ -108,17 +116,24 @@ MosaicStream::MosaicStream(std::int32_t width, std::int32_t height,
 
     // A window reaches at most window_ - 1 rows back from the newest row it
     // needs (see emitReadyRows); one more row is kept for the one arriving.
+    // A plane row is kept as its two mosaic rows, cut to whole 2 x 2 blocks.
     ringRows_ = std::min<std::int64_t>(planeHeight_, window_ + 1);
-    const std::size_t planeSamples = static_cast<std::size_t>(planeWidth_);
-    ring_.resize(static_cast<std::size_t>(ringRows_) * kChannels * planeSamples);
-    pending_.resize(static_cast<std::size_t>(width_));
+    rowSamples_ = 2 * static_cast<std::size_t>(planeWidth_);
+    ring_.resize(static_cast<std::size_t>(ringRows_) * 2 * rowSamples_);
 
+    // Mosaic column (of the block's left sample) of each window position, and
+    // the plane rows that some window reads (with a factor above 1 and a small
+    // window, many are never read and not kept).
     const std::int64_t half = settings.medianFilter ? window_ / 2 : 0;
     columns_.resize(static_cast<std::size_t>(outWidth_) * window_);
     for (std::int64_t x = 0; x < outWidth_; ++x)
         for (int i = 0; i < window_; ++i)
             columns_[static_cast<std::size_t>(x) * window_ + i] = static_cast<std::uint32_t>(
-                mirrorIndex(settings.samplingFactor * x - half + i, planeWidth_));
+                2 * mirrorIndex(settings.samplingFactor * x - half + i, planeWidth_));
+    readRows_.assign(static_cast<std::size_t>(planeHeight_), 0);
+    for (std::int64_t y = 0; y < outHeight_; ++y)
+        for (int i = 0; i < window_; ++i)
+            readRows_[mirrorIndex(settings.samplingFactor * y - half + i, planeHeight_)] = 1;
 
     const std::size_t outSamples = 4 * static_cast<std::size_t>(outWidth_) * outHeight_;
     low_.resize(outSamples);
@@ -131,8 +146,10 @@ const std::uint16_t* MosaicStream::planeRow(std::int64_t row, int channel) const
     // A window never reaches a row that has left the ring (see emitReadyRows).
     if (row >= planeRowsIn_ || row < planeRowsIn_ - ringRows_)
         throw std::logic_error("plane row outside the kept rows");
+    // Channel r * 2 + c of plane row i is mosaic row 2i + r from column c on,
+    // every second sample.
     const std::size_t slot = static_cast<std::size_t>(row % ringRows_);
-    return ring_.data() + (slot * kChannels + channel) * static_cast<std::size_t>(planeWidth_);
+    return ring_.data() + (slot * 2 + channel / 2) * rowSamples_ + channel % 2;
 }
 
 void MosaicStream::measureSamples(std::uint32_t mask) {
@@ -142,10 +159,7 @@ void MosaicStream::measureSamples(std::uint32_t mask) {
 
 void MosaicStream::addRow(const std::uint16_t* samples) {
     const std::int64_t y = rowsIn_++;
-    std::uint16_t largest = largest_;
-    for (std::int64_t x = 0; x < width_; ++x)
-        largest = std::max(largest, samples[x]);
-    largest_ = largest;
+    largest_ = largestOf(samples, static_cast<std::size_t>(width_), largest_);
     if (measuring_) {
         // The extremes of the floats are the floats of the extremes (the
         // conversion is monotonic); the sum goes sample by sample.
@@ -165,20 +179,13 @@ void MosaicStream::addRow(const std::uint16_t* samples) {
     // A last row of an odd height belongs to no plane row.
     if (y >= 2 * planeHeight_)
         return;
-    if (y % 2 == 0) {
-        std::memcpy(pending_.data(), samples, static_cast<std::size_t>(width_) * 2);
+    if (readRows_[static_cast<std::size_t>(y / 2)]) {
+        const std::size_t slot = static_cast<std::size_t>(planeRowsIn_ % ringRows_);
+        std::memcpy(ring_.data() + (slot * 2 + static_cast<std::size_t>(y % 2)) * rowSamples_,
+                    samples, rowSamples_ * sizeof(std::uint16_t));
+    }
+    if (y % 2 == 0)
         return;
-    }
-    // Channel r * 2 + c of plane row i holds mosaic (2x + c, 2i + r).
-    const std::size_t slot = static_cast<std::size_t>(planeRowsIn_ % ringRows_);
-    std::uint16_t* out = ring_.data() + slot * kChannels * static_cast<std::size_t>(planeWidth_);
-    const std::uint16_t* rows[2] = {pending_.data(), samples};
-    for (int channel = 0; channel < kChannels; ++channel) {
-        const std::uint16_t* in = rows[channel / 2] + channel % 2;
-        std::uint16_t* plane = out + channel * static_cast<std::size_t>(planeWidth_);
-        for (std::int64_t x = 0; x < planeWidth_; ++x)
-            plane[x] = in[2 * x];
-    }
     ++planeRowsIn_;
     emitReadyRows();
 }

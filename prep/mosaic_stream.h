@@ -59,15 +59,17 @@ private:
     std::int32_t outWidth_, outHeight_;     // down-sampled planes
     int window_;                            // 1 when only decimating
 
-    // The last `ringRows_` plane rows, four channels of planeWidth_ each.
+    // The last `ringRows_` plane rows, each as its two mosaic rows of
+    // rowSamples_ samples; which plane rows any window reads.
     std::int64_t ringRows_;
+    std::size_t rowSamples_;
     std::vector<std::uint16_t> ring_;
-    std::int64_t rowsIn_ = 0;            // mosaic rows received
-    std::int64_t planeRowsIn_ = 0;       // complete plane rows
-    std::int64_t nextOut_ = 0;           // next down-sampled row to make
-    std::vector<std::uint16_t> pending_; // the even mosaic row of a plane row
+    std::vector<char> readRows_;
+    std::int64_t rowsIn_ = 0;      // mosaic rows received
+    std::int64_t planeRowsIn_ = 0; // complete plane rows
+    std::int64_t nextOut_ = 0;     // next down-sampled row to make
 
-    // Mirrored plane column of each window position, per output column.
+    // Mosaic column of the block of each window position, per output column.
     std::vector<std::uint32_t> columns_;
     // The prepared mosaic as integers: the lower middle value of each window,
     // and the upper one for windows of an even count.
