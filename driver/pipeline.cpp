@@ -1,5 +1,13 @@
 #include "driver/pipeline.h"
 
+#include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <iostream>
+#include <stdexcept>
+
+#include <boost/date_time/posix_time/posix_time.hpp>
+
 #include "blob/blob_dump.h"
 #include "blob/blob_parser.h"
 #include "blob/blob_writer.h"
@@ -13,10 +21,10 @@
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
 #include "driver/file_options.h"
-#include "driver/report_data.h"
-#include "driver/run_report_html.h"
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
+#include "driver/report_data.h"
+#include "driver/run_report_html.h"
 #include "driver/version.h"
 #include "image/hex_text.h"
 #include "image/output_file.h"
@@ -25,6 +33,7 @@
 #include "lsc/patch_layout_choice.h"
 #include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
+#include "prep/capture_stream.h"
 #include "prep/delta_ab.h"
 #include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
@@ -32,14 +41,6 @@
 #include "prep/mosaic_preparation.h"
 #include "prep/sample_file.h"
 #include "prep/white_balance.h"
-
-#include <boost/date_time/posix_time/posix_time.hpp>
-
-#include <algorithm>
-#include <charconv>
-#include <cmath>
-#include <iostream>
-#include <stdexcept>
 
 namespace {
 
@@ -95,7 +96,8 @@ ChannelBlockMeans reportBlockMeans(const BayerImage& image) {
 } // namespace
 
 Pipeline::Pipeline()
-    : startTime_(boost::posix_time::microsec_clock::local_time()), timer_(startStageTimer()) {}
+    : startTime_(boost::posix_time::microsec_clock::local_time()), timer_(startStageTimer()) {
+}
 
 int Pipeline::run(int argc, const char* const argv[]) {
     commandLine_ = CommandLine::parse(argc, argv, std::cout, std::cerr);
@@ -240,9 +242,41 @@ void Pipeline::saveIfAsked(const std::string& path, const char* message, const c
     timerLine(timer_, timerLabel, out());
 }
 
+prep::MosaicPreparation Pipeline::preparation() const {
+    prep::MosaicPreparation preparation;
+    preparation.medianFilter = settings_.medianFilter;
+    preparation.medianSize = settings_.medianFilterSize;
+    preparation.samplingFactor = settings_.procSamplingFactor;
+    return preparation;
+}
+
+// Unless something needs the input image itself (its exports and
+// translation, the identity test), the capture is prepared as it is read and
+// never held at full resolution.
+bool Pipeline::needsInputImage() const {
+    return !settings_.inputAsJpeg.empty() || !settings_.inputAsBmp.empty() ||
+           !settings_.translate.empty() || identityTest();
+}
+
+// In debug mode, when the stored prepared image should be the input again.
+bool Pipeline::identityTest() const {
+    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
+    return settings_.debug && !settings_.preproc.empty() && unfiltered &&
+           settings_.procSamplingFactor == 1;
+}
+
 void Pipeline::loadInput() {
+    const prep::MosaicPreparation preparation = this->preparation();
+    const bool stream = !needsInputImage();
+    // Debug mode shows the input's statistics.
+    prep::SampleStatistics* statistics = settings_.debug ? &inputStatistics_ : nullptr;
     if (settings_.raw.empty()) {
-        input_.read(settings_.input);
+        if (stream)
+            preparedWhileLoading_ =
+                prep::loadPrepared(settings_.input, preparation, input_, prepared_, statistics) ==
+                prep::CaptureLoad::kPrepared;
+        else
+            input_.read(settings_.input);
         // A code the reader does not know leaves no Bayer order: every later
         // stage would fail with a message that points elsewhere.
         const std::uint32_t cfa = input_.cfa();
@@ -253,15 +287,17 @@ void Pipeline::loadInput() {
         // Read only here: a run without --raw never looks at it.
         const config_node& legacyFormat = config_->find_path("raw.legacy_format");
         check_int_range(*config_, legacyFormat, 0, 1);
-        loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
-                          legacyFormat.as_bool());
+        preparedWhileLoading_ = loadHeaderlessRaw(
+            input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
+            legacyFormat.as_bool(), stream ? &preparation : nullptr, &prepared_, statistics);
         if (!settings_.translate.empty())
             input_.storeKqraw(settings_.translate);
     }
     timerLine(timer_, "Image load time: ", out());
     saveIfAsked(settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
-                "JPEG image save time: ",
-                [&](const std::string& path) { input_.storeJpeg(path, settings_.jpegQuality); });
+                "JPEG image save time: ", [&](const std::string& path) {
+                    input_.storeJpeg(path, settings_.jpegQuality);
+                });
     saveIfAsked(settings_.inputAsBmp, "Saving raw input file in bmp format.",
                 "BMP image save time: ", [&](const std::string& path) { input_.storeBmp(path); });
 }
@@ -321,7 +357,10 @@ void Pipeline::checkSettingsAgainstImage() {
 void Pipeline::inspectInput() {
     if (settings_.debug) {
         out() << "Input image data:" << std::endl;
-        prep::writeStatistics(input_, depth_, out());
+        if (input_.hasSamples())
+            prep::writeStatistics(input_, depth_, out());
+        else
+            prep::writeStatistics(inputStatistics_, depth_, out());
         out() << std::endl;
     }
     out().precision(3);
@@ -335,12 +374,10 @@ void Pipeline::prepareImage() {
     // Split, filter and weave run as one pass over the mosaic, so the colour
     // planes are never held at full resolution. The three timer lines stay;
     // the split's and the weave's work is counted in the filter's line.
+    // A capture prepared while it was read is counted in the load's line.
     timerLine(timer_, "Bayer deinterweave time: ", out());
-    prep::MosaicPreparation preparation;
-    preparation.medianFilter = settings_.medianFilter;
-    preparation.medianSize = settings_.medianFilterSize;
-    preparation.samplingFactor = settings_.procSamplingFactor;
-    prepared_ = prep::prepareMosaic(input_, preparation);
+    if (!preparedWhileLoading_)
+        prepared_ = prep::prepareMosaic(input_, preparation());
     timerLine(timer_, "Median filter and down sampling time: ", out());
 
     // The prepared image keeps the input's capture data, so it is stored in
@@ -366,8 +403,7 @@ void Pipeline::writePreparedImage() {
         return;
     out() << "Preprocessed image file: " << settings_.preproc << std::endl;
     prepared_.storeKqraw(settings_.preproc);
-    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
-    if (settings_.debug && unfiltered && settings_.procSamplingFactor == 1) {
+    if (identityTest()) {
         out() << "Performing identity test." << std::endl;
         BayerImage stored;
         stored.read(settings_.preproc);
@@ -439,10 +475,8 @@ void Pipeline::recordFitError() {
     report_.maxErrorBound = context_.maxError;
     report_.maxGain = context_.maxGain;
     report_.haveFitError = context_.fitDeviationMeasured;
-    std::copy(context_.fitDeviationMax, context_.fitDeviationMax + kChannels,
-              report_.deviationMax);
-    std::copy(context_.fitDeviationRms, context_.fitDeviationRms + kChannels,
-              report_.deviationRms);
+    std::copy(context_.fitDeviationMax, context_.fitDeviationMax + kChannels, report_.deviationMax);
+    std::copy(context_.fitDeviationRms, context_.fitDeviationRms + kChannels, report_.deviationRms);
 }
 
 void Pipeline::writeRegisterFile() {
@@ -530,8 +564,8 @@ void Pipeline::measureColourError() {
     if (settings_.avgLuma == 1 || settings_.noDelta || settings_.xtest)
         return;
     out() << "Calculating deltaAB." << std::endl;
-    out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x "
-          << context_.deltaAbBlocks[1] << std::endl;
+    out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x " << context_.deltaAbBlocks[1]
+          << std::endl;
     prep::evaluateDeltaAb(context_);
     report_.haveDelta = true;
     report_.deltaColumns = context_.deltaAbBlocks[0];
@@ -609,8 +643,7 @@ void Pipeline::writeFlattenedImages() {
     flattened.copyMetadata(input_);
     saveIfAsked(settings_.flat, "Writing flattened image.", "Flattened raw image save time: ",
                 [&](const std::string& path) { flattened.storeKqraw(path); });
-    saveIfAsked(settings_.jpeg, "Writing flattened jpeg image.",
-                "Flattened JPEG image save time: ",
+    saveIfAsked(settings_.jpeg, "Writing flattened jpeg image.", "Flattened JPEG image save time: ",
                 [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
     saveIfAsked(settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
                 [&](const std::string& path) { flattened.storeBmp(path); });

@@ -83,8 +83,15 @@ void BayerImage::read(const std::string& path) {
     buffer_.reset();
     int rc = img::kOk;
     ImagePtr raw(rawRead(path.c_str(), &rc));
+    adoptRaw(std::move(raw), rc);
+}
+
+void BayerImage::adoptRaw(ImagePtr raw, int readResult) {
+    buffer_.reset();
     if (!raw)
-        fail(rc == img::kImageTooLarge ? img::msg::kImageTooLarge : img::msg::kCannotReadKqraw);
+        fail(readResult == img::kImageTooLarge ? img::msg::kImageTooLarge
+                                               : img::msg::kCannotReadKqraw);
+    int rc = img::kOk;
     // The image takes over the raw samples' block, widened to floats where
     // the reader left room for them: loading then never holds the raw samples
     // and a float copy at once.
@@ -105,20 +112,35 @@ void BayerImage::read(const std::string& path) {
     buffer_ = std::move(image);
 }
 
+void BayerImage::adoptHeader(const ImageBuffer& raw) {
+    buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr image(imageCreate(raw.width, raw.height, raw.bitsPerSample, raw.samplesPerPixel,
+                               raw.numberOfImages, raw.cfa[0], raw.cfa[1], raw.pixelType,
+                               raw.bufferType, kDataNone, &rc));
+    if (!image)
+        fail(img::msg::kCannotAllocateImage);
+    copyMetadataOrThrow(image.get(), &raw);
+    image->dataType = kDataReal32;
+    buffer_ = std::move(image);
+}
+
 void BayerImage::createFromHeaderless(std::int32_t width, std::int32_t height, std::uint16_t bits,
                                       std::uint32_t cfa, float exposureTime, float gain,
                                       const std::string& serialNumber,
-                                      const std::string& sensorGuid, bool fixedHeader) {
+                                      const std::string& sensorGuid, bool fixedHeader,
+                                      bool withSamples) {
     buffer_.reset();
     if (width >= 0 && height >= 0 &&
         img::checkSampleMemory(static_cast<std::uint64_t>(width),
                                static_cast<std::uint64_t>(height)) != img::kOk)
         fail(img::msg::kImageTooLarge);
     int rc = img::kOk;
-    ImagePtr image(
-        imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
+    ImagePtr image(imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa,
+                               withSamples ? kDataReal32 : kDataNone, &rc));
     if (!image)
         fail(img::msg::kCannotAllocateImage);
+    image->dataType = kDataReal32;
     if (fixedHeader) {
         image->rawHeader = headerlessFixedHeader(exposureTime, gain, serialNumber, sensorGuid);
         image->fileType = kFileKqRaw;
