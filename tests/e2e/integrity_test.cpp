@@ -254,8 +254,9 @@ TEST_F(Integrity, ImagesBeyondTheSampleMemoryLimitAreRefusedBeforeAllocating) {
     container.header(65535, 32769, 0x52474742).block("PIXELDATA_111107", std::string(8, '\0'),
                                                       0xFFFFFFF8u);
     write("huge.kqraw", container.bytes());
+    // Summed as off_t: a 32-bit size_t would wrap.
     ASSERT_EQ(truncate(path("huge.kqraw").c_str(),
-                       static_cast<off_t>(container.bytes().size() + 0xFFFFFFF8u)),
+                       static_cast<off_t>(container.bytes().size()) + off_t{0xFFFFFFF8u}),
               0);
     result = run({"--config", "lsc.cfg", "--input", "huge.kqraw", "--calibrate", "cal.txt"});
     EXPECT_EQ(result.status, 1);
