@@ -3,6 +3,7 @@
 #include "driver/driver_messages.h"
 #include "driver/notice.h"
 #include "driver/version.h"
+#include "image/error_detail.h"
 
 #include <boost/program_options.hpp>
 
@@ -81,19 +82,38 @@ po::variables_map parseWith(int argc, const char* const argv[],
     return map;
 }
 
+// Without --kq an advanced option is unknown to the parser. Its error stays
+// as it is; the detail says what is missing.
+[[noreturn]] void rethrowUnknown(const po::unknown_option& error,
+                                 const po::options_description& advanced) {
+    std::string name = error.get_option_name();
+    const std::string spelled = name;
+    if (name.compare(0, 2, "--") == 0)
+        name.erase(0, 2);
+    if (!name.empty() && advanced.find_nothrow(name, false))
+        throw DetailedError<std::runtime_error>(spelled + " needs --kq", error.what());
+    throw;
+}
+
 } // namespace
 
 CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream& out,
                                std::ostream& err) {
     const po::options_description basic = basicOptions();
+    const po::options_description advanced = advancedOptions();
     po::options_description all("Options");
-    all.add(basic).add(advancedOptions());
+    all.add(basic).add(advanced);
 
     CommandLine line;
     line.map_ = parseWith(argc, argv, all);
     // Without --kq an advanced option must fail as an unknown one.
-    if (!line.given("kq"))
-        parseWith(argc, argv, basic);
+    if (!line.given("kq")) {
+        try {
+            parseWith(argc, argv, basic);
+        } catch (const po::unknown_option& error) {
+            rethrowUnknown(error, advanced);
+        }
+    }
 
     for (int i = 1; i < argc; ++i)
         line.arguments_ += std::string(argv[i]) + " ";

@@ -358,6 +358,7 @@ void Pipeline::checkPreparedImage() {
     limits.minPixel = settings_.minPixel;
     limits.maxPixel = settings_.maxPixel;
     limits.peakMinimum = settings_.peakPixelMin;
+    limits.samplingFactor = settings_.procSamplingFactor;
     prep::checkPixels(prepared_, limits, fullScale_, out());
 }
 

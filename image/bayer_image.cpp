@@ -1,10 +1,13 @@
 #include "image/bayer_image.h"
 
+#include <cerrno>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <stdexcept>
 
+#include "image/error_detail.h"
 #include "image/hex_text.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
@@ -19,6 +22,44 @@ namespace {
 
 [[noreturn]] void fail(const char* text) {
     throw std::runtime_error(text);
+}
+
+// Why a capture could not be read, for the line under "Cannot read kqraw
+// image.": the system's reason when the file does not open, else what the
+// reader found wrong with it.
+std::string readFailureReason(const std::string& path, int rc) {
+    std::FILE* file = std::fopen(path.c_str(), "rb");
+    if (!file)
+        return systemReason(path, errno);
+    const int first = std::fgetc(file);
+    const int error = std::ferror(file) ? errno : 0;
+    std::fclose(file);
+    if (error != 0)
+        return systemReason(path, error);
+    if (first == EOF)
+        return path + ": the file is empty";
+    switch (rc) {
+    case img::kIoError:
+        return path + ": a read error, or the file is shorter than its layout declares";
+    case img::kSizeMismatch:
+        return path + ": the file holds fewer samples than its header declares (truncated)";
+    case img::kRawBadContainer:
+        return path + ": truncated or damaged (a block or the pixel data runs past the end of "
+                      "the file, or the header or pixel block is missing)";
+    case img::kRawBadLayout:
+        return path + ": the layout given on the console does not match the file";
+    case img::kUnsupported:
+        return path + ": an image layout the tool does not support";
+    case img::kNoMemory:
+        return path + ": too large to read (a device that does not end?), or not enough memory";
+    default:
+        return path + ": not a KQRAW2 or KQRAW raw image";
+    }
+}
+
+[[noreturn]] void failToRead(const std::string& path, int rc) {
+    throw DetailedError<std::runtime_error>(readFailureReason(path, rc),
+                                            img::msg::kCannotReadKqraw);
 }
 
 // Copy metadata with the object's messages for each failure.
@@ -83,8 +124,11 @@ void BayerImage::read(const std::string& path) {
     buffer_.reset();
     int rc = img::kOk;
     ImagePtr raw(rawRead(path.c_str(), &rc));
-    if (!raw)
-        fail(rc == img::kImageTooLarge ? img::msg::kImageTooLarge : img::msg::kCannotReadKqraw);
+    if (!raw) {
+        if (rc == img::kImageTooLarge)
+            fail(img::msg::kImageTooLarge);
+        failToRead(path, rc);
+    }
     // The image takes over the raw samples' block, widened to floats where
     // the reader left room for them: loading then never holds the raw samples
     // and a float copy at once.
@@ -98,7 +142,7 @@ void BayerImage::read(const std::string& path) {
     if (widened == img::kNoMemory)
         fail(img::msg::kCannotAllocateImage);
     if (widened != img::kOk)
-        fail(img::msg::kCannotReadKqraw);
+        failToRead(path, widened);
     image->data = raw->data;
     image->dataType = kDataReal32;
     raw->data = nullptr;

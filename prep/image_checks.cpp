@@ -2,6 +2,7 @@
 
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
+#include "image/error_detail.h"
 
 #include <cmath>
 #include <iomanip>
@@ -24,7 +25,60 @@ std::ostringstream messageText() {
     return text;
 }
 
+// One side of the pixel window: how many pixels lie beyond it and the worst.
+struct SideCount {
+    std::size_t count = 0;
+    float worst = 0.0f;
+    std::int32_t row = 0, column = 0;
+};
+
+// "too dark: 2.35 % of the pixels below 50 (darkest 3 at sensor x 0, y 0)"
+// and/or the same for "clipped", joined by "; ". Only on the failure path.
+std::string rangeDetail(const BayerImage& image, const PixelLimits& limits,
+                        std::uint32_t fullScale) {
+    const float scale = static_cast<float>(fullScale);
+    const float low = limits.minPixel / scale;
+    const float high = limits.maxPixel / scale;
+    SideCount dark, bright;
+    const float* sample = image.pixels();
+    const std::uint16_t channels = image.channels();
+    for (std::int32_t row = 0; row < image.height(); ++row)
+        for (std::int32_t column = 0; column < image.width(); ++column)
+            for (std::uint16_t channel = 0; channel < channels; ++channel, ++sample) {
+                const float v = *sample;
+                if (v < low) {
+                    if (dark.count++ == 0 || v < dark.worst)
+                        dark = {dark.count, v, row, column};
+                } else if (!(v <= high)) { // above, or not a number
+                    if (bright.count++ == 0 || v > bright.worst)
+                        bright = {bright.count, v, row, column};
+                }
+            }
+    const double total = static_cast<double>(sampleCount(image));
+    std::ostringstream text = messageText();
+    text << std::fixed << std::setprecision(2);
+    const auto side = [&](const char* name, const char* relation, float limit, const char* worstName,
+                          const SideCount& found) {
+        if (found.count == 0)
+            return;
+        if (text.tellp() > 0)
+            text << "; ";
+        text << name << ": " << 100.0 * static_cast<double>(found.count) / total
+             << " % of the pixels " << relation << ' ' << std::setprecision(0) << limit << " ("
+             << worstName << ' ' << sampleUnits(found.worst, fullScale) << " at sensor x "
+             << sensorCoordinate(found.column, limits.samplingFactor) << ", y "
+             << sensorCoordinate(found.row, limits.samplingFactor) << ')' << std::setprecision(2);
+    };
+    side("too dark", "below", limits.minPixel, "darkest", dark);
+    side("clipped", "above", limits.maxPixel, "brightest", bright);
+    return text.str();
+}
+
 } // namespace
+
+std::int64_t sensorCoordinate(std::int32_t reduced, int factor) {
+    return static_cast<std::int64_t>(reduced / 2) * 2 * factor + (reduced & 1);
+}
 
 std::uint32_t fullScale(int depth) {
     const std::uint32_t power = depth >= 32 || depth < 0 ? 0u : std::uint32_t{1} << depth;
@@ -108,7 +162,7 @@ void checkPixelRange(const BayerImage& image, const PixelLimits& limits,
              << msg::kPossibleCauses << '\n'
              << msg::kOutOfRangeValue << position.row << ',' << position.column << ") = "
              << sampleUnits(image.pixels()[index], fullScale) << ".\n";
-        throw std::runtime_error(text.str());
+        throw DetailedError<std::runtime_error>(rangeDetail(image, limits, fullScale), text.str());
     }
     out << msg::kPixelsWithin << std::endl;
 }
