@@ -15,6 +15,7 @@
 #include "driver/file_options.h"
 #include "driver/report_data.h"
 #include "driver/run_report_html.h"
+#include "driver/unknown_settings.h"
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
 #include "driver/version.h"
@@ -25,6 +26,7 @@
 #include "lsc/patch_layout_choice.h"
 #include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
+#include "prep/capture_evidence.h"
 #include "prep/delta_ab.h"
 #include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
@@ -147,6 +149,7 @@ void Pipeline::runStages() {
     prepareImage();
     beginStage("Checking the prepared image");
     checkPreparedImage();
+    lookForSetUpMistakes();
     writePreparedImage();
     buildSampleSet();
     if (context_.autoPatchLayout) {
@@ -225,6 +228,8 @@ void Pipeline::openMessages() {
     messageStream.setQuiet(settings_.quiet);
     messageStream.openInfoFile(settings_.log);
     out() << lscversion::versionLine() << std::endl;
+    for (const std::string& text : unknownSettingWarnings(*config_, settings_.blockName))
+        warn(text);
     if (settings_.input.empty())
         throw std::runtime_error(msg::kNoInput);
     timerLine(timer_, "Processes configuration: ", out());
@@ -362,6 +367,31 @@ void Pipeline::checkPreparedImage() {
     prep::checkPixels(prepared_, limits, fullScale_, out());
 }
 
+// Mistakes that let a run complete with a wrong register file. Each rule
+// warns only on clear evidence: a good flat field prints nothing here.
+void Pipeline::lookForSetUpMistakes() {
+    const config_node& blackNode = config_->find_path("proc.black_level");
+    const double blackLevel = blackNode.as_int();
+    const std::string doubt = prep::bayerOrderDoubt(
+        prep::centreLevels(prepared_, static_cast<float>(blackLevel / fullScale_)),
+        cfaPatternName(input_.cfa()));
+    if (!doubt.empty())
+        warn(doubt);
+
+    const prep::PedestalEvidence pedestal = prep::pedestalFromNoise(input_, fullScale_);
+    const double tolerance = std::max(2.0, prep::kPedestalTolerance * fullScale_);
+    if (pedestal.measured && pedestal.lowerBound > blackLevel + tolerance)
+        warn("The noise of the capture shows a black level of at least " +
+             std::to_string(static_cast<long long>(std::floor(pedestal.lowerBound))) +
+             ", but proc.black_level is " + std::to_string(static_cast<long long>(blackLevel)) +
+             ": the pedestal left in the samples under-corrects the corners.");
+}
+
+void Pipeline::warn(const std::string& text) {
+    out() << "WARNING: " << text << std::endl;
+    report_.warnings.push_back(text);
+}
+
 void Pipeline::writePreparedImage() {
     if (settings_.preproc.empty())
         return;
@@ -415,6 +445,9 @@ void Pipeline::fitSurface() {
         out() << "Forcing lens shading surface to produce an X shaped color distortion."
               << std::endl;
         applyXTestSurface(context_);
+        report_.xtest = true;
+        warn("X-test run: the register file holds a test surface that distorts the colours on "
+             "purpose, not a calibration of this module.");
     }
     recordFit();
 }

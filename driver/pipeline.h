@@ -37,6 +37,9 @@ private:
     void inspectInput();
     void prepareImage();
     void checkPreparedImage();
+    void lookForSetUpMistakes();
+    // Prints "WARNING: <text>" and keeps the text for the report and the result.
+    void warn(const std::string& text);
     void writePreparedImage();
     void buildSampleSet();
     void obtainSamples();

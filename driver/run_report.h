@@ -22,6 +22,8 @@ struct RunReport {
     bool finished = false;          // the run reached "Completed."
     std::string failedStage;        // what the run was doing when it failed
     std::string failureMessage;     // the error lines as printed ("ERROR: ...")
+    bool xtest = false;             // the register file holds the X-test surface
+    std::vector<std::string> warnings;  // the "WARNING: " lines, without that prefix
 
     // The run
     std::string toolVersion;        // "3.8.1"

@@ -32,8 +32,8 @@ struct SideCount {
     std::int32_t row = 0, column = 0;
 };
 
-// "too dark: 2.35 % of the pixels below 50 (darkest 3 at sensor x 0, y 0)"
-// and/or the same for "clipped", joined by "; ". Only on the failure path.
+// "too dark: 120 pixels (2.35 %) below 50 (darkest 3 at sensor x 0, y 0)"
+// and/or the same for "too bright", joined by "; ". Only on the failure path.
 std::string rangeDetail(const BayerImage& image, const PixelLimits& limits,
                         std::uint32_t fullScale) {
     const float scale = static_cast<float>(fullScale);
@@ -63,14 +63,14 @@ std::string rangeDetail(const BayerImage& image, const PixelLimits& limits,
             return;
         if (text.tellp() > 0)
             text << "; ";
-        text << name << ": " << 100.0 * static_cast<double>(found.count) / total
-             << " % of the pixels " << relation << ' ' << std::setprecision(0) << limit << " ("
+        text << name << ": " << found.count << (found.count == 1 ? " pixel (" : " pixels (")
+             << 100.0 * static_cast<double>(found.count) / total << " %) " << relation << ' ' << std::setprecision(0) << limit << " ("
              << worstName << ' ' << sampleUnits(found.worst, fullScale) << " at sensor x "
              << sensorCoordinate(found.column, limits.samplingFactor) << ", y "
              << sensorCoordinate(found.row, limits.samplingFactor) << ')' << std::setprecision(2);
     };
     side("too dark", "below", limits.minPixel, "darkest", dark);
-    side("clipped", "above", limits.maxPixel, "brightest", bright);
+    side("too bright", "above", limits.maxPixel, "brightest", bright);
     return text.str();
 }
 

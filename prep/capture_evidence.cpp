@@ -1,0 +1,191 @@
+#include "prep/capture_evidence.h"
+
+#include "lsc/bayer_phase.h"
+#include "prep/prep_image.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstdio>
+#include <vector>
+
+namespace prep {
+namespace {
+
+constexpr const char* kChannelNames[4] = {"red", "green/red", "green/blue", "blue"};
+
+// Blocks of 16 x 16 sensor pixels (8 x 8 of each channel); at most this many
+// along each axis are measured, spread evenly, so the cost does not grow with
+// the image.
+constexpr int kBlockSide = 16;
+constexpr int kMaxBlocksPerAxis = 128;
+constexpr std::size_t kMinBlocks = 200;
+constexpr double kMinSlopeSignificance = 20.0;  // slope / its standard error
+constexpr double kMinLevelSpread = 1.3;          // brightest / darkest block mean
+
+std::string percentText(double fraction) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%.1f", 100.0 * fraction);
+    return text;
+}
+
+std::string ratioText(double ratio) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%.2f", ratio);
+    return text;
+}
+
+// Noise variance of one channel in one block, from the differences of
+// horizontally adjacent pixels of that channel (the shading barely changes
+// over two pixels). The largest tenth of the differences is left out, so a
+// defect does not count; that scales every block's figure alike, which
+// moves neither the line's zero nor its significance.
+bool blockNoise(const float* samples, std::int32_t width, std::int32_t x0, std::int32_t y0,
+                double scale, double& mean, double& variance, std::array<double, 64>& work) {
+    double sum = 0.0;
+    std::size_t count = 0;
+    for (int row = 0; row < kBlockSide; row += 2) {
+        const float* line = samples + static_cast<std::size_t>(y0 + row) * width + x0;
+        for (int column = 0; column < kBlockSide; column += 2) {
+            sum += line[column];
+            if (column + 2 < kBlockSide)
+                work[count++] = std::fabs(static_cast<double>(line[column + 2]) - line[column]);
+        }
+    }
+    mean = sum / 64.0 * scale;
+    const std::size_t kept = count - count / 10;
+    std::nth_element(work.begin(), work.begin() + static_cast<long>(kept) - 1,
+                     work.begin() + static_cast<long>(count));
+    double squares = 0.0;
+    for (std::size_t i = 0; i < kept; ++i)
+        squares += work[i] * work[i];
+    variance = squares / static_cast<double>(kept) / 2.0 * scale * scale;
+    return std::isfinite(mean) && std::isfinite(variance);
+}
+
+} // namespace
+
+CentreLevels centreLevels(const BayerImage& mosaic, float blackLevel) {
+    requireFloatImage(mosaic);
+    CentreLevels levels;
+    const std::int32_t width = mosaic.width();
+    const std::int32_t height = mosaic.height();
+    if (mosaic.channels() != 1 || width < 6 || height < 6)
+        return levels;
+    const int phase = bayerPhase(mosaic.cfa());
+    double sum[4] = {0, 0, 0, 0};
+    std::size_t count[4] = {0, 0, 0, 0};
+    const float* samples = mosaic.pixels();
+    for (std::int32_t y = height / 3; y < height - height / 3; ++y)
+        for (std::int32_t x = width / 3; x < width - width / 3; ++x) {
+            const int channel = bayerChannel(static_cast<std::uint64_t>(x),
+                                             static_cast<std::uint64_t>(y), phase);
+            sum[channel] += samples[static_cast<std::size_t>(y) * width + x];
+            ++count[channel];
+        }
+    levels.valid = true;
+    for (int c = 0; c < 4; ++c) {
+        levels.level[c] = count[c] ? sum[c] / static_cast<double>(count[c]) - blackLevel : 0.0;
+        if (!(levels.level[c] > 0.0))
+            levels.valid = false;
+    }
+    return levels;
+}
+
+std::string bayerOrderDoubt(const CentreLevels& levels, const std::string& orderName) {
+    if (!levels.valid)
+        return std::string();
+    const double green = std::max(levels.level[1], levels.level[2]);
+    const double greens = std::fabs(levels.level[1] - levels.level[2]) / green;
+    const std::string question = ": is the Bayer order " + orderName + " right?";
+    if (greens > kGreenMismatch)
+        return "The two green channels differ by " + percentText(greens) +
+               " % in the centre of the image (a sensor's greens differ by a few per cent at "
+               "most)" + question;
+    for (int c : {0, 3})
+        if (levels.level[c] > kBrighterThanGreen * green)
+            return std::string("The ") + kChannelNames[c] + " channel is " +
+                   ratioText(levels.level[c] / green) +
+                   " x green in the centre of the image (no usual illuminant makes it brighter "
+                   "than green)" + question;
+    return std::string();
+}
+
+PedestalEvidence pedestalFromNoise(const BayerImage& capture, std::uint32_t fullScale) {
+    requireFloatImage(capture);
+    PedestalEvidence evidence;
+    const std::int32_t width = capture.width();
+    const std::int32_t height = capture.height();
+    if (capture.channels() != 1 || width < kBlockSide || height < kBlockSide)
+        return evidence;
+    const double scale = fullScale;
+    const int blocksX = width / kBlockSide;
+    const int blocksY = height / kBlockSide;
+    const int stepX = std::max(1, (blocksX + kMaxBlocksPerAxis - 1) / kMaxBlocksPerAxis);
+    const int stepY = std::max(1, (blocksY + kMaxBlocksPerAxis - 1) / kMaxBlocksPerAxis);
+
+    // Least-squares line variance = slope x mean + intercept, one point per
+    // block and channel (all four share the pixels' conversion gain).
+    std::vector<std::pair<double, double>> points;
+    std::array<double, 64> work{};
+    const float* samples = capture.pixels();
+    for (int by = 0; by < blocksY; by += stepY)
+        for (int bx = 0; bx < blocksX; bx += stepX)
+            for (int channel = 0; channel < 4; ++channel) {
+                double mean = 0.0, variance = 0.0;
+                const std::int32_t x0 = bx * kBlockSide + (channel & 1);
+                const std::int32_t y0 = by * kBlockSide + (channel >> 1);
+                // The last row or column of the block may stand one pixel out.
+                if (x0 + kBlockSide - 1 > width || y0 + kBlockSide - 1 > height)
+                    continue;
+                if (!blockNoise(samples, width, x0, y0, scale, mean, variance, work))
+                    continue;
+                // Clipped or black blocks tell nothing about the noise.
+                if (mean > 0.9 * scale || mean < 0.02 * scale)
+                    continue;
+                points.emplace_back(mean, variance);
+            }
+    evidence.blocks = static_cast<int>(points.size());
+    if (points.size() < kMinBlocks)
+        return evidence;
+
+    double meanX = 0.0, meanY = 0.0, low = points[0].first, high = points[0].first;
+    for (const auto& [x, y] : points) {
+        meanX += x;
+        meanY += y;
+        low = std::min(low, x);
+        high = std::max(high, x);
+    }
+    const double n = static_cast<double>(points.size());
+    meanX /= n;
+    meanY /= n;
+    double sxx = 0.0, sxy = 0.0;
+    for (const auto& [x, y] : points) {
+        sxx += (x - meanX) * (x - meanX);
+        sxy += (x - meanX) * (y - meanY);
+    }
+    if (!(sxx > 0.0) || !(high >= kMinLevelSpread * low))
+        return evidence;
+    const double slope = sxy / sxx;
+    const double intercept = meanY - slope * meanX;
+    double residual = 0.0;
+    for (const auto& [x, y] : points) {
+        const double r = y - slope * x - intercept;
+        residual += r * r;
+    }
+    const double sigma = std::sqrt(residual / (n - 2.0));
+    const double slopeError = sigma / std::sqrt(sxx);
+    const double interceptError = sigma * std::sqrt(1.0 / n + meanX * meanX / sxx);
+    if (!(slope > kMinSlopeSignificance * slopeError))
+        return evidence;
+    evidence.measured = true;
+    evidence.estimate = -intercept / slope;
+    evidence.standardError =
+        std::sqrt(interceptError * interceptError +
+                  evidence.estimate * evidence.estimate * slopeError * slopeError) /
+        slope;
+    evidence.lowerBound = evidence.estimate - 3.0 * evidence.standardError;
+    return evidence;
+}
+
+} // namespace prep
