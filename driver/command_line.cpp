@@ -44,6 +44,7 @@ po::options_description basicOptions() {
         ("bmp,m", fileName(),
          "The flatten bmp image resulting from applying the lens shading calibration register "
          "values.")
+        ("json", fileName(), "Output run result filename (JSON format).")
         ("xtest,x", "Generate a surface that causes obvious color distortions for sanity checking.")
         ("version,V", "Print version string.")
         ("help,H", "Print this help message.");

@@ -15,7 +15,8 @@ namespace {
 constexpr const char* kInputOptions[] = {"config", "input", "raw", "samples", "autofocus"};
 constexpr const char* kOutputOptions[] = {
     "calibrate", "binary",  "inputasjpeg", "inputasbmp", "translate", "preproc", "outsamples",
-    "flat",      "jpeg",    "bmp",         "delta",      "stats",     "log",     "report"};
+    "flat",      "jpeg",    "bmp",         "delta",      "stats",     "log",     "report",
+    "json"};
 
 // What a path names, as far as two paths can be told to name the same file.
 struct FileIdentity {

@@ -15,6 +15,7 @@
 #include "driver/file_options.h"
 #include "driver/report_data.h"
 #include "driver/run_report_html.h"
+#include "driver/run_result_json.h"
 #include "driver/unknown_settings.h"
 #include "driver/headerless_raw.h"
 #include "driver/output_stream.h"
@@ -111,8 +112,12 @@ int Pipeline::run(int argc, const char* const argv[]) {
         throw std::runtime_error(msg::kAutofocusNeedsBinary);
     checkOutputsReplaceNothing(commandLine_);
     reportPath_ = commandLine_.value("report");
+    resultPath_ = commandLine_.value("json");
     report_.toolVersion = lscversion::versionText();
     report_.commandLine = commandLine_.argumentsText();
+    for (const char* option : {"config", "input", "raw", "samples", "autofocus"})
+        if (!commandLine_.value(option).empty())
+            report_.inputFiles.emplace_back(option, commandLine_.value(option));
     try {
         runStages();
     } catch (...) {
@@ -121,6 +126,7 @@ int Pipeline::run(int argc, const char* const argv[]) {
     }
     report_.finished = true;
     writeReport();
+    writeResult();
     finish();
     return 0;
 }
@@ -180,18 +186,24 @@ void Pipeline::runStages() {
 }
 
 // The report of a failed run shows what failed and everything computed before.
+// The report and the result file of a failed run show what failed and
+// everything computed before.
 void Pipeline::recordFailure() {
-    if (reportPath_.empty())
+    if (reportPath_.empty() && resultPath_.empty())
         return;
     report_.failedStage = stage_;
     recordFitError();
-    report_.failureMessage = describeFailure(std::current_exception()).text;
-    try {
-        writeReport();
-    } catch (const std::exception& error) {
-        // The run's own error is what the operator must see first; this one
-        // goes on the line before it.
-        out() << msg::kErrorPrefix << error.what() << std::endl;
+    const FailureText failure = describeFailure(std::current_exception());
+    report_.failureMessage = failure.text;
+    report_.exitStatus = failure.status;
+    for (void (Pipeline::*write)() : {&Pipeline::writeReport, &Pipeline::writeResult}) {
+        try {
+            (this->*write)();
+        } catch (const std::exception& error) {
+            // The run's own error is what the operator must see first; this
+            // one goes on the line before it.
+            out() << msg::kErrorPrefix << error.what() << std::endl;
+        }
     }
 }
 
@@ -200,6 +212,13 @@ void Pipeline::writeReport() {
         return;
     out() << "Writing calibration report." << std::endl;
     writeRunReport(reportPath_, report_);
+}
+
+void Pipeline::writeResult() {
+    if (resultPath_.empty())
+        return;
+    out() << "Writing run result." << std::endl;
+    writeRunResult(resultPath_, report_);
 }
 
 void Pipeline::readConfiguration() {
@@ -236,12 +255,14 @@ void Pipeline::openMessages() {
     out() << "Input file: " << settings_.input << std::endl;
 }
 
-void Pipeline::saveIfAsked(const std::string& path, const char* message, const char* timerLabel,
+void Pipeline::saveIfAsked(const char* option, const std::string& path, const char* message,
+                           const char* timerLabel,
                            const std::function<void(const std::string&)>& store) {
     if (path.empty())
         return;
     out() << message << std::endl;
     store(path);
+    noteOutput(option, path);
     timerLine(timer_, timerLabel, out());
 }
 
@@ -261,13 +282,16 @@ void Pipeline::loadInput() {
         loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
                           legacyFormat.as_bool());
         if (!settings_.translate.empty())
+        {
             input_.storeKqraw(settings_.translate);
+            noteOutput("translate", settings_.translate);
+        }
     }
     timerLine(timer_, "Image load time: ", out());
-    saveIfAsked(settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
+    saveIfAsked("inputasjpeg", settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
                 "JPEG image save time: ",
                 [&](const std::string& path) { input_.storeJpeg(path, settings_.jpegQuality); });
-    saveIfAsked(settings_.inputAsBmp, "Saving raw input file in bmp format.",
+    saveIfAsked("inputasbmp", settings_.inputAsBmp, "Saving raw input file in bmp format.",
                 "BMP image save time: ", [&](const std::string& path) { input_.storeBmp(path); });
 }
 
@@ -287,6 +311,7 @@ void Pipeline::decideBitDepth() {
     report_.bayerOrder = cfaPatternName(input_.cfa());
     report_.bitDepth = depth_;
     report_.exposureTime = input_.exposureTime();
+    report_.serialNumber = input_.serialNumber(32);
     report_.inspectionInFixedNotation = settings_.debug;
     for (int channel = 0; channel < kChannels; ++channel)
         report_.gains[channel] = input_.channelGain(channel);
@@ -397,6 +422,7 @@ void Pipeline::writePreparedImage() {
         return;
     out() << "Preprocessed image file: " << settings_.preproc << std::endl;
     prepared_.storeKqraw(settings_.preproc);
+    noteOutput("preproc", settings_.preproc);
     const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
     if (settings_.debug && unfiltered && settings_.procSamplingFactor == 1) {
         out() << "Performing identity test." << std::endl;
@@ -411,10 +437,10 @@ void Pipeline::buildSampleSet() {
     context_.image.copy(prepared_);
     load_fit_settings(*config_, input_, context_);
     context_.quiet = settings_.quiet;
+    report_.havePrepared = true;
+    report_.preparedWidth = prepared_.width();
+    report_.preparedHeight = prepared_.height();
     if (!reportPath_.empty()) {
-        report_.havePrepared = true;
-        report_.preparedWidth = prepared_.width();
-        report_.preparedHeight = prepared_.height();
         report_.shadingBefore = reportBlockMeans(prepared_);
         scaleToPeak(report_.shadingBefore, context_.blackLevel);
     }
@@ -426,8 +452,10 @@ void Pipeline::obtainSamples() {
     if (settings_.samples.empty()) {
         out() << "Create samples from image." << std::endl;
         collectSamples(context_, out());
-        if (!settings_.outSamples.empty())
+        if (!settings_.outSamples.empty()) {
             prep::writeSampleFile(settings_.outSamples, context_, sampleScale);
+            noteOutput("outsamples", settings_.outSamples);
+        }
     } else {
         out() << "Loading sample points from file." << std::endl;
         prep::readSampleFile(settings_.samples, context_, sampleScale);
@@ -485,6 +513,7 @@ void Pipeline::writeRegisterFile() {
         registerText_ = write_register_file(settings_.calibrate, *config_, settings_.blockName,
                                             settings_.controlPointInfix,
                                             commandLine_.argumentsText(), context_, input_);
+        noteOutput("calibrate", settings_.calibrate);
     }
     timerLine(timer_, "Lens shading calculation time: ", out());
 }
@@ -519,6 +548,7 @@ void Pipeline::writeBinaryData() {
 
     if (!writeWholeFile(settings_.binary, bytes.data(), bytes.size()))
         throw std::runtime_error(msg::kCannotStoreBinary);
+    noteOutput("binary", settings_.binary);
     timerLine(timer_, "Binary data save time: ", out());
 
     out() << "Reading binary calibration data." << std::endl;
@@ -578,11 +608,14 @@ void Pipeline::measureColourError() {
     if (!settings_.delta.empty()) {
         out() << "Writing delta ab data." << std::endl;
         prep::writeDeltaFile(settings_.delta, context_);
+        noteOutput("delta", settings_.delta);
     }
     out().precision(6);
     out() << "Maximum delta ab: " << context_.maxDelta << std::endl;
-    if (!settings_.stats.empty())
+    if (!settings_.stats.empty()) {
         prep::writeStatsFile(settings_.stats, context_);
+        noteOutput("stats", settings_.stats);
+    }
     prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
     timerLine(timer_, "Calculate delta ab time: ", out());
 }
@@ -641,12 +674,12 @@ void Pipeline::writeFlattenedImages() {
         return;
     BayerImage flattened = std::move(context_.corrected);
     flattened.copyMetadata(input_);
-    saveIfAsked(settings_.flat, "Writing flattened image.", "Flattened raw image save time: ",
+    saveIfAsked("flat", settings_.flat, "Writing flattened image.", "Flattened raw image save time: ",
                 [&](const std::string& path) { flattened.storeKqraw(path); });
-    saveIfAsked(settings_.jpeg, "Writing flattened jpeg image.",
+    saveIfAsked("jpeg", settings_.jpeg, "Writing flattened jpeg image.",
                 "Flattened JPEG image save time: ",
                 [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
-    saveIfAsked(settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
+    saveIfAsked("bmp", settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
                 [&](const std::string& path) { flattened.storeBmp(path); });
 }
 

@@ -29,6 +29,7 @@ private:
     void beginStage(const char* name) { stage_ = name; }
     void recordFailure();
     void writeReport();
+    void writeResult();
     void readConfiguration();
     void openMessages();
     void loadInput();
@@ -57,8 +58,12 @@ private:
     void writeFlattenedImages();
     void finish();
     // When `path` is set: the message line, store(path), the timer line.
-    void saveIfAsked(const std::string& path, const char* message, const char* timerLabel,
-                     const std::function<void(const std::string&)>& store);
+    void saveIfAsked(const char* option, const std::string& path, const char* message,
+                     const char* timerLabel, const std::function<void(const std::string&)>& store);
+    // An output this run has finished writing, for the result file.
+    void noteOutput(const char* option, const std::string& path) {
+        report_.outputs.emplace_back(option, path);
+    }
 
     boost::posix_time::ptime startTime_;
     StageTimer timer_;
@@ -77,6 +82,7 @@ private:
 
     // The calibration report (--report): filled as the stages go.
     std::string reportPath_;
+    std::string resultPath_;  // --json
     RunReport report_;
     const char* stage_ = "";
 };

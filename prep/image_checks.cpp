@@ -5,6 +5,7 @@
 #include "image/error_detail.h"
 
 #include <cmath>
+#include <cstdio>
 #include <iomanip>
 #include <limits>
 #include <locale>
@@ -63,8 +64,10 @@ std::string rangeDetail(const BayerImage& image, const PixelLimits& limits,
             return;
         if (text.tellp() > 0)
             text << "; ";
+        char share[32];
+        std::snprintf(share, sizeof share, "%.3g", 100.0 * static_cast<double>(found.count) / total);
         text << name << ": " << found.count << (found.count == 1 ? " pixel (" : " pixels (")
-             << 100.0 * static_cast<double>(found.count) / total << " %) " << relation << ' ' << std::setprecision(0) << limit << " ("
+             << share << " %) " << relation << ' ' << std::setprecision(0) << limit << " ("
              << worstName << ' ' << sampleUnits(found.worst, fullScale) << " at sensor x "
              << sensorCoordinate(found.column, limits.samplingFactor) << ", y "
              << sensorCoordinate(found.row, limits.samplingFactor) << ')' << std::setprecision(2);
