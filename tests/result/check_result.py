@@ -1,13 +1,13 @@
 #!/usr/bin/env python3
 """Checks a run result document (lsc --json) with a JSON parser and the schema.
 
-Usage: check_result.py FILE [PATH=VALUE]...
+Usage: check_result.py FILE [PATH=VALUE | ?PATH | !PATH]...
 
 The file must be one JSON document (strict: no NaN, no duplicate keys) that
 validates against docs/result.schema.json. Each PATH=VALUE compares the value
-at a dotted path (list items by number: outputs.0.option) with VALUE read as
-JSON (a bare word is taken as a string); PATH? only asks for the path to exist,
-!PATH for it to be absent.
+at a path of steps joined by "/" (list items by number: outputs/0/option) with
+VALUE read as JSON (text that is not JSON is taken as a string); ?PATH only
+asks for the path to exist, !PATH for it to be absent.
 Prints "check_result: OK" or every problem found, and exits 0 or 1.
 """
 
@@ -33,7 +33,7 @@ def no_duplicates(pairs):
 
 def lookup(document, path):
     node = document
-    for step in path.split("."):
+    for step in path.split("/"):
         if isinstance(node, list) and step.isdigit() and int(step) < len(node):
             node = node[int(step)]
         elif isinstance(node, dict) and step in node:
@@ -58,8 +58,8 @@ def main(argv):
             if expectation.startswith("!"):
                 lookup(document, expectation[1:])
                 problems.append("present: " + expectation[1:])
-            elif expectation.endswith("?"):
-                lookup(document, expectation[:-1])
+            elif expectation.startswith("?"):
+                lookup(document, expectation[1:])
             else:
                 path, _, text = expectation.partition("=")
                 try:
