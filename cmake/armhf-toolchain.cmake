@@ -10,6 +10,7 @@ set(triplet arm-linux-gnueabihf)
 set(CMAKE_C_COMPILER ${triplet}-gcc)
 set(CMAKE_CXX_COMPILER ${triplet}-g++)
 set(CMAKE_LIBRARY_ARCHITECTURE ${triplet})
+set(LSC_DEBIAN_ARCHITECTURE armhf)  # of the .deb that CPack builds
 # The notes on parameter passing changed in GCC 7.1 and 10.1 concern linking
 # with objects built by older compilers, which this build never does.
 set(CMAKE_CXX_FLAGS_INIT -Wno-psabi)

@@ -7,7 +7,9 @@
 
 #include <boost/program_options.hpp>
 
+#include <cstring>
 #include <sstream>
+#include <vector>
 
 namespace po = boost::program_options;
 
@@ -75,10 +77,20 @@ po::options_description advancedOptions() {
     return options;
 }
 
-po::variables_map parseWith(int argc, const char* const argv[],
+// "-h" is another spelling of "-H", the habit of most command-line tools. It
+// is not listed in the help text, which shows the options as they always were.
+std::vector<const char*> withHelpSpelledOut(int argc, const char* const argv[]) {
+    std::vector<const char*> args(argv, argv + argc);
+    for (std::size_t i = 1; i < args.size(); ++i)
+        if (std::strcmp(args[i], "-h") == 0)
+            args[i] = "-H";
+    return args;
+}
+
+po::variables_map parseWith(const std::vector<const char*>& args,
                             const po::options_description& options) {
     po::variables_map map;
-    po::store(po::parse_command_line(argc, argv, options), map);
+    po::store(po::parse_command_line(static_cast<int>(args.size()), args.data(), options), map);
     po::notify(map);
     return map;
 }
@@ -105,12 +117,13 @@ CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream&
     po::options_description all("Options");
     all.add(basic).add(advanced);
 
+    const std::vector<const char*> args = withHelpSpelledOut(argc, argv);
     CommandLine line;
-    line.map_ = parseWith(argc, argv, all);
+    line.map_ = parseWith(args, all);
     // Without --kq an advanced option must fail as an unknown one.
     if (!line.given("kq")) {
         try {
-            parseWith(argc, argv, basic);
+            parseWith(args, basic);
         } catch (const po::unknown_option& error) {
             rethrowUnknown(error, advanced);
         }
@@ -124,7 +137,7 @@ CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream&
     if (line.given("help")) {
         out << lscversion::versionLine() << std::endl;
         std::ostringstream text;
-        text << (line.given("kq") ? all : basic);
+        text << msg::kUsageLine << '\n' << (line.given("kq") ? all : basic);
         throw notice(text.str());
     }
 

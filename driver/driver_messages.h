@@ -12,6 +12,9 @@ inline constexpr char kNeedInputForOutSamples[] =
 inline constexpr char kNeedCalibrateOrOutSamples[] =
     "ERROR: Must specify either an output calibration register file or output sample file.";
 inline constexpr char kUseHelp[] = "Use --help to print out all the options.";
+// The second line of the help text, naming what every calibration run needs.
+inline constexpr char kUsageLine[] =
+    "Usage: lsc --config FILE --input FILE --calibrate FILE [options]";
 
 // Top-level error report
 inline constexpr char kErrorPrefix[] = "ERROR: ";

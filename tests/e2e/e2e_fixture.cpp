@@ -1,8 +1,19 @@
 #include "tests/e2e/e2e_fixture.h"
 
+#include <fstream>
 #include <sstream>
 
 namespace e2e {
+
+void expectGolden(const std::string& actual, const std::string& goldenName) {
+    const std::string golden = testing_support::readFile(kGoldenDir + goldenName);
+    if (actual == golden)
+        return;
+    const std::string kept = goldenName + ".actual";
+    std::ofstream(kept, std::ios::binary) << actual;
+    ADD_FAILURE() << goldenName << " differs; see: diff " << kGoldenDir << goldenName << " "
+                  << kept;
+}
 
 std::vector<std::string> lines(const std::string& text) {
     std::vector<std::string> result;

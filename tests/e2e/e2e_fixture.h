@@ -60,6 +60,14 @@ protected:
     FlatField field_;
 };
 
+// Where the golden files of the end-to-end tests live.
+inline const std::string kGoldenDir = std::string(LSC_SOURCE_DIR) + "/tests/data/e2e/";
+
+// Compares a whole text with the golden file `goldenName` in kGoldenDir. On a
+// mismatch the actual text is kept as <goldenName>.actual in the working
+// directory for a diff.
+void expectGolden(const std::string& actual, const std::string& goldenName);
+
 // The lines of a text, without their line ends.
 std::vector<std::string> lines(const std::string& text);
 // True when `needle` occurs in `text` as a whole line.

@@ -3,15 +3,12 @@
 // dark to correct ends the run before the register file is written, and the
 // sample window keeps a small blotch out of the samples.
 
-#include <fstream>
 #include <regex>
 
 #include "tests/e2e/e2e_fixture.h"
 
 namespace e2e {
 namespace {
-
-const std::string kGoldenDir = std::string(LSC_SOURCE_DIR) + "/tests/data/e2e/";
 
 // The flat field of the golden default run: noisy, with defective pixels.
 FlatFieldShape goldenShape() {
@@ -20,18 +17,6 @@ FlatFieldShape goldenShape() {
     shape.defects = 200;
     shape.seed = 3;
     return shape;
-}
-
-// Compares a whole text with a golden file. On a mismatch the actual text is
-// kept as <golden name>.actual in the working directory for a diff.
-void expectGolden(const std::string& actual, const std::string& goldenName) {
-    const std::string golden = testing_support::readFile(kGoldenDir + goldenName);
-    if (actual == golden)
-        return;
-    const std::string kept = goldenName + ".actual";
-    std::ofstream(kept, std::ios::binary) << actual;
-    ADD_FAILURE() << goldenName << " differs; see: diff " << kGoldenDir << goldenName << " "
-                  << kept;
 }
 
 // A square of `size` x `size` pixels with its top-left corner at (x, y), all
