@@ -9,6 +9,7 @@
 
 #include <cstring>
 #include <sstream>
+#include <stdexcept>
 #include <vector>
 
 namespace po = boost::program_options;
@@ -20,10 +21,16 @@ po::typed_value<std::string>* fileName() {
     return po::value<std::string>()->default_value(std::string(), "");
 }
 
+// --input may be given up to kMaxInputFrames times: the frames are averaged.
+// Shown in the help text as every file option is.
+po::typed_value<std::vector<std::string>>* frameNames() {
+    return po::value<std::vector<std::string>>()->composing();
+}
+
 po::options_description basicOptions() {
     po::options_description options("Options");
     options.add_options()
-        ("input,i", fileName(), "The input kqraw bayer image file.")
+        ("input,i", frameNames(), "The input kqraw bayer image file.")
         ("inputasjpeg,u", fileName(),
          "Filename to save the input image file converted into jpeg format.")
         ("inputasbmp,w", fileName(),
@@ -73,7 +80,9 @@ po::options_description advancedOptions() {
          "configuration mid-stream upon encountering a HW limit and return error code 257.")
         ("quiet,q", "Suppress warning and informational messages.")
         ("verbose,v", "Output detailed information during processing.")
-        ("report", fileName(), "Output calibration report filename (HTML format).");
+        ("report", fileName(), "Output calibration report filename (HTML format).")
+        ("check", fileName(),
+         "Output full-resolution corrected image filename (16-bit TIFF format).");
     return options;
 }
 
@@ -156,6 +165,11 @@ CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream&
           msg::kNeedCalibrateOrOutSamples);
     if (failed)
         throw notice(msg::kUseHelp);
+    const std::size_t frames = line.values("input").size();
+    if (frames > kMaxInputFrames)
+        throw std::runtime_error("At most " + std::to_string(kMaxInputFrames) +
+                                 " input frames can be averaged; --input is given " +
+                                 std::to_string(frames) + " times.");
     return line;
 }
 
@@ -163,5 +177,16 @@ std::string CommandLine::value(const char* name) const {
     const auto found = map_.find(name);
     if (found == map_.end())
         return std::string();
+    if (const auto* several = boost::any_cast<std::vector<std::string>>(&found->second.value()))
+        return several->empty() ? std::string() : several->front();
     return found->second.as<std::string>();
+}
+
+std::vector<std::string> CommandLine::values(const char* name) const {
+    const auto found = map_.find(name);
+    if (found == map_.end())
+        return {};
+    if (const auto* several = boost::any_cast<std::vector<std::string>>(&found->second.value()))
+        return *several;
+    return {found->second.as<std::string>()};
 }

@@ -16,7 +16,7 @@ constexpr const char* kInputOptions[] = {"config", "input", "raw", "samples", "a
 constexpr const char* kOutputOptions[] = {
     "calibrate", "binary",  "inputasjpeg", "inputasbmp", "translate", "preproc", "outsamples",
     "flat",      "jpeg",    "bmp",         "delta",      "stats",     "log",     "report",
-    "json"};
+    "json",      "check"};
 
 // What a path names, as far as two paths can be told to name the same file.
 struct FileIdentity {
@@ -75,12 +75,12 @@ struct NamedFile {
 std::vector<NamedFile> namedFiles(const CommandLine& line, const char* const* options,
                                   std::size_t count) {
     std::vector<NamedFile> files;
-    for (std::size_t i = 0; i < count; ++i) {
-        const std::string path = line.value(options[i]);
-        FileIdentity id = identify(path);
-        if (id.kind == FileIdentity::kExisting || id.kind == FileIdentity::kToBeMade)
-            files.push_back({options[i], path, std::move(id)});
-    }
+    for (std::size_t i = 0; i < count; ++i)
+        for (const std::string& path : line.values(options[i])) {  // every --input frame
+            FileIdentity id = identify(path);
+            if (id.kind == FileIdentity::kExisting || id.kind == FileIdentity::kToBeMade)
+                files.push_back({options[i], path, std::move(id)});
+        }
     return files;
 }
 

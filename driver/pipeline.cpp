@@ -10,6 +10,7 @@
 #include "config/register_file.h"
 #include "driver/autofocus_file.h"
 #include "driver/changed_settings.h"
+#include "driver/check_image.h"
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
 #include "driver/file_options.h"
@@ -18,6 +19,7 @@
 #include "driver/run_result_json.h"
 #include "driver/unknown_settings.h"
 #include "driver/headerless_raw.h"
+#include "driver/input_frames.h"
 #include "driver/output_stream.h"
 #include "driver/version.h"
 #include "image/hex_text.h"
@@ -111,13 +113,16 @@ int Pipeline::run(int argc, const char* const argv[]) {
     if (!commandLine_.value("autofocus").empty() && commandLine_.value("binary").empty())
         throw std::runtime_error(msg::kAutofocusNeedsBinary);
     checkOutputsReplaceNothing(commandLine_);
+    frames_ = commandLine_.values("input");
+    checkPath_ = commandLine_.value("check");
     reportPath_ = commandLine_.value("report");
     resultPath_ = commandLine_.value("json");
     report_.toolVersion = lscversion::versionText();
     report_.commandLine = commandLine_.argumentsText();
     for (const char* option : {"config", "input", "raw", "samples", "autofocus"})
-        if (!commandLine_.value(option).empty())
-            report_.inputFiles.emplace_back(option, commandLine_.value(option));
+        for (const std::string& path : commandLine_.values(option))
+            if (!path.empty())
+                report_.inputFiles.emplace_back(option, path);
     try {
         runStages();
     } catch (...) {
@@ -183,6 +188,10 @@ void Pipeline::runStages() {
     checkLuminance();
     beginStage("Writing the flattened images");
     writeFlattenedImages();
+    if (!checkPath_.empty()) {
+        beginStage("Writing the check image");
+        writeCheck();
+    }
 }
 
 // The report of a failed run shows what failed and everything computed before.
@@ -252,7 +261,8 @@ void Pipeline::openMessages() {
     if (settings_.input.empty())
         throw std::runtime_error(msg::kNoInput);
     timerLine(timer_, "Processes configuration: ", out());
-    out() << "Input file: " << settings_.input << std::endl;
+    for (const std::string& frame : frames_)
+        out() << "Input file: " << frame << std::endl;
 }
 
 void Pipeline::saveIfAsked(const char* option, const std::string& path, const char* message,
@@ -268,25 +278,34 @@ void Pipeline::saveIfAsked(const char* option, const std::string& path, const ch
 
 void Pipeline::loadInput() {
     if (settings_.raw.empty()) {
-        input_.read(settings_.input);
-        // A code the reader does not know leaves no Bayer order: every later
-        // stage would fail with a message that points elsewhere.
-        const std::uint32_t cfa = input_.cfa();
-        if (cfa != kCfaRggb && cfa != kCfaGrbg && cfa != kCfaGbrg && cfa != kCfaBggr)
-            throw std::runtime_error(msg::kUnknownBayerOrder);
+        readAveragedFrames(input_, frames_,
+                           [](BayerImage& frame, const std::string& path) {
+                               frame.read(path);
+                               // A code the reader does not know leaves no Bayer
+                               // order: every later stage would fail with a
+                               // message that points elsewhere.
+                               const std::uint32_t cfa = frame.cfa();
+                               if (cfa != kCfaRggb && cfa != kCfaGrbg && cfa != kCfaGbrg &&
+                                   cfa != kCfaBggr)
+                                   throw std::runtime_error(msg::kUnknownBayerOrder);
+                           });
     } else {
         const int bits = settings_.bitRes == 0 ? 10 : settings_.bitRes;
         // Read only here: a run without --raw never looks at it.
         const config_node& legacyFormat = config_->find_path("raw.legacy_format");
         check_int_range(*config_, legacyFormat, 0, 1);
-        loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
-                          legacyFormat.as_bool());
-        if (!settings_.translate.empty())
-        {
+        readAveragedFrames(input_, frames_,
+                           [&](BayerImage& frame, const std::string& path) {
+                               loadHeaderlessRaw(frame, path, static_cast<std::uint16_t>(bits),
+                                                 settings_.raw, legacyFormat.as_bool());
+                           });
+        if (!settings_.translate.empty()) {
             input_.storeKqraw(settings_.translate);
             noteOutput("translate", settings_.translate);
         }
     }
+    if (frames_.size() > 1)
+        out() << "Input frames averaged: " << frames_.size() << std::endl;
     timerLine(timer_, "Image load time: ", out());
     saveIfAsked("inputasjpeg", settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
                 "JPEG image save time: ",
@@ -311,6 +330,7 @@ void Pipeline::decideBitDepth() {
     report_.bayerOrder = cfaPatternName(input_.cfa());
     report_.bitDepth = depth_;
     report_.exposureTime = input_.exposureTime();
+    report_.framesAveraged = static_cast<int>(frames_.size());
     report_.serialNumber = input_.serialNumber(32);
     report_.inspectionInFixedNotation = settings_.debug;
     for (int channel = 0; channel < kChannels; ++channel)
@@ -681,6 +701,14 @@ void Pipeline::writeFlattenedImages() {
                 [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
     saveIfAsked("bmp", settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
                 [&](const std::string& path) { flattened.storeBmp(path); });
+}
+
+// Last: it takes the capture's samples, which nothing needs after it.
+void Pipeline::writeCheck() {
+    out() << "Writing full-resolution check image." << std::endl;
+    writeCheckImage(checkPath_, std::move(input_), context_);
+    noteOutput("check", checkPath_);
+    timerLine(timer_, "Check image save time: ", out());
 }
 
 void Pipeline::finish() {

@@ -17,6 +17,7 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <vector>
 
 class Pipeline {
 public:
@@ -56,6 +57,7 @@ private:
     void choosePatchLayout();
     void checkLuminance();
     void writeFlattenedImages();
+    void writeCheck();
     void finish();
     // When `path` is set: the message line, store(path), the timer line.
     void saveIfAsked(const char* option, const std::string& path, const char* message,
@@ -81,6 +83,8 @@ private:
     std::string registerText_;
 
     // The calibration report (--report): filled as the stages go.
+    std::vector<std::string> frames_;  // --input, in order
+    std::string checkPath_;            // --check
     std::string reportPath_;
     std::string resultPath_;  // --json
     RunReport report_;

@@ -40,6 +40,7 @@ struct RunReport {
     bool haveInput = false;
     std::string inputPath;
     std::string serialNumber;
+    int framesAveraged = 1;
     std::int32_t width = 0, height = 0;
     std::string bayerOrder;         // "RGGB", ...
     int bitDepth = 0;

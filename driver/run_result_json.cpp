@@ -73,6 +73,7 @@ ordered_json inputs(const RunReport& report) {
         files.push_back({{"option", option}, {"path", path}});
     ordered_json object = {{"files", files}};
     if (report.haveInput) {
+        object["frames_averaged"] = report.framesAveraged;
         object["width"] = report.width;
         object["height"] = report.height;
         object["bayer_order"] = report.bayerOrder;
