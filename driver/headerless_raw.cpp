@@ -1,21 +1,23 @@
 #include "driver/headerless_raw.h"
 
-#include "config/strip_comments.h"
-#include "driver/driver_messages.h"
-#include "image/hex_text.h"
-#include "image/image_buffer.h"
-#include "lsc/apan_exception.h"
-
-#include <boost/iostreams/filtering_stream.hpp>
-#include <boost/program_options.hpp>
-
 #include <cstdio>
 #include <limits>
 #include <memory>
 #include <sstream>
 #include <stdexcept>
-#include <sys/stat.h>
 #include <vector>
+
+#include <boost/iostreams/filtering_stream.hpp>
+#include <boost/program_options.hpp>
+
+#include "config/strip_comments.h"
+#include "driver/driver_messages.h"
+#include "image/hex_text.h"
+#include "image/image_buffer.h"
+#include "lsc/apan_exception.h"
+#include "prep/mosaic_stream.h"
+
+#include <sys/stat.h>
 
 namespace po = boost::program_options;
 
@@ -27,19 +29,18 @@ using WideInt = long long;
 
 po::options_description detailsOptions() {
     po::options_description options("Details");
-    options.add_options()
-        ("image.height", po::value<WideInt>(), "Image height in pixels.")
-        ("image.width", po::value<WideInt>(), "Image width in pixels.")
-        ("image.bit_res", po::value<WideInt>(), "Image depth in bits per pixel.")
-        ("image.bayer_order", po::value<std::string>()->default_value("RGGB"),
-         "Image Bayer order (pixel color pattern).")
-        ("image.exp_time", po::value<float>()->default_value(100.0f),
-         "Image exposure time in milliseconds.")
-        ("image.gain", po::value<float>()->default_value(1.0f), "Image gain.")
-        ("image.sensor_guid", po::value<std::string>()->default_value(""),
-         "Sensor GUID of the imager module (model identifier, not a serial number).")
-        ("image.serial_no", po::value<std::string>()->default_value(""),
-         "Serial number of the imager module.");
+    options.add_options()("image.height", po::value<WideInt>(), "Image height in pixels.")(
+        "image.width", po::value<WideInt>(), "Image width in pixels.")(
+        "image.bit_res", po::value<WideInt>(), "Image depth in bits per pixel.")(
+        "image.bayer_order", po::value<std::string>()->default_value("RGGB"),
+        "Image Bayer order (pixel color pattern).")("image.exp_time",
+                                                    po::value<float>()->default_value(100.0f),
+                                                    "Image exposure time in milliseconds.")(
+        "image.gain", po::value<float>()->default_value(1.0f),
+        "Image gain.")("image.sensor_guid", po::value<std::string>()->default_value(""),
+                       "Sensor GUID of the imager module (model identifier, not a serial number).")(
+        "image.serial_no", po::value<std::string>()->default_value(""),
+        "Serial number of the imager module.");
     return options;
 }
 
@@ -61,8 +62,7 @@ std::uint32_t dimension(const po::variables_map& map, const char* name) {
                                  " in headerless raw details file.");
     const WideInt value = map[name].as<WideInt>();
     if (value < 1 || value > kMaxSide)
-        throw std::range_error(std::string("Invalid ") + name + " value " +
-                               std::to_string(value) +
+        throw std::range_error(std::string("Invalid ") + name + " value " + std::to_string(value) +
                                " in headerless raw details file (must be 1 to 65535).");
     return static_cast<std::uint32_t>(value);
 }
@@ -149,9 +149,10 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
     return details;
 }
 
-void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
-                       std::uint16_t defaultBits, const std::string& detailsPath,
-                       bool fixedHeader) {
+bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
+                       const std::string& detailsPath, bool fixedHeader,
+                       const prep::MosaicPreparation* preparation, BayerImage* prepared,
+                       prep::SampleStatistics* inputStatistics, img::MosaicRowSink* rows) {
     namespace io = boost::iostreams;
     std::string detailsText;
     if (!readDetailsText(detailsPath, detailsText))
@@ -183,17 +184,38 @@ void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
         static_cast<std::uint64_t>(info.st_size) < expected)
         throw apan::exception(202, msg::kRawShortRow, msg::kRawShortRowHint);
 
-    target.createFromHeaderless(static_cast<std::int32_t>(d.width),
-                                static_cast<std::int32_t>(d.height), d.bits, d.cfa,
-                                d.exposureTime, d.gain, d.serialNumber, d.sensorGuid, fixedHeader);
-
+    const auto width = static_cast<std::int32_t>(d.width);
+    const auto height = static_cast<std::int32_t>(d.height);
+    const bool streamed =
+        preparation && prepared && prep::MosaicStream::accepts(width, height, *preparation);
+    target.createFromHeaderless(width, height, d.bits, d.cfa, d.exposureTime, d.gain,
+                                d.serialNumber, d.sensorGuid, fixedHeader, !streamed);
+    std::unique_ptr<prep::MosaicStream> stream;
     const std::uint32_t mask = (1u << d.bits) - 1;
+    if (streamed) {
+        stream = std::make_unique<prep::MosaicStream>(width, height, *preparation);
+        if (inputStatistics)
+            stream->measureSamples(mask);
+        if (rows)
+            rows->start(width, height);
+    }
+
     const float scale = static_cast<float>(mask);
     std::vector<unsigned char> row(static_cast<std::size_t>(rowBytes));
+    std::vector<std::uint16_t> samples(streamed ? d.width : 0);
     float* out = target.pixels();
     for (std::uint32_t y = 0; y < d.height; ++y) {
         if (std::fread(row.data(), 1, row.size(), file.get()) != row.size())
             throw apan::exception(202, msg::kRawShortRow, msg::kRawShortRowHint);
+        if (streamed) {
+            for (std::uint32_t x = 0; x < d.width; ++x)
+                samples[x] = static_cast<std::uint16_t>(
+                    (row[2 * x] | (std::uint32_t{row[2 * x + 1]} << 8)) & mask);
+            stream->addRow(samples.data());
+            if (rows)
+                rows->addRow(samples.data());
+            continue;
+        }
         for (std::uint32_t x = 0; x < d.width; ++x) {
             const std::uint32_t sample = row[2 * x] | (std::uint32_t{row[2 * x + 1]} << 8);
             *out++ = static_cast<float>(sample & mask) / scale;
@@ -201,4 +223,10 @@ void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
     }
     if (std::fgetc(file.get()) != EOF)
         throw apan::exception(202, msg::kRawTooLong, msg::kRawTooLongHint);
+    if (streamed) {
+        *prepared = stream->finish(d.bits, 0, d.cfa);
+        if (inputStatistics)
+            *inputStatistics = stream->statistics();
+    }
+    return streamed;
 }

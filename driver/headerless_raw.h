@@ -2,10 +2,13 @@
 // Headerless raw input: a bare dump of little-endian 16-bit samples, described
 // by a small text "details" file (size, bit depth, Bayer order, capture data).
 
-#include "image/bayer_image.h"
-
 #include <cstdint>
 #include <string>
+
+#include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
+#include "prep/image_checks.h"
+#include "prep/mosaic_preparation.h"
 
 struct HeaderlessRawDetails {
     std::uint32_t width = 0;
@@ -25,7 +28,14 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 
 // Loads the raw file described by the details file into `target`.
 // `fixedHeader` selects the raw header the image carries (and so the format
-// in which it is later stored). Throws apan::exception 202, 210, 262, 263, 264.
-void loadHeaderlessRaw(BayerImage& target, const std::string& rawPath,
-                       std::uint16_t defaultBits, const std::string& detailsPath,
-                       bool fixedHeader);
+// in which it is later stored). With `preparation` and `prepared`, the rows
+// go straight into the preparation when it accepts the size: `target` then
+// holds the capture data only, `prepared` the prepared mosaic, and the result
+// is true; `inputStatistics`, if given, then receives the statistics of the
+// input samples, and `rows`, if given, every row of the streamed samples. Throws apan::exception 202, 210, 262, 263, 264.
+bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
+                       const std::string& detailsPath, bool fixedHeader,
+                       const prep::MosaicPreparation* preparation = nullptr,
+                       BayerImage* prepared = nullptr,
+                       prep::SampleStatistics* inputStatistics = nullptr,
+                       img::MosaicRowSink* rows = nullptr);

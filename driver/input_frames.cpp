@@ -1,30 +1,23 @@
 #include "driver/input_frames.h"
 
+#include "image/mosaic_rows.h"
+#include "prep/frame_average.h"
+#include "prep/image_checks.h"
+
+#include <cmath>
 #include <cstddef>
 #include <stdexcept>
 
 namespace {
 
-std::string sizeText(const BayerImage& image) {
-    return std::to_string(image.width()) + " x " + std::to_string(image.height()) + " pixels";
+prep::FrameShape shapeOf(const BayerImage& image) {
+    return {image.width(), image.height(), image.cfa(), image.bitsPerSample()};
 }
 
-// What differs between a frame and the first, empty when they agree.
-std::string mismatch(const BayerImage& frame, const BayerImage& first) {
-    std::string text;
-    const auto add = [&](const std::string& part) { text += (text.empty() ? "" : ", ") + part; };
-    if (frame.width() != first.width() || frame.height() != first.height())
-        add(sizeText(frame) + " against " + sizeText(first));
-    if (frame.cfa() != first.cfa()) {
-        // The names live in one static buffer: each is copied before the next.
-        const std::string frameOrder = cfaPatternName(frame.cfa());
-        const std::string firstOrder = cfaPatternName(first.cfa());
-        add("Bayer order " + frameOrder + " against " + firstOrder);
-    }
-    if (frame.bitsPerSample() != first.bitsPerSample())
-        add("bit depth " + std::to_string(frame.bitsPerSample()) + " against " +
-            std::to_string(first.bitsPerSample()));
-    return text;
+// A sample of the image in whole units of its depth: the reader made it as
+// (s & mask) / mask, so this gives s back exactly.
+std::uint32_t wholeSample(float value, float mask) {
+    return static_cast<std::uint32_t>(std::lround(static_cast<double>(value) * mask));
 }
 
 } // namespace
@@ -36,21 +29,37 @@ void readAveragedFrames(BayerImage& image, const std::vector<std::string>& paths
         return;
     const std::size_t count = static_cast<std::size_t>(image.width()) *
                               static_cast<std::size_t>(image.height()) * image.channels();
+    const float mask = static_cast<float>(prep::fullScale(image.bitsPerSample()));
     float* average = image.pixels();
-    std::vector<double> sum(average, average + count);
+    std::vector<std::uint32_t> sum(count);
+    for (std::size_t k = 0; k < count; ++k)
+        sum[k] = wholeSample(average[k], mask);
     for (std::size_t i = 1; i < paths.size(); ++i) {
         BayerImage frame;
         read(frame, paths[i]);
-        const std::string difference = mismatch(frame, image);
+        const std::string difference = prep::frameDifference(shapeOf(frame), shapeOf(image));
         if (!difference.empty())
-            throw std::runtime_error("Input frame " + std::to_string(i + 1) + " (" + paths[i] +
-                                     ") does not match the first frame (" + paths[0] +
-                                     "): " + difference + ".");
+            prep::throwFrameMismatch(i, paths[i], paths[0], difference);
         const float* samples = frame.pixels();
         for (std::size_t k = 0; k < count; ++k)
-            sum[k] += samples[k];
+            sum[k] += wholeSample(samples[k], mask);
     }
-    const double frames = static_cast<double>(paths.size());
+    // As the reader converts a sample: a true division by the full scale.
+    const auto frames = static_cast<std::uint32_t>(paths.size());
     for (std::size_t k = 0; k < count; ++k)
-        average[k] = static_cast<float>(sum[k] / frames);
+        average[k] = static_cast<float>(prep::averageSample(sum[k], frames)) / mask;
+}
+
+void feedRows(const BayerImage& image, img::MosaicRowSink& sink) {
+    const float mask = static_cast<float>(prep::fullScale(image.bitsPerSample()));
+    const auto width = static_cast<std::size_t>(image.width());
+    std::vector<std::uint16_t> row(width);
+    const float* samples = image.pixels();
+    sink.start(image.width(), image.height());
+    for (std::int32_t y = 0; y < image.height(); ++y) {
+        for (std::size_t x = 0; x < width; ++x)
+            row[x] = static_cast<std::uint16_t>(
+                wholeSample(samples[static_cast<std::size_t>(y) * width + x], mask));
+        sink.addRow(row.data());
+    }
 }

@@ -1,5 +1,13 @@
 #include "driver/pipeline.h"
 
+#include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <iostream>
+#include <stdexcept>
+
+#include <boost/date_time/posix_time/posix_time.hpp>
+
 #include "blob/blob_dump.h"
 #include "blob/blob_parser.h"
 #include "blob/blob_writer.h"
@@ -21,6 +29,8 @@
 #include "driver/headerless_raw.h"
 #include "driver/input_frames.h"
 #include "driver/output_stream.h"
+#include "driver/report_data.h"
+#include "driver/run_report_html.h"
 #include "driver/version.h"
 #include "image/hex_text.h"
 #include "image/output_file.h"
@@ -30,6 +40,7 @@
 #include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
 #include "prep/capture_evidence.h"
+#include "prep/capture_stream.h"
 #include "prep/delta_ab.h"
 #include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
@@ -37,14 +48,6 @@
 #include "prep/mosaic_preparation.h"
 #include "prep/sample_file.h"
 #include "prep/white_balance.h"
-
-#include <boost/date_time/posix_time/posix_time.hpp>
-
-#include <algorithm>
-#include <charconv>
-#include <cmath>
-#include <iostream>
-#include <stdexcept>
 
 namespace {
 
@@ -100,7 +103,8 @@ ChannelBlockMeans reportBlockMeans(const BayerImage& image) {
 } // namespace
 
 Pipeline::Pipeline()
-    : startTime_(boost::posix_time::microsec_clock::local_time()), timer_(startStageTimer()) {}
+    : startTime_(boost::posix_time::microsec_clock::local_time()), timer_(startStageTimer()) {
+}
 
 int Pipeline::run(int argc, const char* const argv[]) {
     commandLine_ = CommandLine::parse(argc, argv, std::cout, std::cerr);
@@ -276,29 +280,72 @@ void Pipeline::saveIfAsked(const char* option, const std::string& path, const ch
     timerLine(timer_, timerLabel, out());
 }
 
+prep::MosaicPreparation Pipeline::preparation() const {
+    prep::MosaicPreparation preparation;
+    preparation.medianFilter = settings_.medianFilter;
+    preparation.medianSize = settings_.medianFilterSize;
+    preparation.samplingFactor = settings_.procSamplingFactor;
+    return preparation;
+}
+
+// Unless something needs the input image itself (its exports and
+// translation, the identity test, the full-resolution check image), the
+// capture is prepared as it is read and never held at full resolution.
+bool Pipeline::needsInputImage() const {
+    return !settings_.inputAsJpeg.empty() || !settings_.inputAsBmp.empty() ||
+           !settings_.translate.empty() || identityTest() || !checkPath_.empty();
+}
+
+// In debug mode, when the stored prepared image should be the input again.
+bool Pipeline::identityTest() const {
+    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
+    return settings_.debug && !settings_.preproc.empty() && unfiltered &&
+           settings_.procSamplingFactor == 1;
+}
+
 void Pipeline::loadInput() {
+    const prep::MosaicPreparation preparation = this->preparation();
+    const bool stream = !needsInputImage();
+    // Debug mode shows the input's statistics.
+    prep::SampleStatistics* statistics = settings_.debug ? &inputStatistics_ : nullptr;
     if (settings_.raw.empty()) {
-        readAveragedFrames(input_, frames_,
-                           [](BayerImage& frame, const std::string& path) {
-                               frame.read(path);
-                               // A code the reader does not know leaves no Bayer
-                               // order: every later stage would fail with a
-                               // message that points elsewhere.
-                               const std::uint32_t cfa = frame.cfa();
-                               if (cfa != kCfaRggb && cfa != kCfaGrbg && cfa != kCfaGbrg &&
-                                   cfa != kCfaBggr)
-                                   throw std::runtime_error(msg::kUnknownBayerOrder);
-                           });
+        if (frames_.size() > 1) {
+            if (stream && !statistics)
+                preparedWhileLoading_ =
+                    prep::loadAveragedPrepared(frames_, preparation, input_, prepared_,
+                                               &noise_) == prep::CaptureLoad::kPrepared;
+            if (!preparedWhileLoading_)
+                readAveragedFrames(input_, frames_,
+                                   [](BayerImage& frame, const std::string& path) {
+                                       frame.read(path);
+                                   });
+        } else if (stream) {
+            preparedWhileLoading_ =
+                prep::loadPrepared(settings_.input, preparation, input_, prepared_, statistics,
+                                   &noise_) == prep::CaptureLoad::kPrepared;
+        } else {
+            input_.read(settings_.input);
+        }
+        // A code the reader does not know leaves no Bayer order: every later
+        // stage would fail with a message that points elsewhere.
+        const std::uint32_t cfa = input_.cfa();
+        if (cfa != kCfaRggb && cfa != kCfaGrbg && cfa != kCfaGbrg && cfa != kCfaBggr)
+            throw std::runtime_error(msg::kUnknownBayerOrder);
     } else {
         const int bits = settings_.bitRes == 0 ? 10 : settings_.bitRes;
         // Read only here: a run without --raw never looks at it.
         const config_node& legacyFormat = config_->find_path("raw.legacy_format");
         check_int_range(*config_, legacyFormat, 0, 1);
-        readAveragedFrames(input_, frames_,
-                           [&](BayerImage& frame, const std::string& path) {
-                               loadHeaderlessRaw(frame, path, static_cast<std::uint16_t>(bits),
-                                                 settings_.raw, legacyFormat.as_bool());
-                           });
+        if (frames_.size() > 1)
+            readAveragedFrames(input_, frames_, [&](BayerImage& frame, const std::string& path) {
+                loadHeaderlessRaw(frame, path, static_cast<std::uint16_t>(bits), settings_.raw,
+                                  legacyFormat.as_bool());
+            });
+        else
+            preparedWhileLoading_ = loadHeaderlessRaw(
+                input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
+                legacyFormat.as_bool(), stream ? &preparation : nullptr, &prepared_, statistics,
+                &noise_);
         if (!settings_.translate.empty()) {
             input_.storeKqraw(settings_.translate);
             noteOutput("translate", settings_.translate);
@@ -371,7 +418,10 @@ void Pipeline::checkSettingsAgainstImage() {
 void Pipeline::inspectInput() {
     if (settings_.debug) {
         out() << "Input image data:" << std::endl;
-        prep::writeStatistics(input_, depth_, out());
+        if (input_.hasSamples())
+            prep::writeStatistics(input_, depth_, out());
+        else
+            prep::writeStatistics(inputStatistics_, depth_, out());
         out() << std::endl;
     }
     out().precision(3);
@@ -385,12 +435,10 @@ void Pipeline::prepareImage() {
     // Split, filter and weave run as one pass over the mosaic, so the colour
     // planes are never held at full resolution. The three timer lines stay;
     // the split's and the weave's work is counted in the filter's line.
+    // A capture prepared while it was read is counted in the load's line.
     timerLine(timer_, "Bayer deinterweave time: ", out());
-    prep::MosaicPreparation preparation;
-    preparation.medianFilter = settings_.medianFilter;
-    preparation.medianSize = settings_.medianFilterSize;
-    preparation.samplingFactor = settings_.procSamplingFactor;
-    prepared_ = prep::prepareMosaic(input_, preparation);
+    if (!preparedWhileLoading_)
+        prepared_ = prep::prepareMosaic(input_, preparation());
     timerLine(timer_, "Median filter and down sampling time: ", out());
 
     // The prepared image keeps the input's capture data, so it is stored in
@@ -423,7 +471,10 @@ void Pipeline::lookForSetUpMistakes() {
     if (!doubt.empty())
         warn(doubt);
 
-    const prep::PedestalEvidence pedestal = prep::pedestalFromNoise(input_, fullScale_);
+    // The rows of a capture loaded whole have not passed the sampler yet.
+    if (!noise_.started() && input_.hasSamples())
+        feedRows(input_, noise_);
+    const prep::PedestalEvidence pedestal = noise_.evidence();
     const double tolerance = std::max(2.0, prep::kPedestalTolerance * fullScale_);
     if (pedestal.measured && pedestal.lowerBound > blackLevel + tolerance)
         warn("The noise of the capture shows a black level of at least " +
@@ -443,8 +494,7 @@ void Pipeline::writePreparedImage() {
     out() << "Preprocessed image file: " << settings_.preproc << std::endl;
     prepared_.storeKqraw(settings_.preproc);
     noteOutput("preproc", settings_.preproc);
-    const bool unfiltered = !settings_.medianFilter || settings_.medianFilterSize == 1;
-    if (settings_.debug && unfiltered && settings_.procSamplingFactor == 1) {
+    if (identityTest()) {
         out() << "Performing identity test." << std::endl;
         BayerImage stored;
         stored.read(settings_.preproc);
@@ -521,10 +571,8 @@ void Pipeline::recordFitError() {
     report_.maxErrorBound = context_.maxError;
     report_.maxGain = context_.maxGain;
     report_.haveFitError = context_.fitDeviationMeasured;
-    std::copy(context_.fitDeviationMax, context_.fitDeviationMax + kChannels,
-              report_.deviationMax);
-    std::copy(context_.fitDeviationRms, context_.fitDeviationRms + kChannels,
-              report_.deviationRms);
+    std::copy(context_.fitDeviationMax, context_.fitDeviationMax + kChannels, report_.deviationMax);
+    std::copy(context_.fitDeviationRms, context_.fitDeviationRms + kChannels, report_.deviationRms);
 }
 
 void Pipeline::writeRegisterFile() {
@@ -614,8 +662,8 @@ void Pipeline::measureColourError() {
     if (settings_.avgLuma == 1 || settings_.noDelta || settings_.xtest)
         return;
     out() << "Calculating deltaAB." << std::endl;
-    out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x "
-          << context_.deltaAbBlocks[1] << std::endl;
+    out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x " << context_.deltaAbBlocks[1]
+          << std::endl;
     prep::evaluateDeltaAb(context_);
     report_.haveDelta = true;
     report_.deltaColumns = context_.deltaAbBlocks[0];

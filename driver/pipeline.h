@@ -3,6 +3,14 @@
 // in a fixed order. Anything that ends the run early is thrown and reported
 // by the caller (driver/run.h).
 
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <boost/date_time/posix_time/ptime.hpp>
+
 #include "config/config_node.h"
 #include "driver/command_line.h"
 #include "driver/run_report.h"
@@ -10,14 +18,9 @@
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
 #include "lsc/processing_context.h"
-
-#include <boost/date_time/posix_time/ptime.hpp>
-
-#include <cstdint>
-#include <functional>
-#include <memory>
-#include <string>
-#include <vector>
+#include "prep/capture_evidence.h"
+#include "prep/image_checks.h"
+#include "prep/mosaic_preparation.h"
 
 class Pipeline {
 public:
@@ -34,6 +37,9 @@ private:
     void readConfiguration();
     void openMessages();
     void loadInput();
+    bool needsInputImage() const;
+    bool identityTest() const;
+    prep::MosaicPreparation preparation() const;
     void decideBitDepth();
     void checkSettingsAgainstImage();
     void inspectInput();
@@ -74,10 +80,14 @@ private:
     std::shared_ptr<config_node_impl> root_;
     config_node_impl* config_ = nullptr;
 
-    int depth_ = 0;             // bit depth of the run
-    std::uint32_t fullScale_ = 0;  // 2^depth - 1
+    int depth_ = 0;               // bit depth of the run
+    std::uint32_t fullScale_ = 0; // 2^depth - 1
     BayerImage input_;
     BayerImage prepared_;
+    // The capture went through the preparation as it was read: input_ holds
+    // its header and capture data only.
+    bool preparedWhileLoading_ = false;
+    prep::SampleStatistics inputStatistics_; // of such a capture, in debug mode
     ProcessingContext context_;
     // The register file as this run wrote it; the binary data are built from it.
     std::string registerText_;
@@ -85,6 +95,8 @@ private:
     // The calibration report (--report): filled as the stages go.
     std::vector<std::string> frames_;  // --input, in order
     std::string checkPath_;            // --check
+    // The capture's rows pass it as they are read (or after a whole load).
+    prep::NoiseSampler noise_;
     std::string reportPath_;
     std::string resultPath_;  // --json
     RunReport report_;

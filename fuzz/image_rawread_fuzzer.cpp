@@ -1,5 +1,7 @@
 // The generic raw reader. An input whose first byte is odd also answers the
-// console questions: bytes 1-28 give the layout, the rest is the file.
+// console questions: bytes 1-28 give the layout, the rest is the file. Any
+// other input also goes through the header-only read and the later read of
+// the samples it left.
 
 #include <cstdint>
 #include <cstring>
@@ -8,6 +10,7 @@
 #include "image/image_buffer.h"
 #include "image/raw_prompt.h"
 #include "image/raw_reader.h"
+#include "image/raw_samples.h"
 
 namespace {
 
@@ -40,5 +43,11 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         return 0;
     }
     imageRelease(img::rawReadMemory(data, size, "fuzz", &rc));
+    img::MemorySource source(data, size, "fuzz");
+    ImageBuffer* header = nullptr;
+    std::uint64_t samplesAt = 0;
+    if (img::rawReadHeaderOnly(source, &header, &samplesAt) == 0 && header)
+        img::readDeferredSamples(source, samplesAt, header);
+    imageRelease(header);
     return 0;
 }

@@ -3,6 +3,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
+#include <sys/stat.h>
 #include <cstring>
 #include <memory>
 #include <stdexcept>
@@ -38,6 +39,9 @@ std::string readFailureReason(const std::string& path, int rc) {
         return systemReason(path, error);
     if (first == EOF)
         return path + ": the file is empty";
+    struct stat info;
+    if (stat(path.c_str(), &info) == 0 && !S_ISREG(info.st_mode))
+        return path + ": a device or pipe that gives no KQRAW2 or KQRAW raw image";
     switch (rc) {
     case img::kIoError:
         return path + ": a read error, or the file is shorter than its layout declares";
@@ -57,10 +61,6 @@ std::string readFailureReason(const std::string& path, int rc) {
     }
 }
 
-[[noreturn]] void failToRead(const std::string& path, int rc) {
-    throw DetailedError<std::runtime_error>(readFailureReason(path, rc),
-                                            img::msg::kCannotReadKqraw);
-}
 
 // Copy metadata with the object's messages for each failure.
 void copyMetadataOrThrow(ImageBuffer* target, const ImageBuffer* source) {
@@ -120,15 +120,28 @@ KqRawFixedHeader* headerlessFixedHeader(float exposureTime, float gain, const st
 
 } // namespace
 
+void throwCannotReadCapture(const std::string& path, int result) {
+    if (result == img::kImageTooLarge)
+        fail(img::msg::kImageTooLarge);
+    throw DetailedError<std::runtime_error>(readFailureReason(path, result),
+                                            img::msg::kCannotReadKqraw);
+}
+
 void BayerImage::read(const std::string& path) {
     buffer_.reset();
     int rc = img::kOk;
     ImagePtr raw(rawRead(path.c_str(), &rc));
-    if (!raw) {
-        if (rc == img::kImageTooLarge)
-            fail(img::msg::kImageTooLarge);
-        failToRead(path, rc);
-    }
+    if (!raw)
+        throwCannotReadCapture(path, rc);
+    adoptRaw(std::move(raw), rc);
+}
+
+void BayerImage::adoptRaw(ImagePtr raw, int readResult) {
+    buffer_.reset();
+    if (!raw)
+        fail(readResult == img::kImageTooLarge ? img::msg::kImageTooLarge
+                                               : img::msg::kCannotReadKqraw);
+    int rc = img::kOk;
     // The image takes over the raw samples' block, widened to floats where
     // the reader left room for them: loading then never holds the raw samples
     // and a float copy at once.
@@ -142,27 +155,42 @@ void BayerImage::read(const std::string& path) {
     if (widened == img::kNoMemory)
         fail(img::msg::kCannotAllocateImage);
     if (widened != img::kOk)
-        failToRead(path, widened);
+        fail(img::msg::kCannotReadKqraw);
     image->data = raw->data;
     image->dataType = kDataReal32;
     raw->data = nullptr;
     buffer_ = std::move(image);
 }
 
+void BayerImage::adoptHeader(const ImageBuffer& raw) {
+    buffer_.reset();
+    int rc = img::kOk;
+    ImagePtr image(imageCreate(raw.width, raw.height, raw.bitsPerSample, raw.samplesPerPixel,
+                               raw.numberOfImages, raw.cfa[0], raw.cfa[1], raw.pixelType,
+                               raw.bufferType, kDataNone, &rc));
+    if (!image)
+        fail(img::msg::kCannotAllocateImage);
+    copyMetadataOrThrow(image.get(), &raw);
+    image->dataType = kDataReal32;
+    buffer_ = std::move(image);
+}
+
 void BayerImage::createFromHeaderless(std::int32_t width, std::int32_t height, std::uint16_t bits,
                                       std::uint32_t cfa, float exposureTime, float gain,
                                       const std::string& serialNumber,
-                                      const std::string& sensorGuid, bool fixedHeader) {
+                                      const std::string& sensorGuid, bool fixedHeader,
+                                      bool withSamples) {
     buffer_.reset();
     if (width >= 0 && height >= 0 &&
         img::checkSampleMemory(static_cast<std::uint64_t>(width),
                                static_cast<std::uint64_t>(height)) != img::kOk)
         fail(img::msg::kImageTooLarge);
     int rc = img::kOk;
-    ImagePtr image(
-        imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
+    ImagePtr image(imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa,
+                               withSamples ? kDataReal32 : kDataNone, &rc));
     if (!image)
         fail(img::msg::kCannotAllocateImage);
+    image->dataType = kDataReal32;
     if (fixedHeader) {
         image->rawHeader = headerlessFixedHeader(exposureTime, gain, serialNumber, sensorGuid);
         image->fileType = kFileKqRaw;

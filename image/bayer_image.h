@@ -7,6 +7,12 @@
 #include <string>
 
 #include "image/image_buffer.h"
+#include "image/image_result.h"
+
+// Throws "Cannot read kqraw image." (or the image-too-large message for that
+// result) with a detail line naming `path` and the reason: the system's when
+// the file does not open or read, else what the raw reader's `result` says.
+[[noreturn]] void throwCannotReadCapture(const std::string& path, int result);
 
 class BayerImage {
 public:
@@ -19,13 +25,22 @@ public:
     // (s & (2^bits - 1)) / (2^bits - 1) in one pass. On failure the object
     // holds no image.
     void read(const std::string& path);
+    // The same for an image that a raw reader made (UINT8 or UINT16 samples,
+    // read(path) ends here). Null: "Cannot read kqraw image.".
+    void adoptRaw(ImagePtr raw, int readResult = img::kOk);
+    // Only the dimensions, depth, pattern, levels and metadata of a raw
+    // reader's image: a capture whose samples went elsewhere (a preparation
+    // that reads them as a stream). The object then holds no samples.
+    void adoptHeader(const ImageBuffer& raw);
+    bool hasSamples() const { return buffer_ && buffer_->data; }
 
     // A new sensor image for headerless raw data; the capture data go into a
-    // KQRAW fixed header (fixedHeader) or a KQRAW2 container.
+    // KQRAW fixed header (fixedHeader) or a KQRAW2 container. Without
+    // `withSamples` it holds none (the samples go to a stream).
     void createFromHeaderless(std::int32_t width, std::int32_t height, std::uint16_t bits,
                               std::uint32_t cfa, float exposureTime, float gain,
                               const std::string& serialNumber, const std::string& sensorGuid,
-                              bool fixedHeader);
+                              bool fixedHeader, bool withSamples = true);
 
     // A new image with the template's bitsPerSample, numberOfImages and data
     // type and the given geometry; metadata copied from the template.

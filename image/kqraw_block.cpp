@@ -301,7 +301,7 @@ KqRawForm formOfTag(const std::uint8_t* tag) {
     return KqRawForm::kOpaque;
 }
 
-int readPixels(img::ByteSource& source, KqRawBlock* block) {
+int readPixels(img::ByteSource& source, KqRawBlock* block, std::uint64_t* samplesAt) {
     if (block->size < kKqRawPixelLeadSize || (block->size - kKqRawPixelLeadSize) % 2 != 0)
         return img::kWrongFormat;
     if (!source.read(block->lead, kKqRawPixelLeadSize))
@@ -310,6 +310,11 @@ int readPixels(img::ByteSource& source, KqRawBlock* block) {
     const int fits = img::checkSampleMemory(block->sampleCount, 1);
     if (fits != img::kOk)
         return fits;
+    if (samplesAt) {
+        // Left where they are, to be read as a stream.
+        *samplesAt = source.position();
+        return source.seek(source.position() + 2 * block->sampleCount) ? img::kOk : img::kIoError;
+    }
     // With room for floats: the samples usually become the input image.
     block->samples = static_cast<std::uint16_t*>(
         img::allocateWidenableSamples(block->sampleCount, sizeof(std::uint16_t)));
@@ -321,7 +326,7 @@ int readPixels(img::ByteSource& source, KqRawBlock* block) {
 
 } // namespace
 
-int kqrawBlockRead(img::ByteSource& source, KqRawBlock** out) noexcept {
+int kqrawBlockRead(img::ByteSource& source, KqRawBlock** out, std::uint64_t* samplesAt) noexcept {
     *out = nullptr;
     std::uint8_t head[kKqRawBlockHeaderSize];
     if (source.remaining() < kKqRawBlockHeaderSize)
@@ -342,7 +347,7 @@ int kqrawBlockRead(img::ByteSource& source, KqRawBlock** out) noexcept {
     std::memcpy(block->reserved, reserved, sizeof block->reserved);
     block->size = size;
     if (block->form == KqRawForm::kPixels) {
-        const int rc = readPixels(source, block.get());
+        const int rc = readPixels(source, block.get(), samplesAt);
         if (rc != img::kOk)
             return rc;
         *out = block.release();

@@ -97,8 +97,11 @@ void kqrawHeaderStamp(KqRawBlock* header) noexcept;
 // the block header or payload runs past the end of the data; -4 for a pixel
 // block whose payload is not the two words and whole 16-bit samples; -3 no
 // memory; -2 read error. String blocks whose lengths do not fit the payload
-// are kept opaque, with a warning that names the source.
-int kqrawBlockRead(img::ByteSource& source, KqRawBlock** block) noexcept;
+// are kept opaque, with a warning that names the source. With `samplesAt`, a
+// pixel block's samples are not read: their position is stored there and the
+// block holds none.
+int kqrawBlockRead(img::ByteSource& source, KqRawBlock** block,
+                   std::uint64_t* samplesAt = nullptr) noexcept;
 
 // Writes the block; false when a write fails.
 bool kqrawBlockWrite(const KqRawBlock* block, std::FILE* file) noexcept;

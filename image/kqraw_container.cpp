@@ -149,11 +149,16 @@ int keepBlock(KqRawContainer* container, KqRawBlock* block, const char* sourceNa
 
 } // namespace
 
-KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result) noexcept {
+KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result,
+                                    std::uint64_t* samplesAt) noexcept {
     int ignored;
     if (!result)
         result = &ignored;
     if (looksLikeFixedHeader(source)) {
+        if (samplesAt) {
+            *result = img::kWrongFormat;
+            return nullptr;
+        }
         KqRawContainer* converted = nullptr;
         *result = kqrawFixedToContainer(source, &converted);
         return converted;
@@ -170,11 +175,15 @@ KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result) noexce
     // A few bytes too few for another block header end the list, as the end of the file does.
     while (source.remaining() >= kKqRawBlockHeaderSize) {
         KqRawBlock* block = nullptr;
-        int rc = kqrawBlockRead(source, &block);
+        std::uint64_t blockSamplesAt = 0;
+        int rc = kqrawBlockRead(source, &block, samplesAt ? &blockSamplesAt : nullptr);
         if (rc == img::kOk) {
+            const bool pixels = block->form == KqRawForm::kPixels;
             rc = keepBlock(container.get(), block, source.name());
             if (rc != img::kOk)
                 kqrawBlockRelease(block);
+            else if (pixels && samplesAt)
+                *samplesAt = blockSamplesAt;
         }
         if (rc != img::kOk) {
             // Blocks cut short or malformed: the file is a container, but a broken one.

@@ -44,8 +44,11 @@ int kqrawContainerCopyBlocks(KqRawContainer* target, const KqRawContainer* sourc
 
 // Parses a container, or converts a fixed-header KQRAW file into one, from
 // the source's start. Result: 0; -4 not a container; -21 a container (or
-// fixed-header file) whose blocks are cut short or malformed; -3; -2.
-KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result) noexcept;
+// fixed-header file) whose blocks are cut short or malformed; -3; -2. With
+// `samplesAt`, only a container is accepted (-4 for a fixed-header file) and
+// its pixel block's samples are left unread, their position stored there.
+KqRawContainer* kqrawContainerParse(img::ByteSource& source, int* result,
+                                    std::uint64_t* samplesAt = nullptr) noexcept;
 // Reads a container file; null on any failure.
 KqRawContainer* kqrawContainerRead(const char* path) noexcept;
 

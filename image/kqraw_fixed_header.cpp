@@ -61,7 +61,7 @@ void kqrawFixedSetFloat(KqRawFixedHeader* header, std::uint32_t offset, float va
     img::storeLEFloat(header->bytes + offset, value);
 }
 
-int kqrawFixedRead(img::ByteSource& source, ImageBuffer** out) noexcept {
+int kqrawFixedRead(img::ByteSource& source, ImageBuffer** out, std::uint64_t* samplesAt) noexcept {
     *out = nullptr;
     HeaderPtr header;
     int rc = readHeader(source, &header);
@@ -79,7 +79,7 @@ int kqrawFixedRead(img::ByteSource& source, ImageBuffer** out) noexcept {
     ImageBuffer* image = nullptr;
     rc = img::readRawImage(source, kKqRawFixedHeaderSize, width, height,
                            img::cfaOfBayerCode(kqrawFixedGet32(header.get(), kqfix::kBayerCode)),
-                           &image);
+                           &image, samplesAt);
     if (rc != img::kOk)
         return rc;
     image->fileType = kFileKqRaw;

@@ -42,8 +42,9 @@ void kqrawFixedSetFloat(KqRawFixedHeader* header, std::uint32_t offset, float va
 // the pixels is read with a warning. Result: 0 and a RAW, RAW_CFA, UINT16
 // image of file type KQRAW that carries the header; -4 not such a file; -5
 // too short for its pixels, or a width or height of 0 or beyond 2^31 - 1;
-// -3; -2.
-int kqrawFixedRead(img::ByteSource& source, ImageBuffer** image) noexcept;
+// -3; -2. With `samplesAt`, the samples are left unread (see readRawImage).
+int kqrawFixedRead(img::ByteSource& source, ImageBuffer** image,
+                   std::uint64_t* samplesAt = nullptr) noexcept;
 
 // Converts a fixed-header file into a container: header block, pixel block
 // (the pixels start behind the first end marker found from +108 on) and a

@@ -18,7 +18,7 @@ namespace {
 // The image of a container: the pixel block hands its samples over rather
 // than copying them (the raw writer always builds a new pixel block from the
 // image), and the container stays with the image as its raw header.
-int imageOfContainer(KqRawContainerPtr container, ImageBuffer** out) {
+int imageOfContainer(KqRawContainerPtr container, ImageBuffer** out, bool samplesDeferred) {
     if (container->headerIndex < 0 || container->pixelIndex < 0)
         return kRawBadContainer;
     const KqRawBlock* header = container->blocks[container->headerIndex];
@@ -42,23 +42,20 @@ int imageOfContainer(KqRawContainerPtr container, ImageBuffer** out) {
     pixels->samples = nullptr;
     pixels->sampleCount = 0;
     pixels->size = kKqRawPixelLeadSize;
-    applyLargestSampleDepth(image.get());
+    if (!samplesDeferred)
+        applyLargestSampleDepth(image.get());
     image->fileType = kFileKqRaw2;
     image->rawHeader = container.release();
     *out = image.release();
     return kOk;
 }
 
-int readContainer(ByteSource& source, ImageBuffer** out) {
+int readContainer(ByteSource& source, ImageBuffer** out, std::uint64_t* samplesAt = nullptr) {
     int rc = kOk;
-    KqRawContainerPtr container(kqrawContainerParse(source, &rc));
+    KqRawContainerPtr container(kqrawContainerParse(source, &rc, samplesAt));
     if (!container)
         return rc;
-    return imageOfContainer(std::move(container), out);
-}
-
-int askOnConsole(void*, RawLayout* layout) {
-    return askRawLayout(stdin, stdout, stderr, layout);
+    return imageOfContainer(std::move(container), out, samplesAt != nullptr);
 }
 
 // Bytes a pixel of the layout takes: 1 or 2 (one sample), 3 or 6 (three).
@@ -110,6 +107,20 @@ int readWithLayout(ByteSource& source, const RawLayout& layout, ImageBuffer** ou
     image->fileType = kFileFixRaw;
     *out = image.release();
     return kOk;
+}
+
+int askOnConsole(void*, RawLayout* layout) {
+    return askRawLayout(stdin, stdout, stderr, layout);
+}
+
+int rawReadHeaderOnly(ByteSource& source, ImageBuffer** out, std::uint64_t* samplesAt) noexcept {
+    *out = nullptr;
+    int rc = kqrawFixedRead(source, out, samplesAt);
+    if (rc != kWrongFormat)
+        return rc == kSizeMismatch ? kRawBadContainer : rc;
+    if (!source.seek(0))
+        return kIoError;
+    return readContainer(source, out, samplesAt);
 }
 
 ImageBuffer* rawReadSource(ByteSource& source, RawLayoutQuery query, void* context,

@@ -28,6 +28,15 @@ using RawLayoutQuery = int (*)(void* context, RawLayout* layout);
 [[nodiscard]] ImageBuffer* rawReadSource(ByteSource& source, RawLayoutQuery query, void* context,
                                          int* result) noexcept;
 
+// The header of a KQRAW fixed-header file or KQRAW2 container without its
+// samples: a RAW, RAW_CFA, UINT16 image with no sample block yet, whose depth
+// is set once the samples have been read (they lie at *samplesAt, little-
+// endian, width x height of them). Results as rawReadSource; -4 for every
+// other format, which the full reader then takes.
+int rawReadHeaderOnly(ByteSource& source, ImageBuffer** image, std::uint64_t* samplesAt) noexcept;
+// The console prompt for files of no known type (the query of rawRead).
+int askOnConsole(void* context, RawLayout* layout);
+
 // The reader on bytes in memory, without the console (for tests and fuzzing).
 [[nodiscard]] ImageBuffer* rawReadMemory(const std::uint8_t* data, std::size_t size,
                                          const char* name, int* result) noexcept;

@@ -57,8 +57,12 @@ std::uint16_t bitsForLargestSample(std::uint16_t largest) noexcept {
 }
 
 void applyLargestSampleDepth(ImageBuffer* image) noexcept {
-    const std::uint16_t bits = bitsForLargestSample(largestSample(
-        static_cast<const std::uint16_t*>(image->data), imageTotalSamples(image, -1)));
+    applySampleDepth(
+        image, bitsForLargestSample(largestSample(static_cast<const std::uint16_t*>(image->data),
+                                                  imageTotalSamples(image, -1))));
+}
+
+void applySampleDepth(ImageBuffer* image, std::uint16_t bits) noexcept {
     image->bitsPerSample = bits;
     const float white = static_cast<float>(1u << bits);
     for (int channel = 0; channel < 4; ++channel) {
@@ -80,7 +84,8 @@ bool samplesFit(std::uint64_t size, std::uint64_t offset, std::uint32_t width,
 }
 
 int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
-                 std::uint32_t height, std::uint32_t cfa, ImageBuffer** out) noexcept {
+                 std::uint32_t height, std::uint32_t cfa, ImageBuffer** out,
+                 std::uint64_t* samplesAt) noexcept {
     *out = nullptr;
     if (width == 0 || height == 0 || width > INT32_MAX || height > INT32_MAX ||
         !samplesFit(source.size(), offset, width, height))
@@ -92,16 +97,29 @@ int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
                                16, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataNone, &rc));
     if (!image)
         return rc == kBadArgument ? kSizeMismatch : rc;
+    image->dataType = kDataUint16;
+    if (samplesAt) {
+        *samplesAt = offset;
+        *out = image.release();
+        return kOk;
+    }
+    rc = readDeferredSamples(source, offset, image.get());
+    if (rc != kOk)
+        return rc;
+    *out = image.release();
+    return kOk;
+}
+
+int readDeferredSamples(ByteSource& source, std::uint64_t samplesAt, ImageBuffer* image) noexcept {
+    const std::uint64_t count = imageTotalSamples(image, -1);
     // With room for floats: the samples usually become the input image.
-    image->data = allocateWidenableSamples(std::uint64_t{width} * height, sizeof(std::uint16_t));
+    image->data = allocateWidenableSamples(count, sizeof(std::uint16_t));
     if (!image->data)
         return kNoMemory;
-    image->dataType = kDataUint16;
-    if (!source.seek(offset) || !readSamplesLE(source, static_cast<std::uint16_t*>(image->data),
-                                               std::uint64_t{width} * height))
+    if (!source.seek(samplesAt) ||
+        !readSamplesLE(source, static_cast<std::uint16_t*>(image->data), count))
         return kIoError;
-    applyLargestSampleDepth(image.get());
-    *out = image.release();
+    applyLargestSampleDepth(image);
     return kOk;
 }
 

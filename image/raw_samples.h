@@ -25,6 +25,8 @@ std::uint16_t bitsForLargestSample(std::uint16_t largest) noexcept;
 // Sets bitsPerSample from the largest sample of a UINT16 image, whiteVal and
 // maxClip of all four channels to 2^bits, blackVal and minClip to 0.
 void applyLargestSampleDepth(ImageBuffer* image) noexcept;
+// The same for a depth already known.
+void applySampleDepth(ImageBuffer* image, std::uint16_t bits) noexcept;
 
 } // namespace img
 
@@ -34,9 +36,15 @@ namespace img {
 // one image) and fills it with the samples at `offset` of the source; the bit
 // depth comes from the largest sample. Result: 0; -5 when a dimension is 0 or
 // beyond 32-bit signed range, or the samples run past the end of the data;
-// -3; -2.
+// -3; -2. With `samplesAt`, the samples are left unread (the image has no
+// sample block yet) and their position is stored there.
 int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
-                 std::uint32_t height, std::uint32_t cfa, ImageBuffer** image) noexcept;
+                 std::uint32_t height, std::uint32_t cfa, ImageBuffer** image,
+                 std::uint64_t* samplesAt = nullptr) noexcept;
+
+// Reads the samples that a header-only read left at `samplesAt` into a new
+// block of the UINT16 image, and takes the depth from the largest. 0, -3, -2.
+int readDeferredSamples(ByteSource& source, std::uint64_t samplesAt, ImageBuffer* image) noexcept;
 
 // True when width x height 16-bit samples fit between `offset` and the end of
 // a source of `size` bytes, computed in 64 bits.

@@ -1,10 +1,16 @@
 #include "lsc/lens_shading_fit.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cmath>
 #include <cstdint>
+#include <exception>
 #include <ostream>
+#include <sstream>
 #include <stdexcept>
+#include <string>
+#include <system_error>
+#include <thread>
 #include <vector>
 
 #include "lsc/bernstein_surface.h"
@@ -55,6 +61,36 @@ bernsteinSurface targetSurface(std::uint32_t width, std::uint32_t height, float 
         messages << std::endl;
     }
     return surface;
+}
+
+// One channel's fit, made apart from the others.
+struct ChannelFit {
+    float grid[kGridPoints] = {};
+    std::string messages;
+    std::exception_ptr error;
+};
+
+// Runs fitChannel(k) for the four channels on up to as many threads as the
+// processor has cores (two here): the fit of one channel is a fixed cost of
+// every run, independent of the image size.
+template <typename Fit> void forEachChannel(const Fit& fitChannel) {
+    std::atomic<int> next{0};
+    auto work = [&] {
+        for (int k = next++; k < kChannels; k = next++)
+            fitChannel(k);
+    };
+    const unsigned cores = std::thread::hardware_concurrency();
+    const unsigned helpers = std::min<unsigned>(cores > 1 ? cores - 1 : 0, kChannels - 1);
+    std::vector<std::thread> threads;
+    try {
+        for (unsigned i = 0; i < helpers; ++i)
+            threads.emplace_back(work);
+    } catch (const std::system_error&) {
+        // No thread to be had: the channels left are fitted here.
+    }
+    work();
+    for (std::thread& thread : threads)
+        thread.join();
 }
 
 [[noreturn]] void refuseGain() {
@@ -137,18 +173,40 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
 
     const std::vector<double> xBreaks(breaks.x, breaks.x + 4);
     const std::vector<double> yBreaks(breaks.y, breaks.y + 4);
+    // The four channels are fitted side by side (they share nothing but the
+    // samples, read-only); what each has to say is kept and told in channel
+    // order, so the messages and the first failure are those of one channel
+    // after the other.
+    ChannelFit fits[kChannels];
+    forEachChannel([&](int k) {
+        if (trial && k != context.trialChannel)
+            return;
+        ChannelFit& fit = fits[k];
+        std::ostringstream text;
+        text.copyfmt(messages);
+        try {
+            patchSurface surface(3, 3, xBreaks, yBreaks);
+            for (const shadingSample& s : context.samples)
+                if (s.x < w && s.y < h)
+                    surface.addValueConstraint(s.x, s.y, s.value[k]);
+            surface.fit(kPatchTolerance, text);
+            surface.copyToGrid(fit.grid);
+        } catch (...) {
+            fit.error = std::current_exception();
+        }
+        fit.messages = text.str();
+    });
     float grids[kChannels][kGridPoints];
     for (int k = 0; k < kChannels; ++k) {
         if (trial && k != context.trialChannel)
             continue;
+        const ChannelFit& fit = fits[k];
         if (!context.quiet)
             messages << lsc::msg::kFittingSurface << kChannelNames[k] << std::endl;
-        patchSurface surface(3, 3, xBreaks, yBreaks);
-        for (const shadingSample& s : context.samples)
-            if (s.x < w && s.y < h)
-                surface.addValueConstraint(s.x, s.y, s.value[k]);
-        surface.fit(kPatchTolerance, messages);
-        surface.copyToGrid(grids[k]);
+        messages << fit.messages;
+        if (fit.error)
+            std::rethrow_exception(fit.error);
+        std::copy(fit.grid, fit.grid + kGridPoints, grids[k]);
         context.fitDeviationMax[k] = static_cast<float>(deviations[k].max);
         context.fitDeviationRms[k] = static_cast<float>(deviations[k].rms);
         if (context.logFitError && !context.quiet)

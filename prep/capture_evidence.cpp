@@ -40,27 +40,27 @@ std::string ratioText(double ratio) {
 // over two pixels). The largest tenth of the differences is left out, so a
 // defect does not count; that scales every block's figure alike, which
 // moves neither the line's zero nor its significance.
-bool blockNoise(const float* samples, std::int32_t width, std::int32_t x0, std::int32_t y0,
-                double scale, double& mean, double& variance, std::array<double, 64>& work) {
+void blockNoise(const std::uint16_t* strip, std::size_t stride, std::int32_t x0, int y0,
+                double& mean, double& variance, std::array<double, 64>& work) {
     double sum = 0.0;
-    std::size_t count = 0;
-    for (int row = 0; row < kBlockSide; row += 2) {
-        const float* line = samples + static_cast<std::size_t>(y0 + row) * width + x0;
+    std::size_t count = 0, pixels = 0;
+    for (int row = y0; row < kBlockSide; row += 2) {
+        const std::uint16_t* line = strip + static_cast<std::size_t>(row) * stride + x0;
         for (int column = 0; column < kBlockSide; column += 2) {
             sum += line[column];
+            ++pixels;
             if (column + 2 < kBlockSide)
-                work[count++] = std::fabs(static_cast<double>(line[column + 2]) - line[column]);
+                work[count++] = std::abs(static_cast<double>(line[column + 2]) - line[column]);
         }
     }
-    mean = sum / 64.0 * scale;
+    mean = sum / static_cast<double>(pixels);
     const std::size_t kept = count - count / 10;
     std::nth_element(work.begin(), work.begin() + static_cast<long>(kept) - 1,
                      work.begin() + static_cast<long>(count));
     double squares = 0.0;
     for (std::size_t i = 0; i < kept; ++i)
         squares += work[i] * work[i];
-    variance = squares / static_cast<double>(kept) / 2.0 * scale * scale;
-    return std::isfinite(mean) && std::isfinite(variance);
+    variance = squares / static_cast<double>(kept) / 2.0;
 }
 
 } // namespace
@@ -111,40 +111,62 @@ std::string bayerOrderDoubt(const CentreLevels& levels, const std::string& order
     return std::string();
 }
 
-PedestalEvidence pedestalFromNoise(const BayerImage& capture, std::uint32_t fullScale) {
-    requireFloatImage(capture);
-    PedestalEvidence evidence;
-    const std::int32_t width = capture.width();
-    const std::int32_t height = capture.height();
-    if (capture.channels() != 1 || width < kBlockSide || height < kBlockSide)
-        return evidence;
-    const double scale = fullScale;
-    const int blocksX = width / kBlockSide;
-    const int blocksY = height / kBlockSide;
-    const int stepX = std::max(1, (blocksX + kMaxBlocksPerAxis - 1) / kMaxBlocksPerAxis);
-    const int stepY = std::max(1, (blocksY + kMaxBlocksPerAxis - 1) / kMaxBlocksPerAxis);
+void NoiseSampler::start(std::int32_t width, std::int32_t height) {
+    width_ = std::max(width, 0);
+    height_ = std::max(height, 0);
+    row_ = 0;
+    points_.clear();
+    const int blocksX = std::max(1, width / kBlockSide);
+    const int blocksY = std::max(1, height / kBlockSide);
+    stepX_ = std::max(1, (blocksX + kMaxBlocksPerAxis - 1) / kMaxBlocksPerAxis);
+    stepY_ = std::max(1, (blocksY + kMaxBlocksPerAxis - 1) / kMaxBlocksPerAxis);
+    strip_.resize(static_cast<std::size_t>(std::max(width, 0)) * kBlockSide);
+}
 
-    // Least-squares line variance = slope x mean + intercept, one point per
-    // block and channel (all four share the pixels' conversion gain).
-    std::vector<std::pair<double, double>> points;
+void NoiseSampler::addRow(const std::uint16_t* samples) {
+    if (width_ <= 0)
+        return;
+    const std::int32_t blockRow = row_ / kBlockSide;
+    const int inBlock = row_ % kBlockSide;
+    ++row_;
+    // Only the rows of the block rows measured are kept; a last partial
+    // block row is left out.
+    if (blockRow % stepY_ != 0 || (blockRow + 1) * kBlockSide > height_)
+        return;
+    std::copy(samples, samples + width_,
+              strip_.begin() + static_cast<std::ptrdiff_t>(inBlock) * width_);
+    if (inBlock == kBlockSide - 1)
+        measureStrip();
+}
+
+void NoiseSampler::measureStrip() {
     std::array<double, 64> work{};
-    const float* samples = capture.pixels();
-    for (int by = 0; by < blocksY; by += stepY)
-        for (int bx = 0; bx < blocksX; bx += stepX)
-            for (int channel = 0; channel < 4; ++channel) {
-                double mean = 0.0, variance = 0.0;
-                const std::int32_t x0 = bx * kBlockSide + (channel & 1);
-                const std::int32_t y0 = by * kBlockSide + (channel >> 1);
-                // The last row or column of the block may stand one pixel out.
-                if (x0 + kBlockSide - 1 > width || y0 + kBlockSide - 1 > height)
-                    continue;
-                if (!blockNoise(samples, width, x0, y0, scale, mean, variance, work))
-                    continue;
-                // Clipped or black blocks tell nothing about the noise.
-                if (mean > 0.9 * scale || mean < 0.02 * scale)
-                    continue;
-                points.emplace_back(mean, variance);
-            }
+    const std::size_t stride = static_cast<std::size_t>(width_);
+    for (std::int32_t bx = 0; (bx + 1) * kBlockSide <= width_; bx += stepX_)
+        for (int channel = 0; channel < 4; ++channel) {
+            // The channel's pixels start at its offset in the 2 x 2 cell; the
+            // block's last column pair is then one to the right, still inside
+            // the strip unless the block is the last of the row.
+            const std::int32_t x0 = bx * kBlockSide + (channel & 1);
+            if (x0 + kBlockSide - 2 >= width_)
+                continue;
+            double mean = 0.0, variance = 0.0;
+            blockNoise(strip_.data(), stride, x0, channel >> 1, mean, variance, work);
+            points_.emplace_back(mean, variance);
+        }
+}
+
+PedestalEvidence NoiseSampler::evidence() const {
+    PedestalEvidence evidence;
+    // Clipped or black blocks tell nothing about the noise: the brightest
+    // block sets the scale (full scale is not known from the rows alone).
+    double brightest = 0.0;
+    for (const auto& point : points_)
+        brightest = std::max(brightest, point.first);
+    std::vector<std::pair<double, double>> points;
+    for (const auto& point : points_)
+        if (point.first > 0.05 * brightest && point.first < 0.98 * brightest + 1e-9)
+            points.push_back(point);
     evidence.blocks = static_cast<int>(points.size());
     if (points.size() < kMinBlocks)
         return evidence;

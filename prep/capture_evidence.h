@@ -5,9 +5,12 @@
 // samples that proc.black_level does not take out.
 
 #include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
 
 #include <cstdint>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace prep {
 
@@ -42,9 +45,27 @@ struct PedestalEvidence {
     double standardError = 0.0;
     int blocks = 0;
 };
-// `capture` is the full-resolution mosaic (samples in 0..1 of `fullScale`).
-PedestalEvidence pedestalFromNoise(const BayerImage& capture, std::uint32_t fullScale);
 
+// Gathers the blocks' means and noise from the rows of a full-resolution
+// mosaic as they pass (a strip of 16 rows held at a time), whether the
+// capture is read as a stream or held whole; evidence() then fits the line.
+class NoiseSampler final : public img::MosaicRowSink {
+public:
+    void start(std::int32_t width, std::int32_t height) override;
+    void addRow(const std::uint16_t* samples) override;
+    // Whether any row came (a reader that loads the image whole sends none).
+    bool started() const { return width_ > 0; }
+    PedestalEvidence evidence() const;
+
+private:
+    void measureStrip();
+
+    std::int32_t width_ = 0, height_ = 0;
+    int stepX_ = 1, stepY_ = 1;        // every n-th block along each axis
+    std::int32_t row_ = 0;              // rows received
+    std::vector<std::uint16_t> strip_;  // the rows of the current block row
+    std::vector<std::pair<double, double>> points_;  // (mean, variance) per block and channel
+};
 // Minimum excess of the lower bound over proc.black_level before the run
 // warns: 2 % of full scale.
 inline constexpr double kPedestalTolerance = 0.02;

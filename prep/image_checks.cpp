@@ -1,9 +1,5 @@
 #include "prep/image_checks.h"
 
-#include "prep/prep_image.h"
-#include "prep/prep_messages.h"
-#include "image/error_detail.h"
-
 #include <cmath>
 #include <cstdio>
 #include <iomanip>
@@ -11,6 +7,10 @@
 #include <locale>
 #include <sstream>
 #include <stdexcept>
+
+#include "prep/prep_image.h"
+#include "image/error_detail.h"
+#include "prep/prep_messages.h"
 
 namespace prep {
 namespace {
@@ -88,26 +88,35 @@ std::uint32_t fullScale(int depth) {
     return power - 1u;
 }
 
-void writeStatistics(const BayerImage& image, int depth, std::ostream& out) {
+SampleStatistics sampleStatistics(const BayerImage& image) {
     requireFloatImage(image);
     const float* samples = image.pixels();
-    const std::size_t count = sampleCount(image);
-    float minimum = samples[0];
-    float maximum = samples[0];
-    double sum = 0.0;
-    for (std::size_t i = 0; i < count; ++i) {
+    SampleStatistics statistics;
+    statistics.count = sampleCount(image);
+    statistics.minimum = samples[0];
+    statistics.maximum = samples[0];
+    for (std::size_t i = 0; i < statistics.count; ++i) {
         const float v = samples[i];
-        if (v < minimum)
-            minimum = v;
-        if (v > maximum)
-            maximum = v;
-        sum += v;
+        if (v < statistics.minimum)
+            statistics.minimum = v;
+        if (v > statistics.maximum)
+            statistics.maximum = v;
+        statistics.sum += v;
     }
+    return statistics;
+}
+
+void writeStatistics(const BayerImage& image, int depth, std::ostream& out) {
+    writeStatistics(sampleStatistics(image), depth, out);
+}
+
+void writeStatistics(const SampleStatistics& statistics, int depth, std::ostream& out) {
     const double scale = fullScale(depth);
     out << std::fixed << std::setprecision(0);
-    out << msg::kMinimumPixel << roundHalfUp(minimum * scale) << std::endl;
-    out << msg::kMaximumPixel << roundHalfUp(maximum * scale) << std::endl;
-    out << std::setprecision(2) << msg::kAveragePixel << sum * scale / static_cast<double>(count);
+    out << msg::kMinimumPixel << roundHalfUp(statistics.minimum * scale) << std::endl;
+    out << msg::kMaximumPixel << roundHalfUp(statistics.maximum * scale) << std::endl;
+    out << std::setprecision(2) << msg::kAveragePixel
+        << statistics.sum * scale / static_cast<double>(statistics.count);
 }
 
 OutOfRangePosition scanRange(const BayerImage& image, float low, float high) {
@@ -149,8 +158,8 @@ std::uint32_t sampleUnits(float sample, std::uint32_t fullScale) {
     return static_cast<std::uint32_t>(units);
 }
 
-void checkPixelRange(const BayerImage& image, const PixelLimits& limits,
-                     std::uint32_t fullScale, std::ostream& out) {
+void checkPixelRange(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+                     std::ostream& out) {
     const float scale = static_cast<float>(fullScale);
     const OutOfRangePosition position =
         scanRange(image, limits.minPixel / scale, limits.maxPixel / scale);

@@ -5,10 +5,11 @@
 // for more than one channel the samples of a pixel lie together (plane image
 // layout, prep/bayer_planes.h).
 
-#include "image/bayer_image.h"
-
+#include <cstddef>
 #include <cstdint>
 #include <ostream>
+
+#include "image/bayer_image.h"
 
 namespace prep {
 
@@ -21,6 +22,17 @@ std::uint32_t fullScale(int depth);
 // `out`, the first two ended with std::endl, the last left open for the caller
 // to end. The stream stays in fixed notation with precision 2.
 void writeStatistics(const BayerImage& image, int depth, std::ostream& out);
+
+// The figures behind those lines: extremes and the sum (in double, sample
+// after sample in storage order) of the float samples.
+struct SampleStatistics {
+    float minimum = 0.0f;
+    float maximum = 0.0f;
+    double sum = 0.0;
+    std::size_t count = 0;
+};
+SampleStatistics sampleStatistics(const BayerImage& image);
+void writeStatistics(const SampleStatistics& statistics, int depth, std::ostream& out);
 
 // Position of an out-of-range sample; row -1 when there is none.
 struct OutOfRangePosition {

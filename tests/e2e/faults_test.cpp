@@ -356,7 +356,7 @@ const std::vector<std::string> kKqrawDirectory = {"ERROR: Cannot read kqraw imag
 const std::vector<std::string> kKqrawUnreadable = {"ERROR: Cannot read kqraw image.",
                                                    "  %: Input/output error"};
 const std::vector<std::string> kKqrawEndless = {"ERROR: Cannot read kqraw image.",
-                                                "  %: too large to read (a device that does not end?), or not enough memory"};
+                                                "  %: a device or pipe that gives no KQRAW2 or KQRAW raw image"};
 
 const InputCase kInputs[] = {
     {"config",
