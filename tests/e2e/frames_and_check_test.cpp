@@ -113,6 +113,14 @@ TEST_F(Frames, FourNoisyFramesLowerTheResidual) {
     const double averaged = rms(frames);
     // sqrt(4) = 2 less noise; at least 1.6 here.
     EXPECT_LT(averaged * 1.6, single) << single << " " << averaged;
+
+    // Averaged band by band into the preparation, or whole when the input
+    // image itself is needed (here for --inputasbmp): the same calibration.
+    const std::string streamed = registers(read("cal.txt"));
+    auto args = frameArgs(frames);
+    args.insert(args.end(), {"--inputasbmp", "input.bmp"});
+    ASSERT_EQ(run(args).status, 0);
+    EXPECT_EQ(registers(read("cal.txt")), streamed);
 }
 
 // --- The check image --------------------------------------------------------
