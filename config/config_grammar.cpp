@@ -18,10 +18,10 @@
 #include <boost/variant.hpp>
 
 #include "config/config_file.h"
-#include "image/error_detail.h"
 #include "config/config_limits.h"
 #include "config/config_messages.h"
 #include "config/value_text.h"
+#include "image/error_detail.h"
 
 namespace {
 
@@ -220,8 +220,7 @@ struct FileClose {
 
 } // namespace
 
-void parse_config_text(std::string_view text, config_node& config,
-                       const std::string& sourceName) {
+void parse_config_text(std::string_view text, config_node& config, const std::string& sourceName) {
     const TextPlace place{text.data(), sourceName};
     const ConfigGrammar grammar(config, place);
     Iterator position = text.data();

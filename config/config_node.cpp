@@ -8,9 +8,9 @@
 
 #include <boost/lexical_cast/bad_lexical_cast.hpp>
 
+#include "config/config_limits.h"
 #include "config/config_messages.h"
 #include "config/value_text.h"
-#include "config/config_limits.h"
 #include "image/error_detail.h"
 
 namespace {
@@ -21,8 +21,8 @@ constexpr std::size_t kMaxIndex = 65535;
 
 // A path created in one go names one setting, so it is held to what the
 // configuration file allows one key and one file: at most
-// config::kMaxKeyLength characters and 262144 new entries. Without them a short text such as a[65535][65535]...
-// adds 65536 nodes a step, and a long dotted one builds names of quadratic size.
+// config::kMaxKeyLength characters and 262144 new entries. Without them a short text such as
+// a[65535][65535]... adds 65536 nodes a step, and a long dotted one builds names of quadratic size.
 constexpr std::size_t kMaxPathLength = config::kMaxKeyLength;
 constexpr std::size_t kMaxNewEntries = 262144;
 

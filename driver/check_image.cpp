@@ -1,15 +1,15 @@
 #include "driver/check_image.h"
 
+#include <algorithm>
+#include <cerrno>
+#include <cstdint>
+#include <stdexcept>
+
 #include "image/error_detail.h"
 #include "image/image_buffer.h"
 #include "image/tiff_writer.h"
 #include "lsc/bayer_phase.h"
 #include "lsc/lens_shading_correction.h"
-
-#include <algorithm>
-#include <cerrno>
-#include <cstdint>
-#include <stdexcept>
 
 void writeCheckImage(const std::string& path, BayerImage capture, const ProcessingContext& fit) {
     ProcessingContext correction;
@@ -48,7 +48,7 @@ void writeCheckImage(const std::string& path, BayerImage capture, const Processi
         for (std::int32_t x = 0; x < width; ++x) {
             const float value = in[row + x] * rowBalance[x & 1] * 65535.0f + 0.5f;
             // Not a number counts as black; above full scale is clipped.
-            samples[row + x] = !(value > 0.0f)    ? 0
+            samples[row + x] = !(value > 0.0f)     ? 0
                                : value >= 65535.0f ? 65535
                                                    : static_cast<std::uint16_t>(value);
         }

@@ -3,10 +3,10 @@
 // resolution, so dust, blotches and residual shading can be inspected in any
 // image viewer (the flattened images are reduced).
 
+#include <string>
+
 #include "image/bayer_image.h"
 #include "lsc/processing_context.h"
-
-#include <string>
 
 // Applies the fit's correction (control grids, patch fractions, black level)
 // to every pixel of `capture`, balances the four channels to the larger

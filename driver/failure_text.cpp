@@ -1,12 +1,12 @@
 #include "driver/failure_text.h"
 
+#include <new>
+#include <string>
+
 #include "driver/driver_messages.h"
 #include "driver/notice.h"
 #include "image/error_detail.h"
 #include "lsc/apan_exception.h"
-
-#include <new>
-#include <string>
 
 namespace {
 

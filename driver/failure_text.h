@@ -10,8 +10,8 @@ inline constexpr char kDetailIndent[] = "  ";
 
 struct FailureText {
     int status = 1;
-    std::string text;              // the lines to print, without the final line end
-    bool standardError = false;    // printed on standard error, not the message stream
+    std::string text;           // the lines to print, without the final line end
+    bool standardError = false; // printed on standard error, not the message stream
 };
 
 // `failure` must hold an exception. A `notice` gives status 0 and its text.

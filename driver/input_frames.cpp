@@ -1,12 +1,12 @@
 #include "driver/input_frames.h"
 
-#include "image/mosaic_rows.h"
-#include "prep/frame_average.h"
-#include "prep/image_checks.h"
-
 #include <cmath>
 #include <cstddef>
 #include <stdexcept>
+
+#include "image/mosaic_rows.h"
+#include "prep/frame_average.h"
+#include "prep/image_checks.h"
 
 namespace {
 

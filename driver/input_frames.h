@@ -4,12 +4,12 @@
 // This is the whole-image way, for captures the preparation cannot take as a
 // stream (prep/capture_stream.h averages those band by band).
 
-#include "image/bayer_image.h"
-#include "image/mosaic_rows.h"
-
 #include <functional>
 #include <string>
 #include <vector>
+
+#include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
 
 // Reads `paths[0]` into `image` with `read`, then every further frame, and
 // leaves their average in `image` (the first frame's capture data kept), in

@@ -22,15 +22,13 @@
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
 #include "driver/file_options.h"
-#include "driver/report_data.h"
-#include "driver/run_report_html.h"
-#include "driver/run_result_json.h"
-#include "driver/unknown_settings.h"
 #include "driver/headerless_raw.h"
 #include "driver/input_frames.h"
 #include "driver/output_stream.h"
 #include "driver/report_data.h"
 #include "driver/run_report_html.h"
+#include "driver/run_result_json.h"
+#include "driver/unknown_settings.h"
 #include "driver/version.h"
 #include "image/hex_text.h"
 #include "image/output_file.h"
@@ -225,6 +223,7 @@ void Pipeline::writeReport() {
         return;
     out() << "Writing calibration report." << std::endl;
     writeRunReport(reportPath_, report_);
+    noteOutput("report", reportPath_);
 }
 
 void Pipeline::writeResult() {
@@ -312,13 +311,12 @@ void Pipeline::loadInput() {
         if (frames_.size() > 1) {
             if (stream && !statistics)
                 preparedWhileLoading_ =
-                    prep::loadAveragedPrepared(frames_, preparation, input_, prepared_,
-                                               &noise_) == prep::CaptureLoad::kPrepared;
+                    prep::loadAveragedPrepared(frames_, preparation, input_, prepared_, &noise_) ==
+                    prep::CaptureLoad::kPrepared;
             if (!preparedWhileLoading_)
-                readAveragedFrames(input_, frames_,
-                                   [](BayerImage& frame, const std::string& path) {
-                                       frame.read(path);
-                                   });
+                readAveragedFrames(input_, frames_, [](BayerImage& frame, const std::string& path) {
+                    frame.read(path);
+                });
         } else if (stream) {
             preparedWhileLoading_ =
                 prep::loadPrepared(settings_.input, preparation, input_, prepared_, statistics,
@@ -342,10 +340,10 @@ void Pipeline::loadInput() {
                                   legacyFormat.as_bool());
             });
         else
-            preparedWhileLoading_ = loadHeaderlessRaw(
-                input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
-                legacyFormat.as_bool(), stream ? &preparation : nullptr, &prepared_, statistics,
-                &noise_);
+            preparedWhileLoading_ =
+                loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits),
+                                  settings_.raw, legacyFormat.as_bool(),
+                                  stream ? &preparation : nullptr, &prepared_, statistics, &noise_);
         if (!settings_.translate.empty()) {
             input_.storeKqraw(settings_.translate);
             noteOutput("translate", settings_.translate);
@@ -355,8 +353,9 @@ void Pipeline::loadInput() {
         out() << "Input frames averaged: " << frames_.size() << std::endl;
     timerLine(timer_, "Image load time: ", out());
     saveIfAsked("inputasjpeg", settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
-                "JPEG image save time: ",
-                [&](const std::string& path) { input_.storeJpeg(path, settings_.jpegQuality); });
+                "JPEG image save time: ", [&](const std::string& path) {
+                    input_.storeJpeg(path, settings_.jpegQuality);
+                });
     saveIfAsked("inputasbmp", settings_.inputAsBmp, "Saving raw input file in bmp format.",
                 "BMP image save time: ", [&](const std::string& path) { input_.storeBmp(path); });
 }
@@ -742,13 +741,18 @@ void Pipeline::writeFlattenedImages() {
         return;
     BayerImage flattened = std::move(context_.corrected);
     flattened.copyMetadata(input_);
-    saveIfAsked("flat", settings_.flat, "Writing flattened image.", "Flattened raw image save time: ",
-                [&](const std::string& path) { flattened.storeKqraw(path); });
+    saveIfAsked("flat", settings_.flat, "Writing flattened image.",
+                "Flattened raw image save time: ", [&](const std::string& path) {
+                    flattened.storeKqraw(path);
+                });
     saveIfAsked("jpeg", settings_.jpeg, "Writing flattened jpeg image.",
-                "Flattened JPEG image save time: ",
-                [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
-    saveIfAsked("bmp", settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
-                [&](const std::string& path) { flattened.storeBmp(path); });
+                "Flattened JPEG image save time: ", [&](const std::string& path) {
+                    flattened.storeJpeg(path, settings_.jpegQuality);
+                });
+    saveIfAsked("bmp", settings_.bmp, "Writing flattened bmp image.",
+                "Flattened BMP image save time: ", [&](const std::string& path) {
+                    flattened.storeBmp(path);
+                });
 }
 
 // Last: it takes the capture's samples, which nothing needs after it.

@@ -93,12 +93,12 @@ private:
     std::string registerText_;
 
     // The calibration report (--report): filled as the stages go.
-    std::vector<std::string> frames_;  // --input, in order
-    std::string checkPath_;            // --check
+    std::vector<std::string> frames_; // --input, in order
+    std::string checkPath_;           // --check
     // The capture's rows pass it as they are read (or after a whole load).
     prep::NoiseSampler noise_;
     std::string reportPath_;
-    std::string resultPath_;  // --json
+    std::string resultPath_; // --json
     RunReport report_;
     const char* stage_ = "";
 };

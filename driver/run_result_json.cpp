@@ -1,12 +1,12 @@
 #include "driver/run_result_json.h"
 
+#include <charconv>
+#include <stdexcept>
+
 #include "driver/report_data.h"
 #include "image/output_file.h"
 
 #include <nlohmann/json.hpp>
-
-#include <charconv>
-#include <stdexcept>
 #include <sys/stat.h>
 
 namespace {
@@ -118,9 +118,10 @@ ordered_json measurements(const RunReport& report) {
 
 ordered_json verdict(const RunReport& report) {
     const bool failed = !report.failureMessage.empty() || !report.finished;
-    ordered_json object = {
-        {"result", failed ? "failed" : report.xtest ? "xtest" : "completed"},
-        {"exit_status", failed ? report.exitStatus : 0}};
+    ordered_json object = {{"result", failed         ? "failed"
+                                      : report.xtest ? "xtest"
+                                                     : "completed"},
+                           {"exit_status", failed ? report.exitStatus : 0}};
     if (failed) {
         object["failed_stage"] = report.failedStage;
         object["message"] = report.failureMessage;
@@ -138,16 +139,15 @@ std::string runResultJson(const RunReport& report) {
     for (const auto& [option, path] : report.outputs)
         outputs.push_back({{"option", option}, {"path", path}, {"bytes", storedSize(path)}});
 
-    const ordered_json document = {
-        {"schema_version", kResultSchemaVersion},
-        {"tool", {{"name", "lsc"}, {"version", report.toolVersion}}},
-        {"command_line", report.commandLine},
-        {"verdict", verdict(report)},
-        {"inputs", inputs(report)},
-        {"settings_changed", settings},
-        {"measurements", measurements(report)},
-        {"warnings", report.warnings},
-        {"outputs", outputs}};
+    const ordered_json document = {{"schema_version", kResultSchemaVersion},
+                                   {"tool", {{"name", "lsc"}, {"version", report.toolVersion}}},
+                                   {"command_line", report.commandLine},
+                                   {"verdict", verdict(report)},
+                                   {"inputs", inputs(report)},
+                                   {"settings_changed", settings},
+                                   {"measurements", measurements(report)},
+                                   {"warnings", report.warnings},
+                                   {"outputs", outputs}};
     // Invalid UTF-8 in a path or message is replaced, never a reason to lose the result.
     return document.dump(2, ' ', false, ordered_json::error_handler_t::replace);
 }

@@ -4,9 +4,9 @@
 // failure. Its layout is versioned (kResultSchemaVersion) and described by
 // docs/result.schema.json.
 
-#include "driver/run_report.h"
-
 #include <string>
+
+#include "driver/run_report.h"
 
 inline constexpr int kResultSchemaVersion = 1;
 

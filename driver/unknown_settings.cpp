@@ -1,8 +1,8 @@
 #include "driver/unknown_settings.h"
 
-#include "config/parameter_table.h"
-
 #include <algorithm>
+
+#include "config/parameter_table.h"
 
 namespace {
 
@@ -52,8 +52,8 @@ std::size_t editDistance(const std::string& a, const std::string& b) {
         row[0] = i;
         for (std::size_t j = 1; j <= b.size(); ++j) {
             const std::size_t above = row[j];
-            row[j] = std::min({row[j] + 1, row[j - 1] + 1,
-                               diagonal + (a[i - 1] == b[j - 1] ? 0u : 1u)});
+            row[j] =
+                std::min({row[j] + 1, row[j - 1] + 1, diagonal + (a[i - 1] == b[j - 1] ? 0u : 1u)});
             diagonal = above;
         }
     }

@@ -4,10 +4,10 @@
 // its default. Each gets a warning, with the nearest known key when one is
 // close.
 
-#include "config/config_node.h"
-
 #include <string>
 #include <vector>
+
+#include "config/config_node.h"
 
 // One text per unknown key, in the configuration's print order:
 // "Unknown configuration key proc.min_pixle_val (ignored); did you mean

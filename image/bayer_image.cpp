@@ -3,7 +3,6 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
-#include <sys/stat.h>
 #include <cstring>
 #include <memory>
 #include <stdexcept>
@@ -16,8 +15,10 @@
 #include "image/kqraw_fixed_header.h"
 #include "image/raw_metadata.h"
 #include "image/raw_reader.h"
-#include "image/sample_scaling.h"
 #include "image/sample_memory.h"
+#include "image/sample_scaling.h"
+
+#include <sys/stat.h>
 
 namespace {
 
@@ -60,7 +61,6 @@ std::string readFailureReason(const std::string& path, int rc) {
         return path + ": not a KQRAW2 or KQRAW raw image";
     }
 }
-
 
 // Copy metadata with the object's messages for each failure.
 void copyMetadataOrThrow(ImageBuffer* target, const ImageBuffer* source) {

@@ -18,8 +18,7 @@ private:
 };
 
 // `Base` with a detail line: still caught as `Base` wherever it was before.
-template <class Base>
-class DetailedError : public Base, public ErrorDetail {
+template <class Base> class DetailedError : public Base, public ErrorDetail {
 public:
     template <class... Args>
     explicit DetailedError(std::string detail, Args&&... args)

@@ -1,13 +1,13 @@
 #include "prep/capture_evidence.h"
 
-#include "lsc/bayer_phase.h"
-#include "prep/prep_image.h"
-
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstdio>
 #include <vector>
+
+#include "lsc/bayer_phase.h"
+#include "prep/prep_image.h"
 
 namespace prep {
 namespace {
@@ -20,8 +20,8 @@ constexpr const char* kChannelNames[4] = {"red", "green/red", "green/blue", "blu
 constexpr int kBlockSide = 16;
 constexpr int kMaxBlocksPerAxis = 128;
 constexpr std::size_t kMinBlocks = 200;
-constexpr double kMinSlopeSignificance = 20.0;  // slope / its standard error
-constexpr double kMinLevelSpread = 1.3;          // brightest / darkest block mean
+constexpr double kMinSlopeSignificance = 20.0; // slope / its standard error
+constexpr double kMinLevelSpread = 1.3;        // brightest / darkest block mean
 
 std::string percentText(double fraction) {
     char text[32];
@@ -78,8 +78,8 @@ CentreLevels centreLevels(const BayerImage& mosaic, float blackLevel) {
     const float* samples = mosaic.pixels();
     for (std::int32_t y = height / 3; y < height - height / 3; ++y)
         for (std::int32_t x = width / 3; x < width - width / 3; ++x) {
-            const int channel = bayerChannel(static_cast<std::uint64_t>(x),
-                                             static_cast<std::uint64_t>(y), phase);
+            const int channel =
+                bayerChannel(static_cast<std::uint64_t>(x), static_cast<std::uint64_t>(y), phase);
             sum[channel] += samples[static_cast<std::size_t>(y) * width + x];
             ++count[channel];
         }
@@ -101,13 +101,15 @@ std::string bayerOrderDoubt(const CentreLevels& levels, const std::string& order
     if (greens > kGreenMismatch)
         return "The two green channels differ by " + percentText(greens) +
                " % in the centre of the image (a sensor's greens differ by a few per cent at "
-               "most)" + question;
+               "most)" +
+               question;
     for (int c : {0, 3})
         if (levels.level[c] > kBrighterThanGreen * green)
             return std::string("The ") + kChannelNames[c] + " channel is " +
                    ratioText(levels.level[c] / green) +
                    " x green in the centre of the image (no usual illuminant makes it brighter "
-                   "than green)" + question;
+                   "than green)" +
+                   question;
     return std::string();
 }
 

@@ -4,13 +4,13 @@
 // order that does not fit the data, and a black level (pedestal) left in the
 // samples that proc.black_level does not take out.
 
-#include "image/bayer_image.h"
-#include "image/mosaic_rows.h"
-
 #include <cstdint>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
 
 namespace prep {
 
@@ -39,9 +39,9 @@ std::string bayerOrderDoubt(const CentreLevels& levels, const std::string& order
 // pedestal, and since the read noise is not negative, the mean at which the
 // line reaches zero is a lower bound of the pedestal.
 struct PedestalEvidence {
-    bool measured = false;      // enough blocks, enough spread and clear shot noise
-    double lowerBound = 0.0;    // pedestal at least this, in sample units, less 3 standard errors
-    double estimate = 0.0;      // the line's zero, in sample units
+    bool measured = false;   // enough blocks, enough spread and clear shot noise
+    double lowerBound = 0.0; // pedestal at least this, in sample units, less 3 standard errors
+    double estimate = 0.0;   // the line's zero, in sample units
     double standardError = 0.0;
     int blocks = 0;
 };
@@ -61,10 +61,10 @@ private:
     void measureStrip();
 
     std::int32_t width_ = 0, height_ = 0;
-    int stepX_ = 1, stepY_ = 1;        // every n-th block along each axis
-    std::int32_t row_ = 0;              // rows received
-    std::vector<std::uint16_t> strip_;  // the rows of the current block row
-    std::vector<std::pair<double, double>> points_;  // (mean, variance) per block and channel
+    int stepX_ = 1, stepY_ = 1;                     // every n-th block along each axis
+    std::int32_t row_ = 0;                          // rows received
+    std::vector<std::uint16_t> strip_;              // the rows of the current block row
+    std::vector<std::pair<double, double>> points_; // (mean, variance) per block and channel
 };
 // Minimum excess of the lower bound over proc.black_level before the run
 // warns: 2 % of full scale.

@@ -30,8 +30,9 @@ constexpr std::size_t kBandBytes = 256 * 1024;
 // Hands the width x height samples at `samplesAt` to addRows(rows, count),
 // a band of rows at a time.
 template <typename AddRows>
-void readBands(const std::string& path, img::ByteSource& source, std::uint64_t samplesAt, std::int32_t width,
-               std::int32_t height, std::vector<std::uint16_t>& band, const AddRows& addRows) {
+void readBands(const std::string& path, img::ByteSource& source, std::uint64_t samplesAt,
+               std::int32_t width, std::int32_t height, std::vector<std::uint16_t>& band,
+               const AddRows& addRows) {
     const std::size_t rowSamples = static_cast<std::size_t>(width);
     const std::size_t bandRows = std::max<std::size_t>(1, kBandBytes / (2 * rowSamples));
     band.resize(bandRows * rowSamples);
@@ -50,8 +51,8 @@ void readBands(const std::string& path, img::ByteSource& source, std::uint64_t s
 } // namespace
 
 CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
-                         BayerImage& input, BayerImage& prepared,
-                         SampleStatistics* inputStatistics, img::MosaicRowSink* rows) {
+                         BayerImage& input, BayerImage& prepared, SampleStatistics* inputStatistics,
+                         img::MosaicRowSink* rows) {
     input.reset();
     int rc = img::kOk;
     std::unique_ptr<img::ByteSource> source(img::openSource(path.c_str(), &rc));

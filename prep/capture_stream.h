@@ -8,9 +8,8 @@
 #include <string>
 #include <vector>
 
-#include "image/mosaic_rows.h"
-
 #include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
 

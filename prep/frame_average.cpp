@@ -1,8 +1,8 @@
 #include "prep/frame_average.h"
 
-#include "image/image_buffer.h"
-
 #include <stdexcept>
+
+#include "image/image_buffer.h"
 
 namespace prep {
 
@@ -28,8 +28,8 @@ std::string frameDifference(const FrameShape& frame, const FrameShape& first) {
 void throwFrameMismatch(std::size_t index, const std::string& path, const std::string& firstPath,
                         const std::string& difference) {
     throw std::runtime_error("Input frame " + std::to_string(index + 1) + " (" + path +
-                             ") does not match the first frame (" + firstPath + "): " +
-                             difference + ".");
+                             ") does not match the first frame (" + firstPath + "): " + difference +
+                             ".");
 }
 
 } // namespace prep

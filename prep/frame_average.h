@@ -10,8 +10,8 @@ namespace prep {
 
 struct FrameShape {
     std::int32_t width = 0, height = 0;
-    std::uint32_t cfa = 0;   // second cfa word
-    std::uint16_t bits = 0;  // bit depth of the samples
+    std::uint32_t cfa = 0;  // second cfa word
+    std::uint16_t bits = 0; // bit depth of the samples
 };
 
 // What differs between a frame and the first ("800 x 600 pixels against

@@ -8,8 +8,8 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "prep/prep_image.h"
 #include "image/error_detail.h"
+#include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 
 namespace prep {
@@ -58,14 +58,15 @@ std::string rangeDetail(const BayerImage& image, const PixelLimits& limits,
     const double total = static_cast<double>(sampleCount(image));
     std::ostringstream text = messageText();
     text << std::fixed << std::setprecision(2);
-    const auto side = [&](const char* name, const char* relation, float limit, const char* worstName,
-                          const SideCount& found) {
+    const auto side = [&](const char* name, const char* relation, float limit,
+                          const char* worstName, const SideCount& found) {
         if (found.count == 0)
             return;
         if (text.tellp() > 0)
             text << "; ";
         char share[32];
-        std::snprintf(share, sizeof share, "%.3g", 100.0 * static_cast<double>(found.count) / total);
+        std::snprintf(share, sizeof share, "%.3g",
+                      100.0 * static_cast<double>(found.count) / total);
         text << name << ": " << found.count << (found.count == 1 ? " pixel (" : " pixels (")
              << share << " %) " << relation << ' ' << std::setprecision(0) << limit << " ("
              << worstName << ' ' << sampleUnits(found.worst, fullScale) << " at sensor x "
@@ -172,8 +173,8 @@ void checkPixelRange(const BayerImage& image, const PixelLimits& limits, std::ui
         std::ostringstream text = messageText();
         text << msg::kPixelsNotWithin << limits.minPixel << " to " << limits.maxPixel << ".\n"
              << msg::kPossibleCauses << '\n'
-             << msg::kOutOfRangeValue << position.row << ',' << position.column << ") = "
-             << sampleUnits(image.pixels()[index], fullScale) << ".\n";
+             << msg::kOutOfRangeValue << position.row << ',' << position.column
+             << ") = " << sampleUnits(image.pixels()[index], fullScale) << ".\n";
         throw DetailedError<std::runtime_error>(rangeDetail(image, limits, fullScale), text.str());
     }
     out << msg::kPixelsWithin << std::endl;

@@ -55,9 +55,9 @@ std::uint32_t sampleUnits(float sample, std::uint32_t fullScale);
 
 // The configured limits, in whole units of full scale.
 struct PixelLimits {
-    float minPixel = 0.0f;   // proc.min_pixel_val
-    float maxPixel = 0.0f;   // proc.max_pixel_val
-    float peakMinimum = 0.0f;  // proc.peak_pixel_min
+    float minPixel = 0.0f;    // proc.min_pixel_val
+    float maxPixel = 0.0f;    // proc.max_pixel_val
+    float peakMinimum = 0.0f; // proc.peak_pixel_min
     // The image's reduction (shared.proc_sampling_factor): the detail line of
     // a failed range check gives positions in sensor pixels.
     int samplingFactor = 1;
@@ -73,8 +73,8 @@ std::int64_t sensorCoordinate(std::int32_t reduced, int factor);
 // explanation (every line ended by '\n'); a failed range check carries an
 // ErrorDetail: which side, the share of pixels beyond it and where the worst
 // one lies on the sensor.
-void checkPixelRange(const BayerImage& image, const PixelLimits& limits,
-                     std::uint32_t fullScale, std::ostream& out);
+void checkPixelRange(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+                     std::ostream& out);
 void checkPeakLevel(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
                     std::ostream& out);
 // Both, in that order.

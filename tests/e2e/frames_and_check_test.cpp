@@ -1,13 +1,13 @@
 // Several frames averaged (--input up to 16 times) and the full-resolution
 // check image (--check).
 
-#include "tests/e2e/e2e_fixture.h"
-
-#include <tiffio.h>
-
 #include <cmath>
 #include <memory>
 #include <regex>
+
+#include <tiffio.h>
+
+#include "tests/e2e/e2e_fixture.h"
 
 namespace e2e {
 namespace {
@@ -33,7 +33,10 @@ TEST_F(Frames, FramesThatDoNotAgreeAreRefusedByName) {
         std::function<void(FlatFieldShape&)> change;
         std::string difference;
     } cases[] = {
-        {[](FlatFieldShape& s) { s.width = 800; s.height = 600; },
+        {[](FlatFieldShape& s) {
+             s.width = 800;
+             s.height = 600;
+         },
          "800 x 600 pixels against 640 x 480 pixels"},
         {[](FlatFieldShape& s) { s.cfa = testing_support::cfaOfBayerOrder("GRBG"); },
          "Bayer order GRBG against RGGB"},
@@ -42,7 +45,8 @@ TEST_F(Frames, FramesThatDoNotAgreeAreRefusedByName) {
     for (const Case& c : cases) {
         FlatFieldShape shape = smallShape();
         c.change(shape);
-        write("other.kqraw", testing_support::kqraw2FileBytes(testing_support::makeFlatField(shape)));
+        write("other.kqraw",
+              testing_support::kqraw2FileBytes(testing_support::makeFlatField(shape)));
         const auto result = run(frameArgs({"flat.kqraw", "flat.kqraw", "other.kqraw"}));
         EXPECT_EQ(result.status, 1);
         EXPECT_TRUE(hasLine(result.out, "ERROR: Input frame 3 (other.kqraw) does not match the "

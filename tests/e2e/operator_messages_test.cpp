@@ -2,16 +2,16 @@
 // where), and the warnings for likely mistakes, present where the mistake is
 // and absent on good flat fields.
 
+#include <memory>
+
 #include "tests/e2e/e2e_fixture.h"
 #include "tests/support/module_shading.h"
-
-#include <memory>
 
 namespace e2e {
 namespace {
 
-const std::vector<std::string> kRun = {"--config", "lsc.cfg", "--input", "flat.kqraw",
-                                       "--calibrate", "cal.txt"};
+const std::vector<std::string> kRun = {"--config",   "lsc.cfg",     "--input",
+                                       "flat.kqraw", "--calibrate", "cal.txt"};
 
 std::vector<std::string> with(std::vector<std::string> args, const std::vector<std::string>& more) {
     args.insert(args.end(), more.begin(), more.end());
@@ -24,8 +24,8 @@ struct DetailCase {
     const char* name;
     std::string config;
     std::vector<std::string> args;
-    std::string lastLine;  // the last line of the error's own text
-    std::string detail;    // the line after it (a prefix of it, for measured figures)
+    std::string lastLine; // the last line of the error's own text
+    std::string detail;   // the line after it (a prefix of it, for measured figures)
 };
 
 void PrintTo(const DetailCase& c, std::ostream* out) {
@@ -33,20 +33,31 @@ void PrintTo(const DetailCase& c, std::ostream* out) {
 }
 
 const DetailCase kDetails[] = {
-    {"missing_config", "", {"-c", "none.cfg", "-i", "flat.kqraw", "-l", "cal.txt"},
-     "ERROR: Unable to open configuration file.", "  none.cfg: No such file or directory"},
-    {"missing_capture", "", {"-c", "lsc.cfg", "-i", "none.kqraw", "-l", "cal.txt"},
-     "ERROR: Cannot read kqraw image.", "  none.kqraw: No such file or directory"},
-    {"truncated_capture", "", {"-c", "lsc.cfg", "-i", "short.kqraw", "-l", "cal.txt"},
+    {"missing_config",
+     "",
+     {"-c", "none.cfg", "-i", "flat.kqraw", "-l", "cal.txt"},
+     "ERROR: Unable to open configuration file.",
+     "  none.cfg: No such file or directory"},
+    {"missing_capture",
+     "",
+     {"-c", "lsc.cfg", "-i", "none.kqraw", "-l", "cal.txt"},
+     "ERROR: Cannot read kqraw image.",
+     "  none.kqraw: No such file or directory"},
+    {"truncated_capture",
+     "",
+     {"-c", "lsc.cfg", "-i", "short.kqraw", "-l", "cal.txt"},
      "ERROR: Cannot read kqraw image.",
      "  short.kqraw: truncated or damaged (a block or the pixel data runs past the end of the "
      "file, or the header or pixel block is missing)"},
-    {"empty_capture", "", {"-c", "lsc.cfg", "-i", "empty.kqraw", "-l", "cal.txt"},
-     "ERROR: Cannot read kqraw image.", "  empty.kqraw: the file is empty"},
+    {"empty_capture",
+     "",
+     {"-c", "lsc.cfg", "-i", "empty.kqraw", "-l", "cal.txt"},
+     "ERROR: Cannot read kqraw image.",
+     "  empty.kqraw: the file is empty"},
     {"missing_autofocus", "", with(kRun, {"-b", "cal.bin", "-a", "none.af"}),
      "ERROR: Unable to open configuration file.", "  none.af: No such file or directory"},
-    {"autofocus_parse", "", with(kRun, {"-b", "cal.bin", "-a", "bad.af"}),
-     "Stopped at: \"9 = 1;\"", "  bad.af, line 2"},
+    {"autofocus_parse", "", with(kRun, {"-b", "cal.bin", "-a", "bad.af"}), "Stopped at: \"9 = 1;\"",
+     "  bad.af, line 2"},
     {"not_a_number", "lsc.max_gain = six;", kRun,
      "ERROR: bad lexical cast: source type value could not be interpreted as target",
      "  lsc.max_gain = six: not a number"},
@@ -104,7 +115,7 @@ struct WarningCase {
     const char* name;
     std::string config;
     std::vector<std::string> extra;
-    std::string warning;  // the first warning line (a prefix of it); empty: none at all
+    std::string warning; // the first warning line (a prefix of it); empty: none at all
 };
 
 TEST_F(Warnings, NameTheLikelyMistakeAndStayAwayFromGoodRuns) {
@@ -113,15 +124,24 @@ TEST_F(Warnings, NameTheLikelyMistakeAndStayAwayFromGoodRuns) {
         {"register file and autofocus keys",
          "reference.controlPointR[0][0] = 1.5; global.configType = 1;\n"
          "module.af.set[0].macro = 7; reference.ctrlPoints[0].controlPointB[1][1] = 2;",
-         {}, ""},
-        {"typing slip", "proc.min_pixle_val = 60;", {},
+         {},
+         ""},
+        {"typing slip",
+         "proc.min_pixle_val = 60;",
+         {},
          "WARNING: Unknown configuration key proc.min_pixle_val (ignored); did you mean "
          "proc.min_pixel_val?"},
-        {"unknown list", "lsc.weights = {1, 2, 3};", {},
+        {"unknown list",
+         "lsc.weights = {1, 2, 3};",
+         {},
          "WARNING: Unknown configuration key lsc.weights (ignored)"},
-        {"unknown section", "camera.model = imx219;", {},
+        {"unknown section",
+         "camera.model = imx219;",
+         {},
          "WARNING: Unknown configuration key camera.model (ignored)"},
-        {"x test", "", {"--xtest"},
+        {"x test",
+         "",
+         {"--xtest"},
          "WARNING: X-test run: the register file holds a test surface that distorts the colours "
          "on purpose, not a calibration of this module."},
     };
@@ -196,14 +216,15 @@ TEST_F(Warnings, RealModulesDrawNone) {
         const auto result = calibrate();
         EXPECT_EQ(result.status, 0) << module.file << " " << module.temperature << result.out;
         EXPECT_EQ(result.out.find("WARNING"), std::string::npos)
-            << module.file << " " << module.temperature << "\n" << result.out;
+            << module.file << " " << module.temperature << "\n"
+            << result.out;
     }
 }
 
 TEST_F(Warnings, PedestalLeftInIsNamedFromTheNoise) {
     // Half the IMX219's size: its shot noise shows the pedestal of 64.
-    write("flat.kqraw", testing_support::kqraw2FileBytes(
-                            moduleField({"rpi_imx219.json", 6000}, 1640, 1232)));
+    write("flat.kqraw",
+          testing_support::kqraw2FileBytes(moduleField({"rpi_imx219.json", 6000}, 1640, 1232)));
     write("lsc.cfg", "");
     const auto left = calibrate();
     EXPECT_EQ(left.status, 0);

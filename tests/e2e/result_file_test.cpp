@@ -2,10 +2,11 @@
 // schema in docs/result.schema.json (tests/result/check_result.py), for a
 // completed run, failed runs and an X-test run.
 
-#include "tests/e2e/e2e_fixture.h"
-
 #include <cstdlib>
 #include <regex>
+
+#include "tests/e2e/e2e_fixture.h"
+
 #include <unistd.h>
 
 namespace e2e {
@@ -104,11 +105,11 @@ TEST_F(ResultFile, FiguresAreThePrintedOnesAndSizesTheFilesOwn) {
     ASSERT_TRUE(std::regex_search(out, ratio, std::regex("\nMeasured R/G: ([0-9.]+)\n")));
     std::smatch delta;
     ASSERT_TRUE(std::regex_search(out, delta, std::regex("\nMaximum delta ab: ([0-9.]+)\n")));
-    EXPECT_TRUE(valid({"measurements/ratios_before/r_g=" + ratio[1].str(),
-                       "measurements/max_delta_ab=" + delta[1].str(),
-                       "outputs/0/bytes=" + std::to_string(read("cal.txt").size()),
-                       "outputs/1/option=flat",
-                       "outputs/1/bytes=" + std::to_string(read("flat.out").size())}));
+    EXPECT_TRUE(
+        valid({"measurements/ratios_before/r_g=" + ratio[1].str(),
+               "measurements/max_delta_ab=" + delta[1].str(),
+               "outputs/0/bytes=" + std::to_string(read("cal.txt").size()), "outputs/1/option=flat",
+               "outputs/1/bytes=" + std::to_string(read("flat.out").size())}));
     // The run says where it wrote it, as it does for the report.
     EXPECT_TRUE(hasLine(result.out, "Writing run result."));
 }
