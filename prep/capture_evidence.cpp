@@ -18,7 +18,7 @@ constexpr const char* kChannelNames[4] = {"red", "green/red", "green/blue", "blu
 // along each axis are measured, spread evenly, so the cost does not grow with
 // the image.
 constexpr int kBlockSide = 16;
-constexpr int kMaxBlocksPerAxis = 128;
+constexpr int kMaxBlocksPerAxis = 64;
 constexpr std::size_t kMinBlocks = 200;
 constexpr double kMinSlopeSignificance = 20.0; // slope / its standard error
 constexpr double kMinLevelSpread = 1.3;        // brightest / darkest block mean
@@ -41,26 +41,36 @@ std::string ratioText(double ratio) {
 // defect does not count; that scales every block's figure alike, which
 // moves neither the line's zero nor its significance.
 void blockNoise(const std::uint16_t* strip, std::size_t stride, std::int32_t x0, int y0,
-                double& mean, double& variance, std::array<double, 64>& work) {
-    double sum = 0.0;
-    std::size_t count = 0, pixels = 0;
+                double& mean, double& variance) {
+    constexpr int kLeftOut = 5;          // the largest tenth of the 56 differences
+    std::int32_t largest[kLeftOut] = {}; // ascending
+    std::int64_t sum = 0, squares = 0;
+    int pixels = 0, count = 0;
     for (int row = y0; row < kBlockSide; row += 2) {
         const std::uint16_t* line = strip + static_cast<std::size_t>(row) * stride + x0;
         for (int column = 0; column < kBlockSide; column += 2) {
             sum += line[column];
             ++pixels;
-            if (column + 2 < kBlockSide)
-                work[count++] = std::abs(static_cast<double>(line[column + 2]) - line[column]);
+            if (column + 2 >= kBlockSide)
+                continue;
+            const std::int32_t d =
+                std::abs(static_cast<std::int32_t>(line[column + 2]) - line[column]);
+            squares += std::int64_t{d} * d;
+            ++count;
+            if (d > largest[0]) {
+                int at = 0;
+                while (at + 1 < kLeftOut && largest[at + 1] < d) {
+                    largest[at] = largest[at + 1];
+                    ++at;
+                }
+                largest[at] = d;
+            }
         }
     }
-    mean = sum / static_cast<double>(pixels);
-    const std::size_t kept = count - count / 10;
-    std::nth_element(work.begin(), work.begin() + static_cast<long>(kept) - 1,
-                     work.begin() + static_cast<long>(count));
-    double squares = 0.0;
-    for (std::size_t i = 0; i < kept; ++i)
-        squares += work[i] * work[i];
-    variance = squares / static_cast<double>(kept) / 2.0;
+    for (std::int32_t d : largest)
+        squares -= std::int64_t{d} * d;
+    mean = static_cast<double>(sum) / pixels;
+    variance = static_cast<double>(squares) / (count - kLeftOut) / 2.0;
 }
 
 } // namespace
@@ -142,7 +152,6 @@ void NoiseSampler::addRow(const std::uint16_t* samples) {
 }
 
 void NoiseSampler::measureStrip() {
-    std::array<double, 64> work{};
     const std::size_t stride = static_cast<std::size_t>(width_);
     for (std::int32_t bx = 0; (bx + 1) * kBlockSide <= width_; bx += stepX_)
         for (int channel = 0; channel < 4; ++channel) {
@@ -153,7 +162,7 @@ void NoiseSampler::measureStrip() {
             if (x0 + kBlockSide - 2 >= width_)
                 continue;
             double mean = 0.0, variance = 0.0;
-            blockNoise(strip_.data(), stride, x0, channel >> 1, mean, variance, work);
+            blockNoise(strip_.data(), stride, x0, channel >> 1, mean, variance);
             points_.emplace_back(mean, variance);
         }
 }
