@@ -2,6 +2,7 @@
 // slow to compile. No skipper: white space is accepted only where a rule says
 // so, and every character class is plain ASCII.
 
+#include <cerrno>
 #include <cstdint>
 #include <cstdio>
 #include <memory>
@@ -20,6 +21,7 @@
 #include "config/config_limits.h"
 #include "config/config_messages.h"
 #include "config/value_text.h"
+#include "image/error_detail.h"
 
 namespace {
 
@@ -42,11 +44,32 @@ constexpr std::size_t kMaxNewEntries = 262144; // nodes one text may add
 // Files beyond this are not configuration files (and /dev/zero must not hang).
 constexpr std::size_t kMaxFileSize = 64u << 20;
 
-[[noreturn]] void throwWithText(const char* message, Iterator begin, Iterator end) {
+// Where in a text a parse error lies, for the detail line under the message:
+// "lsc.cfg, line 3" (lines counted as the grammar counts line ends).
+struct TextPlace {
+    Iterator begin = nullptr;
+    std::string sourceName;
+
+    std::string describe(Iterator at) const {
+        std::size_t line = 1;
+        for (Iterator c = begin; c < at; ++c)
+            if (*c == '\n' || (*c == '\r' && !(c + 1 < at && c[1] == '\n')))
+                ++line;
+        const std::string number = "line " + std::to_string(line);
+        return sourceName.empty() ? number : sourceName + ", " + number;
+    }
+};
+
+[[noreturn]] void throwAt(const TextPlace& place, Iterator at, const std::string& message) {
+    throw DetailedError<std::runtime_error>(place.describe(at), message);
+}
+
+[[noreturn]] void throwWithText(const TextPlace& place, const char* message, Iterator begin,
+                                Iterator end) {
     std::string text(message);
     text += '\n';
     text.append(begin, end);
-    throw std::runtime_error(text);
+    throwAt(place, begin, text);
 }
 
 // One list element written back as text and widened from single precision,
@@ -60,8 +83,8 @@ void convertFloat(const Range& text, double& value, bool& pass) {
 
 class ConfigGrammar : public qi::grammar<Iterator> {
 public:
-    explicit ConfigGrammar(config_node& config)
-        : ConfigGrammar::base_type(settings_), config_(config) {
+    ConfigGrammar(config_node& config, TextPlace place)
+        : ConfigGrammar::base_type(settings_), config_(config), place_(std::move(place)) {
         using qi::char_;
         const auto digit = char_("0-9");
         const auto separator = qi::copy(-spaces_ >> ',' >> -spaces_);
@@ -127,7 +150,7 @@ private:
         for (Iterator c = step.begin() + 1; c + 1 < step.end(); ++c) {
             index = index * 10 + static_cast<std::uint64_t>(*c - '0');
             if (index > kMaxIndex)
-                throwWithText(config::msg::kKeyIndexTooLarge, keyStart_, step.end());
+                throwWithText(place_, config::msg::kKeyIndexTooLarge, keyStart_, step.end());
         }
         if (index >= current_->size())
             countNewEntries(index + 1 - current_->size(), step.end());
@@ -143,13 +166,13 @@ private:
 
     void checkKeyLength(Iterator stepEnd) const {
         if (stepEnd - keyStart_ > kMaxKeyLength)
-            throwWithText(config::msg::kKeyTooLong, keyStart_, keyStart_ + kMaxKeyLength);
+            throwWithText(place_, config::msg::kKeyTooLong, keyStart_, keyStart_ + kMaxKeyLength);
     }
 
     void countNewEntries(std::uint64_t count, Iterator stepEnd) {
         newEntries_ += count;
         if (newEntries_ > kMaxNewEntries)
-            throwWithText(config::msg::kTooManyEntries, keyStart_, stepEnd);
+            throwWithText(place_, config::msg::kTooManyEntries, keyStart_, stepEnd);
     }
 
     template <typename Number, typename Format>
@@ -174,10 +197,11 @@ private:
         std::ostringstream message;
         message << config::msg::kParseExpecting << expected << ":\n";
         message.write(settingStart, errorPosition - settingStart);
-        throw std::runtime_error(message.str());
+        throwAt(place_, settingStart, message.str());
     }
 
     config_node& config_;
+    const TextPlace place_;
     config_node* current_ = nullptr;
     Iterator keyStart_ = nullptr;
     std::uint64_t newEntries_ = 0;
@@ -196,8 +220,9 @@ struct FileClose {
 
 } // namespace
 
-void parse_config_text(std::string_view text, config_node& config) {
-    const ConfigGrammar grammar(config);
+void parse_config_text(std::string_view text, config_node& config, const std::string& sourceName) {
+    const TextPlace place{text.data(), sourceName};
+    const ConfigGrammar grammar(config, place);
     Iterator position = text.data();
     const Iterator end = text.data() + text.size();
     qi::parse(position, end, grammar);
@@ -213,26 +238,28 @@ void parse_config_text(std::string_view text, config_node& config) {
     message += '"';
     message.append(position, stop);
     message += "\"\n";
-    throw std::runtime_error(message);
+    throwAt(place, position, message);
 }
 
 std::string read_config_text(const std::string& path) {
     std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
     if (!file)
-        throw std::invalid_argument(config::msg::kCannotOpenConfig);
+        throw DetailedError<std::invalid_argument>(systemReason(path, errno),
+                                                   config::msg::kCannotOpenConfig);
     std::string text;
     char chunk[65536];
     std::size_t got = 0;
     while ((got = std::fread(chunk, 1, sizeof chunk, file.get())) > 0) {
         if (text.size() + got > kMaxFileSize)
-            throw std::runtime_error(config::msg::kConfigTooLarge);
+            throw DetailedError<std::runtime_error>(path, config::msg::kConfigTooLarge);
         text.append(chunk, got);
     }
     if (std::ferror(file.get()))
-        throw std::invalid_argument(config::msg::kCannotOpenConfig);
+        throw DetailedError<std::invalid_argument>(systemReason(path, errno),
+                                                   config::msg::kCannotOpenConfig);
     return text;
 }
 
 void read_config_file(const std::string& path, config_node& config) {
-    parse_config_text(read_config_text(path), config);
+    parse_config_text(read_config_text(path), config, path);
 }

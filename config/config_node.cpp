@@ -1,15 +1,17 @@
 #include "config/config_node.h"
 
 #include <cstdint>
+#include <cstring>
 #include <stdexcept>
 #include <typeinfo>
 #include <utility>
 
 #include <boost/lexical_cast/bad_lexical_cast.hpp>
 
+#include "config/config_limits.h"
 #include "config/config_messages.h"
 #include "config/value_text.h"
-#include "config/config_limits.h"
+#include "image/error_detail.h"
 
 namespace {
 
@@ -19,8 +21,8 @@ constexpr std::size_t kMaxIndex = 65535;
 
 // A path created in one go names one setting, so it is held to what the
 // configuration file allows one key and one file: at most
-// config::kMaxKeyLength characters and 262144 new entries. Without them a short text such as a[65535][65535]...
-// adds 65536 nodes a step, and a long dotted one builds names of quadratic size.
+// config::kMaxKeyLength characters and 262144 new entries. Without them a short text such as
+// a[65535][65535]... adds 65536 nodes a step, and a long dotted one builds names of quadratic size.
 constexpr std::size_t kMaxPathLength = config::kMaxKeyLength;
 constexpr std::size_t kMaxNewEntries = 262144;
 
@@ -28,10 +30,28 @@ constexpr std::size_t kMaxNewEntries = 262144;
     throw std::invalid_argument(config::msg::kNoneHasNoValue);
 }
 
-std::int32_t toInteger(const std::string& text) {
+// The key as the configuration file writes it: "root.config.lsc.max_gain"
+// -> "lsc.max_gain".
+std::string keyOfNode(const std::string& nodeName) {
+    std::string key = nodeName;
+    for (const char* prefix : {"root.", "config."})
+        if (key.compare(0, std::strlen(prefix), prefix) == 0)
+            key.erase(0, std::strlen(prefix));
+    return key;
+}
+
+// The conversion error keeps its library text; the detail names the key and
+// the text that did not convert.
+[[noreturn]] void throwNotConvertible(const std::string& nodeName, const std::string& text,
+                                      const std::type_info& target, const char* expected) {
+    throw DetailedError<boost::bad_lexical_cast>(
+        keyOfNode(nodeName) + " = " + text + ": not " + expected, typeid(std::string), target);
+}
+
+std::int32_t toInteger(const std::string& nodeName, const std::string& text) {
     std::int32_t value = 0;
     if (!parseIntegerText(text, value))
-        throw boost::bad_lexical_cast(typeid(std::string), typeid(int));
+        throwNotConvertible(nodeName, text, typeid(int), "a whole number (32 bits)");
     return value;
 }
 
@@ -168,25 +188,25 @@ const std::string& config_node_impl::as_string() const {
 
 bool config_node_impl::as_bool() const {
     checkInitialized();
-    return toInteger(value_) != 0;
+    return toInteger(name_, value_) != 0;
 }
 
 float config_node_impl::as_float() const {
     checkInitialized();
     float value = 0.0f;
     if (!parseFloatText(value_, value))
-        throw boost::bad_lexical_cast(typeid(std::string), typeid(float));
+        throwNotConvertible(name_, value_, typeid(float), "a number");
     return value;
 }
 
 unsigned char config_node_impl::as_uint8() const {
     checkInitialized();
-    return static_cast<unsigned char>(static_cast<std::uint32_t>(toInteger(value_)) & 0xFFu);
+    return static_cast<unsigned char>(static_cast<std::uint32_t>(toInteger(name_, value_)) & 0xFFu);
 }
 
 int config_node_impl::as_int() const {
     checkInitialized();
-    return toInteger(value_);
+    return toInteger(name_, value_);
 }
 
 config_node& config_node_impl::child(const std::string& name) {

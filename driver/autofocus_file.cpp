@@ -28,7 +28,7 @@ void readAutofocusFile(const std::string& path, config_node& config) {
     const std::string text = read_config_text(path);
     config_node_impl scratchRoot("root");
     config_node& scratch = scratchRoot.child("config");
-    parse_config_text(text, scratch);
+    parse_config_text(text, scratch, path);
     for (const auto& [name, child] : static_cast<config_node_impl&>(scratch).namedChildren()) {
         if (name == "module")
             continue;
@@ -38,5 +38,5 @@ void readAutofocusFile(const std::string& path, config_node& config) {
                 config_relative_path(scratch, *change) +
                 ", which would change the calibration data.");
     }
-    parse_config_text(text, config);
+    parse_config_text(text, config, path);
 }

@@ -3,11 +3,13 @@
 #include "driver/driver_messages.h"
 #include "driver/notice.h"
 #include "driver/version.h"
+#include "image/error_detail.h"
 
 #include <boost/program_options.hpp>
 
 #include <cstring>
 #include <sstream>
+#include <stdexcept>
 #include <vector>
 
 namespace po = boost::program_options;
@@ -19,10 +21,16 @@ po::typed_value<std::string>* fileName() {
     return po::value<std::string>()->default_value(std::string(), "");
 }
 
+// --input may be given up to kMaxInputFrames times: the frames are averaged.
+// Shown in the help text as every file option is.
+po::typed_value<std::vector<std::string>>* frameNames() {
+    return po::value<std::vector<std::string>>()->composing();
+}
+
 po::options_description basicOptions() {
     po::options_description options("Options");
     options.add_options()
-        ("input,i", fileName(), "The input kqraw bayer image file.")
+        ("input,i", frameNames(), "The input kqraw bayer image file.")
         ("inputasjpeg,u", fileName(),
          "Filename to save the input image file converted into jpeg format.")
         ("inputasbmp,w", fileName(),
@@ -45,6 +53,7 @@ po::options_description basicOptions() {
         ("bmp,m", fileName(),
          "The flatten bmp image resulting from applying the lens shading calibration register "
          "values.")
+        ("json", fileName(), "Output run result filename (JSON format).")
         ("xtest,x", "Generate a surface that causes obvious color distortions for sanity checking.")
         ("version,V", "Print version string.")
         ("help,H", "Print this help message.");
@@ -71,7 +80,9 @@ po::options_description advancedOptions() {
          "configuration mid-stream upon encountering a HW limit and return error code 257.")
         ("quiet,q", "Suppress warning and informational messages.")
         ("verbose,v", "Output detailed information during processing.")
-        ("report", fileName(), "Output calibration report filename (HTML format).");
+        ("report", fileName(), "Output calibration report filename (HTML format).")
+        ("check", fileName(),
+         "Output full-resolution corrected image filename (16-bit TIFF format).");
     return options;
 }
 
@@ -93,20 +104,39 @@ po::variables_map parseWith(const std::vector<const char*>& args,
     return map;
 }
 
+// Without --kq an advanced option is unknown to the parser. Its error stays
+// as it is; the detail says what is missing.
+[[noreturn]] void rethrowUnknown(const po::unknown_option& error,
+                                 const po::options_description& advanced) {
+    std::string name = error.get_option_name();
+    const std::string spelled = name;
+    if (name.compare(0, 2, "--") == 0)
+        name.erase(0, 2);
+    if (!name.empty() && advanced.find_nothrow(name, false))
+        throw DetailedError<std::runtime_error>(spelled + " needs --kq", error.what());
+    throw;
+}
+
 } // namespace
 
 CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream& out,
                                std::ostream& err) {
     const po::options_description basic = basicOptions();
+    const po::options_description advanced = advancedOptions();
     po::options_description all("Options");
-    all.add(basic).add(advancedOptions());
+    all.add(basic).add(advanced);
 
     const std::vector<const char*> args = withHelpSpelledOut(argc, argv);
     CommandLine line;
     line.map_ = parseWith(args, all);
     // Without --kq an advanced option must fail as an unknown one.
-    if (!line.given("kq"))
-        parseWith(args, basic);
+    if (!line.given("kq")) {
+        try {
+            parseWith(args, basic);
+        } catch (const po::unknown_option& error) {
+            rethrowUnknown(error, advanced);
+        }
+    }
 
     for (int i = 1; i < argc; ++i)
         line.arguments_ += std::string(argv[i]) + " ";
@@ -135,6 +165,11 @@ CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream&
           msg::kNeedCalibrateOrOutSamples);
     if (failed)
         throw notice(msg::kUseHelp);
+    const std::size_t frames = line.values("input").size();
+    if (frames > kMaxInputFrames)
+        throw std::runtime_error("At most " + std::to_string(kMaxInputFrames) +
+                                 " input frames can be averaged; --input is given " +
+                                 std::to_string(frames) + " times.");
     return line;
 }
 
@@ -142,5 +177,16 @@ std::string CommandLine::value(const char* name) const {
     const auto found = map_.find(name);
     if (found == map_.end())
         return std::string();
+    if (const auto* several = boost::any_cast<std::vector<std::string>>(&found->second.value()))
+        return several->empty() ? std::string() : several->front();
     return found->second.as<std::string>();
+}
+
+std::vector<std::string> CommandLine::values(const char* name) const {
+    const auto found = map_.find(name);
+    if (found == map_.end())
+        return {};
+    if (const auto* several = boost::any_cast<std::vector<std::string>>(&found->second.value()))
+        return *several;
+    return {found->second.as<std::string>()};
 }

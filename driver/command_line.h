@@ -7,6 +7,9 @@
 #include <string>
 #include <vector>
 
+// Frames of one capture that --input may name, averaged before preparation.
+constexpr std::size_t kMaxInputFrames = 16;
+
 class CommandLine {
 public:
     // Parses the arguments and runs, in order: the second parse without --kq,
@@ -16,8 +19,11 @@ public:
     static CommandLine parse(int argc, const char* const argv[], std::ostream& out,
                              std::ostream& err);
 
-    // The value of a file option; empty when it was not given.
+    // The value of a file option; empty when it was not given. For --input,
+    // which may be given several times, the first.
     std::string value(const char* name) const;
+    // Every value of an option, in command-line order (--input: the frames).
+    std::vector<std::string> values(const char* name) const;
     // True when a flag (or any option) was given.
     bool given(const char* name) const { return map_.count(name) == 1; }
 

@@ -1,16 +1,28 @@
 #include "driver/failure_text.h"
 
-#include "driver/driver_messages.h"
-#include "driver/notice.h"
-#include "lsc/apan_exception.h"
-
 #include <new>
 #include <string>
+
+#include "driver/driver_messages.h"
+#include "driver/notice.h"
+#include "image/error_detail.h"
+#include "lsc/apan_exception.h"
 
 namespace {
 
 FailureText error(const std::string& text) {
     return {1, msg::kErrorPrefix + text, false};
+}
+
+// The detail line, indented, after the whole of the error's own text (which
+// may already end with its own line end).
+FailureText withDetail(FailureText failure, const std::exception& e) {
+    if (const auto* detail = dynamic_cast<const ErrorDetail*>(&e)) {
+        if (failure.text.empty() || failure.text.back() != '\n')
+            failure.text += '\n';
+        failure.text += kDetailIndent + detail->detail();
+    }
+    return failure;
 }
 
 } // namespace
@@ -21,8 +33,10 @@ FailureText describeFailure(std::exception_ptr failure) {
     } catch (const notice& text) {
         return {0, text.what(), false};
     } catch (const apan::exception& e) {
-        return {e.code(), "ERROR(" + std::to_string(e.code()) + "): " + e.what() + "\n" + e.hint(),
-                false};
+        return withDetail({e.code(),
+                           "ERROR(" + std::to_string(e.code()) + "): " + e.what() + "\n" + e.hint(),
+                           false},
+                          e);
     } catch (const std::bad_alloc&) {
         return {1, msg::kNoMemory, true};
     } catch (const std::string& text) {
@@ -30,7 +44,7 @@ FailureText describeFailure(std::exception_ptr failure) {
     } catch (const char* text) {
         return error(text);
     } catch (const std::exception& e) {
-        return error(e.what());
+        return withDetail(error(e.what()), e);
     } catch (...) {
         return error(msg::kUnknownError);
     }

@@ -5,11 +5,15 @@
 #include <exception>
 #include <string>
 
+// Detail lines (what and where) stand under the error's text, indented so.
+inline constexpr char kDetailIndent[] = "  ";
+
 struct FailureText {
     int status = 1;
-    std::string text;              // the lines to print, without the final line end
-    bool standardError = false;    // printed on standard error, not the message stream
+    std::string text;           // the lines to print, without the final line end
+    bool standardError = false; // printed on standard error, not the message stream
 };
 
 // `failure` must hold an exception. A `notice` gives status 0 and its text.
+// An error that carries an ErrorDetail gets it as one more, indented line.
 FailureText describeFailure(std::exception_ptr failure);

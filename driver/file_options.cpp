@@ -1,21 +1,23 @@
 #include "driver/file_options.h"
 
-#include "image/output_file.h"
-
 #include <cerrno>
 #include <climits>
 #include <cstdlib>
 #include <stdexcept>
 #include <string>
-#include <sys/stat.h>
 #include <vector>
+
+#include "image/output_file.h"
+
+#include <sys/stat.h>
 
 namespace {
 
 constexpr const char* kInputOptions[] = {"config", "input", "raw", "samples", "autofocus"};
-constexpr const char* kOutputOptions[] = {
-    "calibrate", "binary",  "inputasjpeg", "inputasbmp", "translate", "preproc", "outsamples",
-    "flat",      "jpeg",    "bmp",         "delta",      "stats",     "log",     "report"};
+constexpr const char* kOutputOptions[] = {"calibrate", "binary",  "inputasjpeg", "inputasbmp",
+                                          "translate", "preproc", "outsamples",  "flat",
+                                          "jpeg",      "bmp",     "delta",       "stats",
+                                          "log",       "report",  "json",        "check"};
 
 // What a path names, as far as two paths can be told to name the same file.
 struct FileIdentity {
@@ -74,12 +76,12 @@ struct NamedFile {
 std::vector<NamedFile> namedFiles(const CommandLine& line, const char* const* options,
                                   std::size_t count) {
     std::vector<NamedFile> files;
-    for (std::size_t i = 0; i < count; ++i) {
-        const std::string path = line.value(options[i]);
-        FileIdentity id = identify(path);
-        if (id.kind == FileIdentity::kExisting || id.kind == FileIdentity::kToBeMade)
-            files.push_back({options[i], path, std::move(id)});
-    }
+    for (std::size_t i = 0; i < count; ++i)
+        for (const std::string& path : line.values(options[i])) { // every --input frame
+            FileIdentity id = identify(path);
+            if (id.kind == FileIdentity::kExisting || id.kind == FileIdentity::kToBeMade)
+                files.push_back({options[i], path, std::move(id)});
+        }
     return files;
 }
 
@@ -94,8 +96,7 @@ std::vector<NamedFile> namedFiles(const CommandLine& line, const char* const* op
 } // namespace
 
 void checkOutputsReplaceNothing(const CommandLine& line) {
-    const std::vector<NamedFile> inputs =
-        namedFiles(line, kInputOptions, std::size(kInputOptions));
+    const std::vector<NamedFile> inputs = namedFiles(line, kInputOptions, std::size(kInputOptions));
     const std::vector<NamedFile> outputs =
         namedFiles(line, kOutputOptions, std::size(kOutputOptions));
     for (std::size_t i = 0; i < outputs.size(); ++i) {

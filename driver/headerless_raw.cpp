@@ -152,7 +152,7 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
                        const std::string& detailsPath, bool fixedHeader,
                        const prep::MosaicPreparation* preparation, BayerImage* prepared,
-                       prep::SampleStatistics* inputStatistics) {
+                       prep::SampleStatistics* inputStatistics, img::MosaicRowSink* rows) {
     namespace io = boost::iostreams;
     std::string detailsText;
     if (!readDetailsText(detailsPath, detailsText))
@@ -196,6 +196,8 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
         stream = std::make_unique<prep::MosaicStream>(width, height, *preparation);
         if (inputStatistics)
             stream->measureSamples(mask);
+        if (rows)
+            rows->start(width, height);
     }
 
     const float scale = static_cast<float>(mask);
@@ -210,6 +212,8 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
                 samples[x] = static_cast<std::uint16_t>(
                     (row[2 * x] | (std::uint32_t{row[2 * x + 1]} << 8)) & mask);
             stream->addRow(samples.data());
+            if (rows)
+                rows->addRow(samples.data());
             continue;
         }
         for (std::uint32_t x = 0; x < d.width; ++x) {

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
 
@@ -31,9 +32,10 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 // go straight into the preparation when it accepts the size: `target` then
 // holds the capture data only, `prepared` the prepared mosaic, and the result
 // is true; `inputStatistics`, if given, then receives the statistics of the
-// input samples. Throws apan::exception 202, 210, 262, 263, 264.
+// input samples, and `rows`, if given, every row of the streamed samples. Throws apan::exception 202, 210, 262, 263, 264.
 bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
                        const std::string& detailsPath, bool fixedHeader,
                        const prep::MosaicPreparation* preparation = nullptr,
                        BayerImage* prepared = nullptr,
-                       prep::SampleStatistics* inputStatistics = nullptr);
+                       prep::SampleStatistics* inputStatistics = nullptr,
+                       img::MosaicRowSink* rows = nullptr);

@@ -18,13 +18,17 @@
 #include "config/register_file.h"
 #include "driver/autofocus_file.h"
 #include "driver/changed_settings.h"
+#include "driver/check_image.h"
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
 #include "driver/file_options.h"
 #include "driver/headerless_raw.h"
+#include "driver/input_frames.h"
 #include "driver/output_stream.h"
 #include "driver/report_data.h"
 #include "driver/run_report_html.h"
+#include "driver/run_result_json.h"
+#include "driver/unknown_settings.h"
 #include "driver/version.h"
 #include "image/hex_text.h"
 #include "image/output_file.h"
@@ -33,6 +37,7 @@
 #include "lsc/patch_layout_choice.h"
 #include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
+#include "prep/capture_evidence.h"
 #include "prep/capture_stream.h"
 #include "prep/delta_ab.h"
 #include "prep/delta_ab_report.h"
@@ -110,9 +115,16 @@ int Pipeline::run(int argc, const char* const argv[]) {
     if (!commandLine_.value("autofocus").empty() && commandLine_.value("binary").empty())
         throw std::runtime_error(msg::kAutofocusNeedsBinary);
     checkOutputsReplaceNothing(commandLine_);
+    frames_ = commandLine_.values("input");
+    checkPath_ = commandLine_.value("check");
     reportPath_ = commandLine_.value("report");
+    resultPath_ = commandLine_.value("json");
     report_.toolVersion = lscversion::versionText();
     report_.commandLine = commandLine_.argumentsText();
+    for (const char* option : {"config", "input", "raw", "samples", "autofocus"})
+        for (const std::string& path : commandLine_.values(option))
+            if (!path.empty())
+                report_.inputFiles.emplace_back(option, path);
     try {
         runStages();
     } catch (...) {
@@ -121,6 +133,7 @@ int Pipeline::run(int argc, const char* const argv[]) {
     }
     report_.finished = true;
     writeReport();
+    writeResult();
     finish();
     return 0;
 }
@@ -149,6 +162,7 @@ void Pipeline::runStages() {
     prepareImage();
     beginStage("Checking the prepared image");
     checkPreparedImage();
+    lookForSetUpMistakes();
     writePreparedImage();
     buildSampleSet();
     if (context_.autoPatchLayout) {
@@ -176,21 +190,31 @@ void Pipeline::runStages() {
     checkLuminance();
     beginStage("Writing the flattened images");
     writeFlattenedImages();
+    if (!checkPath_.empty()) {
+        beginStage("Writing the check image");
+        writeCheck();
+    }
 }
 
 // The report of a failed run shows what failed and everything computed before.
+// The report and the result file of a failed run show what failed and
+// everything computed before.
 void Pipeline::recordFailure() {
-    if (reportPath_.empty())
+    if (reportPath_.empty() && resultPath_.empty())
         return;
     report_.failedStage = stage_;
     recordFitError();
-    report_.failureMessage = describeFailure(std::current_exception()).text;
-    try {
-        writeReport();
-    } catch (const std::exception& error) {
-        // The run's own error is what the operator must see first; this one
-        // goes on the line before it.
-        out() << msg::kErrorPrefix << error.what() << std::endl;
+    const FailureText failure = describeFailure(std::current_exception());
+    report_.failureMessage = failure.text;
+    report_.exitStatus = failure.status;
+    for (void (Pipeline::*write)() : {&Pipeline::writeReport, &Pipeline::writeResult}) {
+        try {
+            (this->*write)();
+        } catch (const std::exception& error) {
+            // The run's own error is what the operator must see first; this
+            // one goes on the line before it.
+            out() << msg::kErrorPrefix << error.what() << std::endl;
+        }
     }
 }
 
@@ -199,6 +223,14 @@ void Pipeline::writeReport() {
         return;
     out() << "Writing calibration report." << std::endl;
     writeRunReport(reportPath_, report_);
+    noteOutput("report", reportPath_);
+}
+
+void Pipeline::writeResult() {
+    if (resultPath_.empty())
+        return;
+    out() << "Writing run result." << std::endl;
+    writeRunResult(resultPath_, report_);
 }
 
 void Pipeline::readConfiguration() {
@@ -227,18 +259,23 @@ void Pipeline::openMessages() {
     messageStream.setQuiet(settings_.quiet);
     messageStream.openInfoFile(settings_.log);
     out() << lscversion::versionLine() << std::endl;
+    for (const std::string& text : unknownSettingWarnings(*config_, settings_.blockName))
+        warn(text);
     if (settings_.input.empty())
         throw std::runtime_error(msg::kNoInput);
     timerLine(timer_, "Processes configuration: ", out());
-    out() << "Input file: " << settings_.input << std::endl;
+    for (const std::string& frame : frames_)
+        out() << "Input file: " << frame << std::endl;
 }
 
-void Pipeline::saveIfAsked(const std::string& path, const char* message, const char* timerLabel,
+void Pipeline::saveIfAsked(const char* option, const std::string& path, const char* message,
+                           const char* timerLabel,
                            const std::function<void(const std::string&)>& store) {
     if (path.empty())
         return;
     out() << message << std::endl;
     store(path);
+    noteOutput(option, path);
     timerLine(timer_, timerLabel, out());
 }
 
@@ -251,11 +288,11 @@ prep::MosaicPreparation Pipeline::preparation() const {
 }
 
 // Unless something needs the input image itself (its exports and
-// translation, the identity test), the capture is prepared as it is read and
-// never held at full resolution.
+// translation, the identity test, the full-resolution check image), the
+// capture is prepared as it is read and never held at full resolution.
 bool Pipeline::needsInputImage() const {
     return !settings_.inputAsJpeg.empty() || !settings_.inputAsBmp.empty() ||
-           !settings_.translate.empty() || identityTest();
+           !settings_.translate.empty() || identityTest() || !checkPath_.empty();
 }
 
 // In debug mode, when the stored prepared image should be the input again.
@@ -271,12 +308,22 @@ void Pipeline::loadInput() {
     // Debug mode shows the input's statistics.
     prep::SampleStatistics* statistics = settings_.debug ? &inputStatistics_ : nullptr;
     if (settings_.raw.empty()) {
-        if (stream)
+        if (frames_.size() > 1) {
+            if (stream && !statistics)
+                preparedWhileLoading_ =
+                    prep::loadAveragedPrepared(frames_, preparation, input_, prepared_, &noise_) ==
+                    prep::CaptureLoad::kPrepared;
+            if (!preparedWhileLoading_)
+                readAveragedFrames(input_, frames_, [](BayerImage& frame, const std::string& path) {
+                    frame.read(path);
+                });
+        } else if (stream) {
             preparedWhileLoading_ =
-                prep::loadPrepared(settings_.input, preparation, input_, prepared_, statistics) ==
-                prep::CaptureLoad::kPrepared;
-        else
+                prep::loadPrepared(settings_.input, preparation, input_, prepared_, statistics,
+                                   &noise_) == prep::CaptureLoad::kPrepared;
+        } else {
             input_.read(settings_.input);
+        }
         // A code the reader does not know leaves no Bayer order: every later
         // stage would fail with a message that points elsewhere.
         const std::uint32_t cfa = input_.cfa();
@@ -287,18 +334,29 @@ void Pipeline::loadInput() {
         // Read only here: a run without --raw never looks at it.
         const config_node& legacyFormat = config_->find_path("raw.legacy_format");
         check_int_range(*config_, legacyFormat, 0, 1);
-        preparedWhileLoading_ = loadHeaderlessRaw(
-            input_, settings_.input, static_cast<std::uint16_t>(bits), settings_.raw,
-            legacyFormat.as_bool(), stream ? &preparation : nullptr, &prepared_, statistics);
-        if (!settings_.translate.empty())
+        if (frames_.size() > 1)
+            readAveragedFrames(input_, frames_, [&](BayerImage& frame, const std::string& path) {
+                loadHeaderlessRaw(frame, path, static_cast<std::uint16_t>(bits), settings_.raw,
+                                  legacyFormat.as_bool());
+            });
+        else
+            preparedWhileLoading_ =
+                loadHeaderlessRaw(input_, settings_.input, static_cast<std::uint16_t>(bits),
+                                  settings_.raw, legacyFormat.as_bool(),
+                                  stream ? &preparation : nullptr, &prepared_, statistics, &noise_);
+        if (!settings_.translate.empty()) {
             input_.storeKqraw(settings_.translate);
+            noteOutput("translate", settings_.translate);
+        }
     }
+    if (frames_.size() > 1)
+        out() << "Input frames averaged: " << frames_.size() << std::endl;
     timerLine(timer_, "Image load time: ", out());
-    saveIfAsked(settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
+    saveIfAsked("inputasjpeg", settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
                 "JPEG image save time: ", [&](const std::string& path) {
                     input_.storeJpeg(path, settings_.jpegQuality);
                 });
-    saveIfAsked(settings_.inputAsBmp, "Saving raw input file in bmp format.",
+    saveIfAsked("inputasbmp", settings_.inputAsBmp, "Saving raw input file in bmp format.",
                 "BMP image save time: ", [&](const std::string& path) { input_.storeBmp(path); });
 }
 
@@ -318,6 +376,8 @@ void Pipeline::decideBitDepth() {
     report_.bayerOrder = cfaPatternName(input_.cfa());
     report_.bitDepth = depth_;
     report_.exposureTime = input_.exposureTime();
+    report_.framesAveraged = static_cast<int>(frames_.size());
+    report_.serialNumber = input_.serialNumber(32);
     report_.inspectionInFixedNotation = settings_.debug;
     for (int channel = 0; channel < kChannels; ++channel)
         report_.gains[channel] = input_.channelGain(channel);
@@ -395,7 +455,36 @@ void Pipeline::checkPreparedImage() {
     limits.minPixel = settings_.minPixel;
     limits.maxPixel = settings_.maxPixel;
     limits.peakMinimum = settings_.peakPixelMin;
+    limits.samplingFactor = settings_.procSamplingFactor;
     prep::checkPixels(prepared_, limits, fullScale_, out());
+}
+
+// Mistakes that let a run complete with a wrong register file. Each rule
+// warns only on clear evidence: a good flat field prints nothing here.
+void Pipeline::lookForSetUpMistakes() {
+    const config_node& blackNode = config_->find_path("proc.black_level");
+    const double blackLevel = blackNode.as_int();
+    const std::string doubt = prep::bayerOrderDoubt(
+        prep::centreLevels(prepared_, static_cast<float>(blackLevel / fullScale_)),
+        cfaPatternName(input_.cfa()));
+    if (!doubt.empty())
+        warn(doubt);
+
+    // The rows of a capture loaded whole have not passed the sampler yet.
+    if (!noise_.started() && input_.hasSamples())
+        feedRows(input_, noise_);
+    const prep::PedestalEvidence pedestal = noise_.evidence();
+    const double tolerance = std::max(2.0, prep::kPedestalTolerance * fullScale_);
+    if (pedestal.measured && pedestal.lowerBound > blackLevel + tolerance)
+        warn("The noise of the capture shows a black level of at least " +
+             std::to_string(static_cast<long long>(std::floor(pedestal.lowerBound))) +
+             ", but proc.black_level is " + std::to_string(static_cast<long long>(blackLevel)) +
+             ": the pedestal left in the samples under-corrects the corners.");
+}
+
+void Pipeline::warn(const std::string& text) {
+    out() << "WARNING: " << text << std::endl;
+    report_.warnings.push_back(text);
 }
 
 void Pipeline::writePreparedImage() {
@@ -403,6 +492,7 @@ void Pipeline::writePreparedImage() {
         return;
     out() << "Preprocessed image file: " << settings_.preproc << std::endl;
     prepared_.storeKqraw(settings_.preproc);
+    noteOutput("preproc", settings_.preproc);
     if (identityTest()) {
         out() << "Performing identity test." << std::endl;
         BayerImage stored;
@@ -416,10 +506,10 @@ void Pipeline::buildSampleSet() {
     context_.image.copy(prepared_);
     load_fit_settings(*config_, input_, context_);
     context_.quiet = settings_.quiet;
+    report_.havePrepared = true;
+    report_.preparedWidth = prepared_.width();
+    report_.preparedHeight = prepared_.height();
     if (!reportPath_.empty()) {
-        report_.havePrepared = true;
-        report_.preparedWidth = prepared_.width();
-        report_.preparedHeight = prepared_.height();
         report_.shadingBefore = reportBlockMeans(prepared_);
         scaleToPeak(report_.shadingBefore, context_.blackLevel);
     }
@@ -431,8 +521,10 @@ void Pipeline::obtainSamples() {
     if (settings_.samples.empty()) {
         out() << "Create samples from image." << std::endl;
         collectSamples(context_, out());
-        if (!settings_.outSamples.empty())
+        if (!settings_.outSamples.empty()) {
             prep::writeSampleFile(settings_.outSamples, context_, sampleScale);
+            noteOutput("outsamples", settings_.outSamples);
+        }
     } else {
         out() << "Loading sample points from file." << std::endl;
         prep::readSampleFile(settings_.samples, context_, sampleScale);
@@ -450,6 +542,9 @@ void Pipeline::fitSurface() {
         out() << "Forcing lens shading surface to produce an X shaped color distortion."
               << std::endl;
         applyXTestSurface(context_);
+        report_.xtest = true;
+        warn("X-test run: the register file holds a test surface that distorts the colours on "
+             "purpose, not a calibration of this module.");
     }
     recordFit();
 }
@@ -485,6 +580,7 @@ void Pipeline::writeRegisterFile() {
         registerText_ = write_register_file(settings_.calibrate, *config_, settings_.blockName,
                                             settings_.controlPointInfix,
                                             commandLine_.argumentsText(), context_, input_);
+        noteOutput("calibrate", settings_.calibrate);
     }
     timerLine(timer_, "Lens shading calculation time: ", out());
 }
@@ -519,6 +615,7 @@ void Pipeline::writeBinaryData() {
 
     if (!writeWholeFile(settings_.binary, bytes.data(), bytes.size()))
         throw std::runtime_error(msg::kCannotStoreBinary);
+    noteOutput("binary", settings_.binary);
     timerLine(timer_, "Binary data save time: ", out());
 
     out() << "Reading binary calibration data." << std::endl;
@@ -578,11 +675,14 @@ void Pipeline::measureColourError() {
     if (!settings_.delta.empty()) {
         out() << "Writing delta ab data." << std::endl;
         prep::writeDeltaFile(settings_.delta, context_);
+        noteOutput("delta", settings_.delta);
     }
     out().precision(6);
     out() << "Maximum delta ab: " << context_.maxDelta << std::endl;
-    if (!settings_.stats.empty())
+    if (!settings_.stats.empty()) {
         prep::writeStatsFile(settings_.stats, context_);
+        noteOutput("stats", settings_.stats);
+    }
     prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
     timerLine(timer_, "Calculate delta ab time: ", out());
 }
@@ -641,12 +741,26 @@ void Pipeline::writeFlattenedImages() {
         return;
     BayerImage flattened = std::move(context_.corrected);
     flattened.copyMetadata(input_);
-    saveIfAsked(settings_.flat, "Writing flattened image.", "Flattened raw image save time: ",
-                [&](const std::string& path) { flattened.storeKqraw(path); });
-    saveIfAsked(settings_.jpeg, "Writing flattened jpeg image.", "Flattened JPEG image save time: ",
-                [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
-    saveIfAsked(settings_.bmp, "Writing flattened bmp image.", "Flattened BMP image save time: ",
-                [&](const std::string& path) { flattened.storeBmp(path); });
+    saveIfAsked("flat", settings_.flat, "Writing flattened image.",
+                "Flattened raw image save time: ", [&](const std::string& path) {
+                    flattened.storeKqraw(path);
+                });
+    saveIfAsked("jpeg", settings_.jpeg, "Writing flattened jpeg image.",
+                "Flattened JPEG image save time: ", [&](const std::string& path) {
+                    flattened.storeJpeg(path, settings_.jpegQuality);
+                });
+    saveIfAsked("bmp", settings_.bmp, "Writing flattened bmp image.",
+                "Flattened BMP image save time: ", [&](const std::string& path) {
+                    flattened.storeBmp(path);
+                });
+}
+
+// Last: it takes the capture's samples, which nothing needs after it.
+void Pipeline::writeCheck() {
+    out() << "Writing full-resolution check image." << std::endl;
+    writeCheckImage(checkPath_, std::move(input_), context_);
+    noteOutput("check", checkPath_);
+    timerLine(timer_, "Check image save time: ", out());
 }
 
 void Pipeline::finish() {

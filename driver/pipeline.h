@@ -7,6 +7,7 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include <boost/date_time/posix_time/ptime.hpp>
 
@@ -17,6 +18,7 @@
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
 #include "lsc/processing_context.h"
+#include "prep/capture_evidence.h"
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
 
@@ -31,6 +33,7 @@ private:
     void beginStage(const char* name) { stage_ = name; }
     void recordFailure();
     void writeReport();
+    void writeResult();
     void readConfiguration();
     void openMessages();
     void loadInput();
@@ -42,6 +45,9 @@ private:
     void inspectInput();
     void prepareImage();
     void checkPreparedImage();
+    void lookForSetUpMistakes();
+    // Prints "WARNING: <text>" and keeps the text for the report and the result.
+    void warn(const std::string& text);
     void writePreparedImage();
     void buildSampleSet();
     void obtainSamples();
@@ -57,10 +63,15 @@ private:
     void choosePatchLayout();
     void checkLuminance();
     void writeFlattenedImages();
+    void writeCheck();
     void finish();
     // When `path` is set: the message line, store(path), the timer line.
-    void saveIfAsked(const std::string& path, const char* message, const char* timerLabel,
-                     const std::function<void(const std::string&)>& store);
+    void saveIfAsked(const char* option, const std::string& path, const char* message,
+                     const char* timerLabel, const std::function<void(const std::string&)>& store);
+    // An output this run has finished writing, for the result file.
+    void noteOutput(const char* option, const std::string& path) {
+        report_.outputs.emplace_back(option, path);
+    }
 
     boost::posix_time::ptime startTime_;
     StageTimer timer_;
@@ -82,7 +93,12 @@ private:
     std::string registerText_;
 
     // The calibration report (--report): filled as the stages go.
+    std::vector<std::string> frames_; // --input, in order
+    std::string checkPath_;           // --check
+    // The capture's rows pass it as they are read (or after a whole load).
+    prep::NoiseSampler noise_;
     std::string reportPath_;
+    std::string resultPath_; // --json
     RunReport report_;
     const char* stage_ = "";
 };

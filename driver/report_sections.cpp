@@ -66,9 +66,22 @@ std::string percent(double value, int decimals) {
     return formatFixed(value, decimals) + " %";
 }
 
-} // namespace
+// The run's warnings, under the verdict; nothing when there are none.
+std::string warningList(const RunReport& report) {
+    if (report.warnings.empty())
+        return std::string();
+    std::string html = "<ul id=\"warnings\" class=\"note\">";
+    for (const std::string& text : report.warnings)
+        html += "<li>WARNING: " + htmlEscape(text) + "</li>";
+    return html + "</ul>\n";
+}
 
-std::string verdictSection(const RunReport& report) {
+std::string verdictOnly(const RunReport& report) {
+    // The X-test surface is no calibration: such a run never reads as a pass.
+    if (report.finished && report.failureMessage.empty() && report.xtest)
+        return "<div id=\"verdict\" class=\"verdict fail\" data-verdict=\"xtest\">"
+               "<span class=\"badge\">X-TEST</span> X-test run: the register file holds a test "
+               "surface, not a calibration.</div>\n";
     if (report.finished && report.failureMessage.empty())
         return "<div id=\"verdict\" class=\"verdict pass\" data-verdict=\"pass\">"
                "<span class=\"badge\">PASS</span> Calibration completed.</div>\n";
@@ -81,6 +94,12 @@ std::string verdictSection(const RunReport& report) {
            "<span class=\"badge\">FAIL</span> <span id=\"failed-stage\">" +
            htmlEscape(stage) + "</span><pre id=\"failure-message\" class=\"message\">" +
            htmlEscape(report.failureMessage) + "</pre></div>\n";
+}
+
+} // namespace
+
+std::string verdictSection(const RunReport& report) {
+    return verdictOnly(report) + warningList(report);
 }
 
 std::string runSection(const RunReport& report) {

@@ -22,15 +22,25 @@ struct RunReport {
     bool finished = false;          // the run reached "Completed."
     std::string failedStage;        // what the run was doing when it failed
     std::string failureMessage;     // the error lines as printed ("ERROR: ...")
+    int exitStatus = 0;             // of a failed run
+    bool xtest = false;             // the register file holds the X-test surface
+    std::vector<std::string> warnings;  // the "WARNING: " lines, without that prefix
 
     // The run
     std::string toolVersion;        // "3.8.1"
     std::string commandLine;        // arguments after the program name
     std::vector<std::pair<std::string, std::string>> changedSettings;  // key, value
 
+    // The input files named on the command line (option, path), in order
+    std::vector<std::pair<std::string, std::string>> inputFiles;
+    // The outputs this run finished writing (option, path), in order
+    std::vector<std::pair<std::string, std::string>> outputs;
+
     // The input
     bool haveInput = false;
     std::string inputPath;
+    std::string serialNumber;
+    int framesAveraged = 1;
     std::int32_t width = 0, height = 0;
     std::string bayerOrder;         // "RGGB", ...
     int bitDepth = 0;

@@ -1,10 +1,13 @@
 #include "image/bayer_image.h"
 
+#include <cerrno>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <stdexcept>
 
+#include "image/error_detail.h"
 #include "image/hex_text.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
@@ -12,13 +15,51 @@
 #include "image/kqraw_fixed_header.h"
 #include "image/raw_metadata.h"
 #include "image/raw_reader.h"
-#include "image/sample_scaling.h"
 #include "image/sample_memory.h"
+#include "image/sample_scaling.h"
+
+#include <sys/stat.h>
 
 namespace {
 
 [[noreturn]] void fail(const char* text) {
     throw std::runtime_error(text);
+}
+
+// Why a capture could not be read, for the line under "Cannot read kqraw
+// image.": the system's reason when the file does not open, else what the
+// reader found wrong with it.
+std::string readFailureReason(const std::string& path, int rc) {
+    std::FILE* file = std::fopen(path.c_str(), "rb");
+    if (!file)
+        return systemReason(path, errno);
+    const int first = std::fgetc(file);
+    const int error = std::ferror(file) ? errno : 0;
+    std::fclose(file);
+    if (error != 0)
+        return systemReason(path, error);
+    if (first == EOF)
+        return path + ": the file is empty";
+    struct stat info;
+    if (stat(path.c_str(), &info) == 0 && !S_ISREG(info.st_mode))
+        return path + ": a device or pipe that gives no KQRAW2 or KQRAW raw image";
+    switch (rc) {
+    case img::kIoError:
+        return path + ": a read error, or the file is shorter than its layout declares";
+    case img::kSizeMismatch:
+        return path + ": the file holds fewer samples than its header declares (truncated)";
+    case img::kRawBadContainer:
+        return path + ": truncated or damaged (a block or the pixel data runs past the end of "
+                      "the file, or the header or pixel block is missing)";
+    case img::kRawBadLayout:
+        return path + ": the layout given on the console does not match the file";
+    case img::kUnsupported:
+        return path + ": an image layout the tool does not support";
+    case img::kNoMemory:
+        return path + ": too large to read (a device that does not end?), or not enough memory";
+    default:
+        return path + ": not a KQRAW2 or KQRAW raw image";
+    }
 }
 
 // Copy metadata with the object's messages for each failure.
@@ -79,10 +120,19 @@ KqRawFixedHeader* headerlessFixedHeader(float exposureTime, float gain, const st
 
 } // namespace
 
+void throwCannotReadCapture(const std::string& path, int result) {
+    if (result == img::kImageTooLarge)
+        fail(img::msg::kImageTooLarge);
+    throw DetailedError<std::runtime_error>(readFailureReason(path, result),
+                                            img::msg::kCannotReadKqraw);
+}
+
 void BayerImage::read(const std::string& path) {
     buffer_.reset();
     int rc = img::kOk;
     ImagePtr raw(rawRead(path.c_str(), &rc));
+    if (!raw)
+        throwCannotReadCapture(path, rc);
     adoptRaw(std::move(raw), rc);
 }
 

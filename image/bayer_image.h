@@ -9,6 +9,11 @@
 #include "image/image_buffer.h"
 #include "image/image_result.h"
 
+// Throws "Cannot read kqraw image." (or the image-too-large message for that
+// result) with a detail line naming `path` and the reason: the system's when
+// the file does not open or read, else what the raw reader's `result` says.
+[[noreturn]] void throwCannotReadCapture(const std::string& path, int result);
+
 class BayerImage {
 public:
     BayerImage() = default;

@@ -12,6 +12,9 @@ namespace img {
 class MosaicRowSink {
 public:
     virtual ~MosaicRowSink() = default;
+    // Before the first row: the mosaic's size (a sink sized in advance may
+    // ignore it).
+    virtual void start(std::int32_t /*width*/, std::int32_t /*height*/) {}
     // `samples` holds one row of the mosaic's width; it may be reused after
     // the call.
     virtual void addRow(const std::uint16_t* samples) = 0;

@@ -6,8 +6,10 @@
 // identity test).
 
 #include <string>
+#include <vector>
 
 #include "image/bayer_image.h"
+#include "image/mosaic_rows.h"
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
 
@@ -16,6 +18,7 @@ namespace prep {
 enum class CaptureLoad {
     kPrepared,   // `input` holds the capture's header only, `prepared` the result
     kWholeImage, // `input` holds the whole image; the caller prepares it
+    kNotRead,    // (several frames) nothing was kept: the caller loads them whole
 };
 
 // Reads the raw file at `path`. A KQRAW fixed-header file or KQRAW2 container
@@ -26,8 +29,22 @@ enum class CaptureLoad {
 // `inputStatistics`, a prepared capture's samples are also measured there as
 // sampleStatistics would measure the whole image (the samples are then read
 // twice: the depth that converts them is known after the last one).
+// `rows`, if given, also receives every row of a prepared capture.
 CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
                          BayerImage& input, BayerImage& prepared,
-                         SampleStatistics* inputStatistics = nullptr);
+                         SampleStatistics* inputStatistics = nullptr,
+                         img::MosaicRowSink* rows = nullptr);
+
+// The same for several frames of one flat field, averaged band by band as
+// they are read (one band of each frame in memory, prep::averageSample per
+// sample), when every frame is a container or fixed-header file the
+// preparation takes as a stream; `input` then holds the first frame's header.
+// Otherwise kNotRead (nothing kept). Throws prep::throwFrameMismatch's error
+// for a frame that differs from the first in size, Bayer order or bit depth
+// (the depth that each frame's largest sample sets), and as loadPrepared for
+// a frame that cannot be read.
+CaptureLoad loadAveragedPrepared(const std::vector<std::string>& paths,
+                                 const MosaicPreparation& settings, BayerImage& input,
+                                 BayerImage& prepared, img::MosaicRowSink* rows = nullptr);
 
 } // namespace prep

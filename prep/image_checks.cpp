@@ -1,12 +1,14 @@
 #include "prep/image_checks.h"
 
 #include <cmath>
+#include <cstdio>
 #include <iomanip>
 #include <limits>
 #include <locale>
 #include <sstream>
 #include <stdexcept>
 
+#include "image/error_detail.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 
@@ -24,7 +26,63 @@ std::ostringstream messageText() {
     return text;
 }
 
+// One side of the pixel window: how many pixels lie beyond it and the worst.
+struct SideCount {
+    std::size_t count = 0;
+    float worst = 0.0f;
+    std::int32_t row = 0, column = 0;
+};
+
+// "too dark: 120 pixels (2.35 %) below 50 (darkest 3 at sensor x 0, y 0)"
+// and/or the same for "too bright", joined by "; ". Only on the failure path.
+std::string rangeDetail(const BayerImage& image, const PixelLimits& limits,
+                        std::uint32_t fullScale) {
+    const float scale = static_cast<float>(fullScale);
+    const float low = limits.minPixel / scale;
+    const float high = limits.maxPixel / scale;
+    SideCount dark, bright;
+    const float* sample = image.pixels();
+    const std::uint16_t channels = image.channels();
+    for (std::int32_t row = 0; row < image.height(); ++row)
+        for (std::int32_t column = 0; column < image.width(); ++column)
+            for (std::uint16_t channel = 0; channel < channels; ++channel, ++sample) {
+                const float v = *sample;
+                if (v < low) {
+                    if (dark.count++ == 0 || v < dark.worst)
+                        dark = {dark.count, v, row, column};
+                } else if (!(v <= high)) { // above, or not a number
+                    if (bright.count++ == 0 || v > bright.worst)
+                        bright = {bright.count, v, row, column};
+                }
+            }
+    const double total = static_cast<double>(sampleCount(image));
+    std::ostringstream text = messageText();
+    text << std::fixed << std::setprecision(2);
+    const auto side = [&](const char* name, const char* relation, float limit,
+                          const char* worstName, const SideCount& found) {
+        if (found.count == 0)
+            return;
+        if (text.tellp() > 0)
+            text << "; ";
+        char share[32];
+        std::snprintf(share, sizeof share, "%.3g",
+                      100.0 * static_cast<double>(found.count) / total);
+        text << name << ": " << found.count << (found.count == 1 ? " pixel (" : " pixels (")
+             << share << " %) " << relation << ' ' << std::setprecision(0) << limit << " ("
+             << worstName << ' ' << sampleUnits(found.worst, fullScale) << " at sensor x "
+             << sensorCoordinate(found.column, limits.samplingFactor) << ", y "
+             << sensorCoordinate(found.row, limits.samplingFactor) << ')' << std::setprecision(2);
+    };
+    side("too dark", "below", limits.minPixel, "darkest", dark);
+    side("too bright", "above", limits.maxPixel, "brightest", bright);
+    return text.str();
+}
+
 } // namespace
+
+std::int64_t sensorCoordinate(std::int32_t reduced, int factor) {
+    return static_cast<std::int64_t>(reduced / 2) * 2 * factor + (reduced & 1);
+}
 
 std::uint32_t fullScale(int depth) {
     const std::uint32_t power = depth >= 32 || depth < 0 ? 0u : std::uint32_t{1} << depth;
@@ -117,7 +175,7 @@ void checkPixelRange(const BayerImage& image, const PixelLimits& limits, std::ui
              << msg::kPossibleCauses << '\n'
              << msg::kOutOfRangeValue << position.row << ',' << position.column
              << ") = " << sampleUnits(image.pixels()[index], fullScale) << ".\n";
-        throw std::runtime_error(text.str());
+        throw DetailedError<std::runtime_error>(rangeDetail(image, limits, fullScale), text.str());
     }
     out << msg::kPixelsWithin << std::endl;
 }

@@ -58,12 +58,21 @@ struct PixelLimits {
     float minPixel = 0.0f;    // proc.min_pixel_val
     float maxPixel = 0.0f;    // proc.max_pixel_val
     float peakMinimum = 0.0f; // proc.peak_pixel_min
+    // The image's reduction (shared.proc_sampling_factor): the detail line of
+    // a failed range check gives positions in sensor pixels.
+    int samplingFactor = 1;
 };
+
+// Where a Bayer mosaic reduced by `factor` per colour plane puts its pixel
+// (x, y) on the sensor: the first sensor pixel of that colour in the block.
+std::int64_t sensorCoordinate(std::int32_t reduced, int factor);
 
 // The range check then the peak check. After each passed check
 // "Image pixels within specified parameters." is written to `out` as a line
 // of its own; a failed check throws std::runtime_error with the three-line
-// explanation (every line ended by '\n').
+// explanation (every line ended by '\n'); a failed range check carries an
+// ErrorDetail: which side, the share of pixels beyond it and where the worst
+// one lies on the sensor.
 void checkPixelRange(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
                      std::ostream& out);
 void checkPeakLevel(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,

@@ -13,7 +13,8 @@ packages=(
     libboost-iostreams-dev:armhf libboost-date-time-dev:armhf
     libjpeg-dev:armhf libtiff-dev:armhf libssl-dev:armhf
     libgtest-dev:armhf
-    nlohmann-json3-dev      # header-only (any architecture): flatgen and the tests
+    nlohmann-json3-dev      # header-only (any architecture): the --json result, flatgen, the tests
+    python3 python3-jsonschema  # the host runs the result tests' schema check
 )
 
 before_install() {

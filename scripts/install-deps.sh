@@ -8,12 +8,13 @@ program_packages=(
     cmake make g++ pkg-config
     libboost-dev libboost-program-options-dev libboost-iostreams-dev libboost-date-time-dev
     libjpeg-dev libtiff-dev libssl-dev
+    nlohmann-json3-dev      # the --json result; flatgen and the tests read tuning files
 )
 test_packages=(
     libgtest-dev libbenchmark-dev
-    nlohmann-json3-dev      # flatgen and the tests read the tuning files of measured modules
     libjpeg-turbo-progs libtiff-tools
     python3                 # the report tests; the man page and bash completion
+    python3-jsonschema      # the result tests validate --json documents against their schema
     groff-base              # the install test renders the man page
 )
 

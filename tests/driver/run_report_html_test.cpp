@@ -186,6 +186,15 @@ TEST_F(ReportPage, UnfinishedRunWithoutAMessageIsNotAPass) {
     expectValidPage(report, {"--verdict=incomplete"});
 }
 
+TEST_F(ReportPage, XTestRunIsNeverAPassAndWarningsStandUnderTheVerdict) {
+    RunReport report = report_test::exampleRunReport();
+    report.xtest = true;
+    report.warnings = {"X-test run: <test surface>", "Unknown configuration key a.b (ignored)"};
+    expectValidPage(report, {"--verdict=xtest",
+                             "--expect=warnings=WARNING: X-test run: <test surface>WARNING: "
+                             "Unknown configuration key a.b (ignored)"});
+}
+
 TEST_F(ReportPage, SkippedDeltaAbStageSaysSo) {
     RunReport report = report_test::exampleRunReport();
     report.haveDelta = false;

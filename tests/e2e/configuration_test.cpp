@@ -47,11 +47,13 @@ TEST_F(Configuration, ErrorsEndTheRunWithStatusOneBeforeTheImage) {
          "ERROR: Value for shared.block_name may only consist of letters, digits, dashes, and "
          "underscores and must start with a letter.\n"},
         {"shared.jpeg_quality = 7.5;",
-         "ERROR: bad lexical cast: source type value could not be interpreted as target\n"},
+         "ERROR: bad lexical cast: source type value could not be interpreted as target\n"
+         "  shared.jpeg_quality = 7.5: not a whole number (32 bits)\n"},
         {"lsc.max_gain = 6", "ERROR: Failed to parse configuration file parameters, expecting "
-                             "\";\":\nlsc.max_gain = 6\n"},
+                             "\";\":\nlsc.max_gain = 6\n  lsc.cfg, line 1\n"},
         {"lsc.max_gain = 6;\n9 = 1;\nlsc.falloff_factor = 1;\n",
-         "ERROR: Failed to parse configuration file parameters.\nStopped at: \"9 = 1;\"\n\n"},
+         "ERROR: Failed to parse configuration file parameters.\nStopped at: \"9 = 1;\"\n"
+         "  lsc.cfg, line 2\n"},
     };
     for (const ErrorCase& c : cases) {
         write("lsc.cfg", c.config);
@@ -66,7 +68,9 @@ TEST_F(Configuration, MissingFileIsReported) {
     prepare();
     const auto result = run({"-c", "nothing.cfg", "-i", "flat.kqraw", "-l", "cal.txt"});
     EXPECT_EQ(result.status, 1);
-    EXPECT_EQ(result.out, "ERROR: Unable to open configuration file.\n");
+    EXPECT_EQ(result.out,
+              "ERROR: Unable to open configuration file.\n  nothing.cfg: No such file or "
+              "directory\n");
 }
 
 TEST_F(Configuration, CarriageReturnLineEndsKeepEverySetting) {

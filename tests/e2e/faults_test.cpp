@@ -322,7 +322,8 @@ std::string faultName(Fault fault) {
 struct InputCase {
     const char* name;
     std::vector<std::string> args;
-    std::vector<std::string> missing;    // directory, vanished file
+    std::vector<std::string> directory;  // a directory
+    std::vector<std::string> missing;    // a vanished file
     std::vector<std::string> unreadable; // a read error
     std::vector<std::string> endless;    // a device that never ends
     int status;
@@ -336,29 +337,46 @@ void PrintTo(Fault fault, std::ostream* out) {
     *out << faultName(fault);
 }
 
-const std::vector<std::string> kConfigUnreadable = {"ERROR: Unable to open configuration file."};
+// The detail line under each message names the file (%) and the reason.
+const std::vector<std::string> kConfigMissing = {"ERROR: Unable to open configuration file.",
+                                                 "  %: No such file or directory"};
+const std::vector<std::string> kConfigDirectory = {"ERROR: Unable to open configuration file.",
+                                                   "  %: Is a directory"};
+const std::vector<std::string> kConfigUnreadable = {"ERROR: Unable to open configuration file.",
+                                                    "  %: Input/output error"};
 const std::vector<std::string> kConfigEndless = {
-    "ERROR: Configuration file is larger than 64 MiB."};
+    "ERROR: Configuration file is larger than 64 MiB.", "  %"};
 const std::vector<std::string> kDetailsUnreadable = {
     "ERROR(264): Unable to read headerless raw image details file.",
     "Likely incorrect file name of headerless raw image details file specified."};
-const std::vector<std::string> kKqrawUnreadable = {"ERROR: Cannot read kqraw image."};
+const std::vector<std::string> kKqrawMissing = {"ERROR: Cannot read kqraw image.",
+                                                "  %: No such file or directory"};
+const std::vector<std::string> kKqrawDirectory = {"ERROR: Cannot read kqraw image.",
+                                                  "  %: Is a directory"};
+const std::vector<std::string> kKqrawUnreadable = {"ERROR: Cannot read kqraw image.",
+                                                   "  %: Input/output error"};
+const std::vector<std::string> kKqrawEndless = {"ERROR: Cannot read kqraw image.",
+                                                "  %: a device or pipe that gives no KQRAW2 or KQRAW raw image"};
 
 const InputCase kInputs[] = {
     {"config",
      {"--config", "%", "--input", "flat.kqraw", "--calibrate", "cal.txt"},
-     kConfigUnreadable,
+     kConfigDirectory,
+     kConfigMissing,
      kConfigUnreadable,
      kConfigEndless,
      1},
     {"input",
      {"--config", "lsc.cfg", "--input", "%", "--calibrate", "cal.txt"},
+     kKqrawDirectory,
+     kKqrawMissing,
      kKqrawUnreadable,
-     kKqrawUnreadable,
-     kKqrawUnreadable,
+     kKqrawEndless,
      1},
     {"raw_input",
      {"--config", "lsc.cfg", "--input", "%", "--raw", "flat.txt", "--calibrate", "cal.txt"},
+     {"ERROR(210): Unable to open image file: %",
+      "Likely file protection issues or the file doesn't exist."},
      {"ERROR(210): Unable to open image file: %",
       "Likely file protection issues or the file doesn't exist."},
      {"ERROR(202): Unable to read raw scan line.",
@@ -374,10 +392,12 @@ const InputCase kInputs[] = {
      kDetailsUnreadable,
      kDetailsUnreadable,
      kDetailsUnreadable,
+     kDetailsUnreadable,
      264 % 256},
     {"samples",
      {"--kq", "--config", "lsc.cfg", "--input", "flat.kqraw", "--samples", "%", "--calibrate",
       "cal.txt"},
+     {"ERROR: Cannot open input sample file: %"},
      {"ERROR: Cannot open input sample file: %"},
      {"ERROR: Cannot open input sample file: %"},
      {"ERROR: Input sample file is larger than 64 MiB: %"},
@@ -385,7 +405,8 @@ const InputCase kInputs[] = {
     {"autofocus",
      {"--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate", "cal.txt", "--binary",
       "cal.bin", "--autofocus", "%"},
-     kConfigUnreadable,
+     kConfigDirectory,
+     kConfigMissing,
      kConfigUnreadable,
      kConfigEndless,
      1},
@@ -432,7 +453,8 @@ TEST_P(InputFaults, EndsWithAClearErrorAndNoSuccess) {
 
     const std::vector<std::string>& expected = fault == Fault::kUnreadable ? input.unreadable
                                                : fault == Fault::kEndless  ? input.endless
-                                                                           : input.missing;
+                                               : fault == Fault::kDirectory ? input.directory
+                                                                            : input.missing;
     const int status = input.status >= 0 ? input.status : std::stoi(expected[0].substr(6, 3));
     EXPECT_EQ(result.status, status) << result.out;
     EXPECT_FALSE(hasLine(result.out, "Completed."));

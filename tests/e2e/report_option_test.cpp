@@ -12,7 +12,7 @@ TEST_F(ReportOption, NeedsKq) {
     prepare();
     const auto result = calibrate({"--report", "report.html"});
     EXPECT_EQ(result.status, 1);
-    EXPECT_EQ(result.out, "ERROR: unrecognised option '--report'\n");
+    EXPECT_EQ(result.out, "ERROR: unrecognised option '--report'\n  --report needs --kq\n");
 }
 
 TEST_F(ReportOption, IsWrittenBeforeCompletedAndAddsOnlyItsOwnLine) {

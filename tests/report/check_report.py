@@ -2,7 +2,7 @@
 """Checks the structure of a calibration report page with a real HTML parser.
 
 Usage: check_report.py FILE [--expect ID=TEXT]... [--section ID]... [--absent ID]...
-                            [--figures N] [--verdict pass|fail|incomplete]
+                            [--figures N] [--verdict pass|fail|incomplete|xtest]
 
 Always checked: UTF-8 text; a doctype, html lang, meta charset, a title;
 every element closed in order (void elements excepted, SVG elements may close
