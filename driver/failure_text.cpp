@@ -14,14 +14,12 @@ FailureText error(const std::string& text) {
     return {1, msg::kErrorPrefix + text, false};
 }
 
-// The detail line, indented, after the whole of the error's own text (which
-// may already end with its own line end).
+// The detail line, indented, after the whole of the error's own text. A text
+// that ends with its own line end is printed with the empty line that end
+// makes; the detail comes after it, so the error's lines stay as they were.
 FailureText withDetail(FailureText failure, const std::exception& e) {
-    if (const auto* detail = dynamic_cast<const ErrorDetail*>(&e)) {
-        if (failure.text.empty() || failure.text.back() != '\n')
-            failure.text += '\n';
-        failure.text += kDetailIndent + detail->detail();
-    }
+    if (const auto* detail = dynamic_cast<const ErrorDetail*>(&e))
+        failure.text += std::string("\n") + kDetailIndent + detail->detail();
     return failure;
 }
 

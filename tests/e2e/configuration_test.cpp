@@ -53,7 +53,7 @@ TEST_F(Configuration, ErrorsEndTheRunWithStatusOneBeforeTheImage) {
                              "\";\":\nlsc.max_gain = 6\n  lsc.cfg, line 1\n"},
         {"lsc.max_gain = 6;\n9 = 1;\nlsc.falloff_factor = 1;\n",
          "ERROR: Failed to parse configuration file parameters.\nStopped at: \"9 = 1;\"\n"
-         "  lsc.cfg, line 2\n"},
+         "\n  lsc.cfg, line 2\n"},
     };
     for (const ErrorCase& c : cases) {
         write("lsc.cfg", c.config);

@@ -92,7 +92,11 @@ TEST_P(DetailLines, FollowTheErrorIndentedAndGoWithItUnderQuiet) {
     EXPECT_NE(result.status, 0);
     const auto text = lines(result.out);
     ASSERT_GE(text.size(), 2u) << result.out;
-    EXPECT_EQ(text[text.size() - 2], c.lastLine) << result.out;
+    // A text that ends with its own line end keeps the empty line it makes.
+    std::size_t last = text.size() - 2;
+    if (text[last].empty() && last > 0)
+        --last;
+    EXPECT_EQ(text[last], c.lastLine) << result.out;
     EXPECT_EQ(text.back().substr(0, c.detail.size()), c.detail) << result.out;
 
     // Under --quiet the error's line is suppressed once the messages are
