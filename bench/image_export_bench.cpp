@@ -1,15 +1,16 @@
 // Demosaic and JPEG output of a 12-megapixel sensor image, the path every
 // flattened image takes on its way to the operator.
 
+#include <cstdint>
+#include <cstdio>
+#include <string>
+
+#include <benchmark/benchmark.h>
+
 #include "image/demosaic.h"
 #include "image/image_buffer.h"
 #include "image/image_save.h"
 
-#include <benchmark/benchmark.h>
-
-#include <cstdint>
-#include <cstdio>
-#include <string>
 #include <unistd.h>
 
 namespace {

@@ -56,7 +56,7 @@ struct Module {
     const char* file;
     int width, height;
     const char* order;
-    int blackLevel;  // 10-bit units
+    int blackLevel; // 10-bit units
     int temperatures[3];
 };
 
@@ -140,8 +140,8 @@ bool readRegisterFile(const std::string& text, ProcessingContext& context) {
                           &context.middleFraction};
     for (int i = 0; i < 4; ++i) {
         std::smatch match;
-        if (!std::regex_search(text, match,
-                               std::regex(std::string("\\.") + factorNames[i] + " *= ([0-9.e-]+);")))
+        if (!std::regex_search(
+                text, match, std::regex(std::string("\\.") + factorNames[i] + " *= ([0-9.e-]+);")))
             return false;
         *factors[i] = std::stod(match[1]);
     }
@@ -241,19 +241,19 @@ void BM_RealModule(benchmark::State& state, const Module& module, int temperatur
             state.PauseTiming();
             const Capture& input = capture(module, temperature, seed);
             const FlatField& field = input.field;
-            testing_support::writeFile(input.dir->file("lsc.cfg"),
-                                       "shared.bit_res = 10;\nproc.black_level = " +
-                                           std::to_string(module.blackLevel) + ";\n" +
-                                           setting.config);
+            testing_support::writeFile(
+                input.dir->file("lsc.cfg"),
+                "shared.bit_res = 10;\nproc.black_level = " + std::to_string(module.blackLevel) +
+                    ";\n" + setting.config);
             std::remove(input.dir->file("cal.txt").c_str());
             state.ResumeTiming();
             const auto start = std::chrono::steady_clock::now();
-            const auto result = testing_support::runTool(
-                {"--kq", "--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate", "cal.txt",
-                 "--preproc", "pre.kqraw"},
-                input.dir->path());
-            seconds += std::chrono::duration<double>(std::chrono::steady_clock::now() - start)
-                           .count();
+            const auto result =
+                testing_support::runTool({"--kq", "--config", "lsc.cfg", "--input", "flat.kqraw",
+                                          "--calibrate", "cal.txt", "--preproc", "pre.kqraw"},
+                                         input.dir->path());
+            seconds +=
+                std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
             state.PauseTiming();
             if (result.status != 0) {
                 ++refused;
@@ -270,10 +270,9 @@ void BM_RealModule(benchmark::State& state, const Module& module, int temperatur
             }
             const std::vector<float> gains = gainMap(prepared, fitted);
             const int w = prepared.width(), h = prepared.height();
-            const int factor = 4;  // shared.proc_sampling_factor
+            const int factor = 4; // shared.proc_sampling_factor
             const float black = float(module.blackLevel) / 1023.0f;
-            std::vector<float> exact(gains.size()), corrected(gains.size()),
-                divided(gains.size());
+            std::vector<float> exact(gains.size()), corrected(gains.size()), divided(gains.size());
             for (int y = 0; y < h; ++y)
                 for (int x = 0; x < w; ++x) {
                     const std::size_t at = std::size_t(y) * w + x;

@@ -2,16 +2,17 @@
 // through split, 3 x 3 median filter with down-sampling by 4 and re-weave, as
 // a run with default settings does; beside it the load of the same capture.
 
-#include "image/image_buffer.h"
-#include "prep/bayer_planes.h"
-#include "prep/median_filter.h"
-#include "tests/support/flat_field.h"
-
 #include <cstdint>
 #include <string>
 #include <vector>
 
 #include <benchmark/benchmark.h>
+
+#include "image/image_buffer.h"
+#include "prep/bayer_planes.h"
+#include "prep/median_filter.h"
+#include "tests/support/flat_field.h"
+
 #include <unistd.h>
 
 namespace {
@@ -84,7 +85,8 @@ void BM_LoadKqraw2(benchmark::State& state) {
     shape.width = kWidth;
     shape.height = kHeight;
     shape.noise = 0.01;
-    const std::string bytes = testing_support::kqraw2FileBytes(testing_support::makeFlatField(shape));
+    const std::string bytes =
+        testing_support::kqraw2FileBytes(testing_support::makeFlatField(shape));
     char path[] = "/tmp/prep_bench_XXXXXX";
     const int fd = mkstemp(path);
     if (fd < 0 || write(fd, bytes.data(), bytes.size()) != static_cast<ssize_t>(bytes.size())) {

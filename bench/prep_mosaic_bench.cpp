@@ -2,15 +2,15 @@
 // the default settings (3 x 3 median, down-sampling by 4), beside the same
 // work in three steps (split, filter, weave) that it replaces.
 
-#include "image/image_buffer.h"
-#include "prep/bayer_planes.h"
-#include "prep/median_filter.h"
-#include "prep/mosaic_preparation.h"
-
 #include <cstdint>
 #include <vector>
 
 #include <benchmark/benchmark.h>
+
+#include "image/image_buffer.h"
+#include "prep/bayer_planes.h"
+#include "prep/median_filter.h"
+#include "prep/mosaic_preparation.h"
 
 namespace {
 

@@ -202,9 +202,9 @@ std::string register_file_text(const config_node& config, const std::string& blo
 }
 
 std::string write_register_file(const std::string& path, const config_node& config,
-                         const std::string& blockName, const std::string& controlPointInfix,
-                         const std::string& commandLineText, const ProcessingContext& fit,
-                         const BayerImage& image) {
+                                const std::string& blockName, const std::string& controlPointInfix,
+                                const std::string& commandLineText, const ProcessingContext& fit,
+                                const BayerImage& image) {
     const std::string text =
         register_file_text(config, blockName, controlPointInfix, commandLineText, fit, image);
     OutputFile file;

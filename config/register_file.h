@@ -21,9 +21,9 @@
 // run takes it from here, never from the path, which another process or a
 // device (/dev/null, a pipe) may answer differently.
 std::string write_register_file(const std::string& path, const config_node& config,
-                         const std::string& blockName, const std::string& controlPointInfix,
-                         const std::string& commandLineText, const ProcessingContext& fit,
-                         const BayerImage& image);
+                                const std::string& blockName, const std::string& controlPointInfix,
+                                const std::string& commandLineText, const ProcessingContext& fit,
+                                const BayerImage& image);
 
 // The text alone (same checks, nothing written).
 std::string register_file_text(const config_node& config, const std::string& blockName,

@@ -1,8 +1,8 @@
 #include "driver/autofocus_file.h"
 
-#include "config/config_file.h"
-
 #include <stdexcept>
+
+#include "config/config_file.h"
 
 namespace {
 

@@ -4,9 +4,9 @@
 // balance and control points come from this run's register file and
 // configuration; a file that would change one of them is refused.
 
-#include "config/config_node.h"
-
 #include <string>
+
+#include "config/config_node.h"
 
 // Reads the file at `path` and adds its settings to `config` (the "config"
 // node that already holds the register file). Settings under "module."

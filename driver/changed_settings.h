@@ -1,10 +1,10 @@
 #pragma once
 
-#include "config/config_node.h"
-
 #include <string>
 #include <utility>
 #include <vector>
+
+#include "config/config_node.h"
 
 // Every setting below the "config" node whose value differs from the
 // parameter table's default (or that the table does not know), as (path

@@ -1,16 +1,16 @@
 #include "driver/command_line.h"
 
-#include "driver/driver_messages.h"
-#include "driver/notice.h"
-#include "driver/version.h"
-#include "image/error_detail.h"
-
-#include <boost/program_options.hpp>
-
 #include <cstring>
 #include <sstream>
 #include <stdexcept>
 #include <vector>
+
+#include <boost/program_options.hpp>
+
+#include "driver/driver_messages.h"
+#include "driver/notice.h"
+#include "driver/version.h"
+#include "image/error_detail.h"
 
 namespace po = boost::program_options;
 
@@ -29,60 +29,55 @@ po::typed_value<std::vector<std::string>>* frameNames() {
 
 po::options_description basicOptions() {
     po::options_description options("Options");
-    options.add_options()
-        ("input,i", frameNames(), "The input kqraw bayer image file.")
-        ("inputasjpeg,u", fileName(),
-         "Filename to save the input image file converted into jpeg format.")
-        ("inputasbmp,w", fileName(),
-         "Filename to save the input image file converted into bmp format.")
-        ("raw,r", fileName(),
-         "Indicates that the input image file is a headerless raw input file and specifies the "
-         "text file with the details on the layout of the file.")
-        ("translate,z", fileName(), "Filename to store headerless raw input file in kqraw format.")
-        ("config,c", fileName(), "The input config file used to set various options.")
-        ("calibrate,l", fileName(), "The lens shading calibration register file.")
-        ("autofocus,a", fileName(),
-         "Autofocus calibration data file to include in binary calibration file.")
-        ("binary,b", fileName(), "filename to store binary calibration data.")
-        ("flat,f", fileName(),
-         "The flatten image resulting from applying the lens shading calibration register "
-         "values.")
-        ("jpeg,j", fileName(),
-         "The flatten jpeg image resulting from applying the lens shading calibration register "
-         "values.")
-        ("bmp,m", fileName(),
-         "The flatten bmp image resulting from applying the lens shading calibration register "
-         "values.")
-        ("json", fileName(), "Output run result filename (JSON format).")
-        ("xtest,x", "Generate a surface that causes obvious color distortions for sanity checking.")
-        ("version,V", "Print version string.")
-        ("help,H", "Print this help message.");
+    options.add_options()("input,i", frameNames(), "The input kqraw bayer image file.")(
+        "inputasjpeg,u", fileName(),
+        "Filename to save the input image file converted into jpeg format.")(
+        "inputasbmp,w", fileName(),
+        "Filename to save the input image file converted into bmp format.")(
+        "raw,r", fileName(),
+        "Indicates that the input image file is a headerless raw input file and specifies the "
+        "text file with the details on the layout of the file.")(
+        "translate,z", fileName(), "Filename to store headerless raw input file in kqraw format.")(
+        "config,c", fileName(), "The input config file used to set various options.")(
+        "calibrate,l", fileName(), "The lens shading calibration register file.")(
+        "autofocus,a", fileName(),
+        "Autofocus calibration data file to include in binary calibration file.")(
+        "binary,b", fileName(), "filename to store binary calibration data.")(
+        "flat,f", fileName(),
+        "The flatten image resulting from applying the lens shading calibration register "
+        "values.")(
+        "jpeg,j", fileName(),
+        "The flatten jpeg image resulting from applying the lens shading calibration register "
+        "values.")(
+        "bmp,m", fileName(),
+        "The flatten bmp image resulting from applying the lens shading calibration register "
+        "values.")("json", fileName(), "Output run result filename (JSON format).")(
+        "xtest,x", "Generate a surface that causes obvious color distortions for sanity checking.")(
+        "version,V", "Print version string.")("help,H", "Print this help message.");
     return options;
 }
 
 po::options_description advancedOptions() {
     po::options_description options("Advanced Options");
-    options.add_options()
-        ("kq", "Enable advanced options.")
-        ("samples,s", fileName(), "File containing input samples to process.")
-        ("outsamples,o", fileName(), "File to store samples obtained from input image file.")
-        ("preproc,p", fileName(),
-         "Save the adjusted preprocessed image (input to lens shading algorithm) to the specified "
-         "filename.")
-        ("nodelta,n", "Skip the delta ab check.")
-        ("delta,d", fileName(), "Output delta ab filename (CSV format).")
-        ("stats,t", fileName(), "Output delta ab stats filename (CSV format).")
-        ("log", po::value<std::string>()->default_value("-"),
-         "The name of the output info file.  \"-\" means use stdout.")
-        ("debug", "Enable debug mode.")
-        ("ignore,I",
-         "Ignore HW limits warnings and continue. The default is to stop writing the output "
-         "configuration mid-stream upon encountering a HW limit and return error code 257.")
-        ("quiet,q", "Suppress warning and informational messages.")
-        ("verbose,v", "Output detailed information during processing.")
-        ("report", fileName(), "Output calibration report filename (HTML format).")
-        ("check", fileName(),
-         "Output full-resolution corrected image filename (16-bit TIFF format).");
+    options.add_options()("kq", "Enable advanced options.")(
+        "samples,s", fileName(), "File containing input samples to process.")(
+        "outsamples,o", fileName(), "File to store samples obtained from input image file.")(
+        "preproc,p", fileName(),
+        "Save the adjusted preprocessed image (input to lens shading algorithm) to the specified "
+        "filename.")("nodelta,n", "Skip the delta ab check.")(
+        "delta,d", fileName(), "Output delta ab filename (CSV format).")(
+        "stats,t", fileName(), "Output delta ab stats filename (CSV format).")(
+        "log", po::value<std::string>()->default_value("-"),
+        "The name of the output info file.  \"-\" means use stdout.")("debug",
+                                                                      "Enable debug mode.")(
+        "ignore,I",
+        "Ignore HW limits warnings and continue. The default is to stop writing the output "
+        "configuration mid-stream upon encountering a HW limit and return error code 257.")(
+        "quiet,q", "Suppress warning and informational messages.")(
+        "verbose,v", "Output detailed information during processing.")(
+        "report", fileName(), "Output calibration report filename (HTML format).")(
+        "check", fileName(),
+        "Output full-resolution corrected image filename (16-bit TIFF format).");
     return options;
 }
 

@@ -1,11 +1,11 @@
 #pragma once
 // The two option groups, their parsing and the checks on their combination.
 
-#include <boost/program_options/variables_map.hpp>
-
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include <boost/program_options/variables_map.hpp>
 
 // Frames of one capture that --input may name, averaged before preparation.
 constexpr std::size_t kMaxInputFrames = 16;

@@ -61,8 +61,7 @@ inline constexpr char kDetailsUnreadableHint[] =
     "Likely incorrect file name of headerless raw image details file specified.";
 inline constexpr char kSerialOdd[] = "Serial number must be an even number of characters: ";
 inline constexpr char kSerialTooLong[] = "Serial number cannot be more than 32 characters long: ";
-inline constexpr char kSerialNotHex[] =
-    "Serial number must consist of hexadecimal digits only: ";
+inline constexpr char kSerialNotHex[] = "Serial number must consist of hexadecimal digits only: ";
 inline constexpr char kSerialHint[] =
     "Likely incorrect serial number entered in headerless raw details file.";
 inline constexpr char kRawOpen[] = "Unable to open image file: ";

@@ -32,7 +32,8 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 // go straight into the preparation when it accepts the size: `target` then
 // holds the capture data only, `prepared` the prepared mosaic, and the result
 // is true; `inputStatistics`, if given, then receives the statistics of the
-// input samples, and `rows`, if given, every row of the streamed samples. Throws apan::exception 202, 210, 262, 263, 264.
+// input samples, and `rows`, if given, every row of the streamed samples. Throws apan::exception
+// 202, 210, 262, 263, 264.
 bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
                        const std::string& detailsPath, bool fixedHeader,
                        const prep::MosaicPreparation* preparation = nullptr,

@@ -1,14 +1,14 @@
 #include "driver/run.h"
 
+#include <csignal>
+#include <iostream>
+
 #include "driver/driver_messages.h"
 #include "driver/failure_text.h"
 #include "driver/output_stream.h"
 #include "driver/pipeline.h"
-
 #include "image/output_file.h"
 
-#include <csignal>
-#include <iostream>
 #include <unistd.h>
 
 namespace {

@@ -3,12 +3,12 @@
 // its stages go; the report is written at the end, also after a failure, and
 // then shows what failed and everything computed before.
 
-#include "lsc/processing_context.h"
-
 #include <cstdint>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include "lsc/processing_context.h"
 
 // Per-channel block means of a Bayer image, row-major, blocks x blocks.
 struct ChannelBlockMeans {
@@ -19,17 +19,17 @@ struct ChannelBlockMeans {
 
 struct RunReport {
     // Verdict: empty failure text means the run passed.
-    bool finished = false;          // the run reached "Completed."
-    std::string failedStage;        // what the run was doing when it failed
-    std::string failureMessage;     // the error lines as printed ("ERROR: ...")
-    int exitStatus = 0;             // of a failed run
-    bool xtest = false;             // the register file holds the X-test surface
-    std::vector<std::string> warnings;  // the "WARNING: " lines, without that prefix
+    bool finished = false;             // the run reached "Completed."
+    std::string failedStage;           // what the run was doing when it failed
+    std::string failureMessage;        // the error lines as printed ("ERROR: ...")
+    int exitStatus = 0;                // of a failed run
+    bool xtest = false;                // the register file holds the X-test surface
+    std::vector<std::string> warnings; // the "WARNING: " lines, without that prefix
 
     // The run
-    std::string toolVersion;        // "3.8.1"
-    std::string commandLine;        // arguments after the program name
-    std::vector<std::pair<std::string, std::string>> changedSettings;  // key, value
+    std::string toolVersion; // "3.8.1"
+    std::string commandLine; // arguments after the program name
+    std::vector<std::pair<std::string, std::string>> changedSettings; // key, value
 
     // The input files named on the command line (option, path), in order
     std::vector<std::pair<std::string, std::string>> inputFiles;
@@ -42,7 +42,7 @@ struct RunReport {
     std::string serialNumber;
     int framesAveraged = 1;
     std::int32_t width = 0, height = 0;
-    std::string bayerOrder;         // "RGGB", ...
+    std::string bayerOrder; // "RGGB", ...
     int bitDepth = 0;
     float exposureTime = 0.0f;
     float gains[kChannels] = {0, 0, 0, 0};
@@ -54,9 +54,9 @@ struct RunReport {
 
     // The fit
     bool haveFit = false;
-    double fractions[4] = {0.25, 0.5, 0.25, 0.5};  // left, centre, top, middle
+    double fractions[4] = {0.25, 0.5, 0.25, 0.5}; // left, centre, top, middle
     float controlGrids[kChannels][kGridPoints] = {};
-    std::vector<std::pair<std::uint32_t, std::uint32_t>> samplePoints;  // prepared-image pixels
+    std::vector<std::pair<std::uint32_t, std::uint32_t>> samplePoints; // prepared-image pixels
     float targetLevels[kChannels] = {0, 0, 0, 0};
     bool haveFitError = false;
     float deviationMax[kChannels] = {0, 0, 0, 0};
@@ -65,15 +65,15 @@ struct RunReport {
 
     // After the correction and white balance
     bool haveResidual = false;
-    ChannelBlockMeans residualAfter;  // relative deviation from each channel's mean
+    ChannelBlockMeans residualAfter; // relative deviation from each channel's mean
     bool haveWhiteBalance = false;
-    float measuredRatios[2] = {0, 0};   // R/G, B/G before correction (target levels)
-    float flattenedRatios[2] = {0, 0};  // R/G, B/G after white balance
+    float measuredRatios[2] = {0, 0};  // R/G, B/G before correction (target levels)
+    float flattenedRatios[2] = {0, 0}; // R/G, B/G after white balance
 
     // Luminance residual of the white-balanced image over the delta-ab grid
     bool haveLuma = false;
-    float lumaResidual = 0.0f;  // fraction
-    float lumaBound = 0.0f;     // per cent; 0: no bound
+    float lumaResidual = 0.0f; // fraction
+    float lumaBound = 0.0f;    // per cent; 0: no bound
 
     // Delta ab, when the stage ran
     bool haveDelta = false;

@@ -2,15 +2,15 @@
 // What the driver takes from the command line and the configuration once,
 // before the run starts.
 
+#include <string>
+
 #include "config/config_node.h"
 #include "driver/command_line.h"
 
-#include <string>
-
 struct RunSettings {
     // File options (empty: not given)
-    std::string input, inputAsJpeg, inputAsBmp, raw, translate, preproc, log, autofocus,
-        calibrate, samples, outSamples, flat, jpeg, bmp, delta, stats, binary;
+    std::string input, inputAsJpeg, inputAsBmp, raw, translate, preproc, log, autofocus, calibrate,
+        samples, outSamples, flat, jpeg, bmp, delta, stats, binary;
     // Flags
     bool quiet = false, xtest = false, noDelta = false, debug = false;
     // Configuration

@@ -1,12 +1,12 @@
 #include "image/bmp_writer.h"
 
-#include "image/image_result.h"
-#include "image/output_file.h"
-
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+
+#include "image/image_result.h"
+#include "image/output_file.h"
 
 namespace {
 
@@ -102,8 +102,8 @@ int bmpWrite(const char* path, const ImageBuffer* image) noexcept {
     for (std::int32_t y = image->height - 1; written && y >= 0; --y) {
         fillRow(row, pixels + static_cast<std::uint64_t>(y) * rowBytes,
                 static_cast<std::size_t>(width), samples);
-        written = std::fwrite(row, 1, static_cast<std::size_t>(paddedRow), file.stream()) ==
-                  paddedRow;
+        written =
+            std::fwrite(row, 1, static_cast<std::size_t>(paddedRow), file.stream()) == paddedRow;
     }
     if (!written)
         return img::kIoError;

@@ -1,9 +1,9 @@
 #include "image/demosaic.h"
 
-#include "image/image_result.h"
-
 #include <cstddef>
 #include <cstdint>
+
+#include "image/image_result.h"
 
 namespace {
 
@@ -15,11 +15,16 @@ int bayerPhase(std::uint32_t cfa0, std::uint32_t cfa1) {
     if (cfa0 != 0)
         return -1;
     switch (cfa1) {
-    case kCfaRggb: return 0;
-    case kCfaGrbg: return 1;
-    case kCfaGbrg: return 2;
-    case kCfaBggr: return 3;
-    default: return -1;
+    case kCfaRggb:
+        return 0;
+    case kCfaGrbg:
+        return 1;
+    case kCfaGbrg:
+        return 2;
+    case kCfaBggr:
+        return 3;
+    default:
+        return -1;
     }
 }
 
@@ -39,7 +44,7 @@ std::size_t mirror(std::ptrdiff_t index, std::size_t size) {
 // 1.0 is 255. Below zero and NaN give 0: a corrected value slightly under the
 // black level must not wrap round to a bright pixel.
 [[gnu::always_inline]] inline std::uint8_t toByte(float value) {
-    const float positive = value > 0.0f ? value : 0.0f;  // written so that NaN gives 0
+    const float positive = value > 0.0f ? value : 0.0f; // written so that NaN gives 0
     const float scaled = positive * 255.0f + 0.5f;
     return static_cast<std::uint8_t>(scaled < 255.0f ? scaled : 255.0f);
 }
@@ -53,9 +58,8 @@ struct RowNeighbours {
 // Inlined, with the row pointers passed by value, so that the byte stores
 // cannot make the compiler reload them for every pixel.
 template <int S>
-[[gnu::always_inline]] inline void interpolate(RowNeighbours rows, std::size_t left,
-                                               std::size_t x, std::size_t right,
-                                               std::uint8_t* rgb) {
+[[gnu::always_inline]] inline void interpolate(RowNeighbours rows, std::size_t left, std::size_t x,
+                                               std::size_t right, std::uint8_t* rgb) {
     const float centre = rows.mid[x];
     if constexpr (S == kRed || S == kBlue) {
         const float cross = (rows.up[x] + rows.down[x] + rows.mid[left] + rows.mid[right]) * 0.25f;
@@ -111,8 +115,7 @@ ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept {
         *result = img::kWrongFormat;
         return nullptr;
     }
-    if (!source->data || source->width < 1 || source->height < 1 ||
-        source->numberOfImages < 1) {
+    if (!source->data || source->width < 1 || source->height < 1 || source->numberOfImages < 1) {
         *result = img::kSizeMismatch;
         return nullptr;
     }
@@ -132,10 +135,18 @@ ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept {
         std::uint8_t* rgbRow = out + 3 * y * width;
         const int rowSite = ((static_cast<int>(y % 2) + (phase >> 1)) & 1) * 2;
         switch (rowSite + (phase & 1)) {
-        case kRed: demosaicRow<kRed, kGreenOnRedRow>(rows, width, rgbRow); break;
-        case kGreenOnRedRow: demosaicRow<kGreenOnRedRow, kRed>(rows, width, rgbRow); break;
-        case kGreenOnBlueRow: demosaicRow<kGreenOnBlueRow, kBlue>(rows, width, rgbRow); break;
-        default: demosaicRow<kBlue, kGreenOnBlueRow>(rows, width, rgbRow); break;
+        case kRed:
+            demosaicRow<kRed, kGreenOnRedRow>(rows, width, rgbRow);
+            break;
+        case kGreenOnRedRow:
+            demosaicRow<kGreenOnRedRow, kRed>(rows, width, rgbRow);
+            break;
+        case kGreenOnBlueRow:
+            demosaicRow<kGreenOnBlueRow, kBlue>(rows, width, rgbRow);
+            break;
+        default:
+            demosaicRow<kBlue, kGreenOnBlueRow>(rows, width, rgbRow);
+            break;
         }
     }
     *result = img::kOk;

@@ -3,12 +3,12 @@
 // formatters they share. Every number goes through these formatters or
 // through integer conversions, so no file depends on the process locale.
 
-#include "image/image_buffer.h"
-
 #include <charconv>
 #include <cstdio>
 #include <cstring>
 #include <string>
+
+#include "image/image_buffer.h"
 
 namespace img::exportText {
 
@@ -76,10 +76,18 @@ inline void appendChannelLevels(std::string& text, const ImageBuffer& image, Lev
         if (c > 0 || leadingSpace)
             text += ' ';
         switch (field) {
-        case LevelField::kBlackVal: appendFixed(text, image.level[c].blackVal); break;
-        case LevelField::kWhiteVal: appendFixed(text, image.level[c].whiteVal); break;
-        case LevelField::kMinClip: appendFixed(text, image.clip[c].minClip); break;
-        case LevelField::kMaxClip: appendFixed(text, image.clip[c].maxClip); break;
+        case LevelField::kBlackVal:
+            appendFixed(text, image.level[c].blackVal);
+            break;
+        case LevelField::kWhiteVal:
+            appendFixed(text, image.level[c].whiteVal);
+            break;
+        case LevelField::kMinClip:
+            appendFixed(text, image.clip[c].minClip);
+            break;
+        case LevelField::kMaxClip:
+            appendFixed(text, image.clip[c].maxClip);
+            break;
         }
     }
 }

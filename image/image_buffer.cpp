@@ -1,11 +1,12 @@
 #include "image/image_buffer.h"
 
+#include <cstdlib>
+#include <cstring>
+
 #include "image/image_result.h"
 #include "image/kqraw_container.h"
 #include "image/sample_memory.h"
 
-#include <cstdlib>
-#include <cstring>
 #include <strings.h>
 
 namespace {
@@ -33,7 +34,7 @@ bool sampleBlockBytes(const ImageBuffer* image, std::uint64_t* bytes) {
     for (int plane = 0; plane < image->samplesPerPixel; ++plane) {
         std::uint64_t w, h;
         planeDimensions(image, plane, &w, &h);
-        if (w * h > UINT64_MAX - samples)  // each factor is below 2^31
+        if (w * h > UINT64_MAX - samples) // each factor is below 2^31
             return false;
         samples += w * h;
     }
@@ -69,11 +70,15 @@ const char* nameOf(std::uint32_t value, const char* const* names, std::uint32_t 
 
 std::size_t imageSampleBytes(std::uint32_t dataType) noexcept {
     switch (dataType) {
-    case kDataUint8: return 1;
-    case kDataUint16: return 2;
+    case kDataUint8:
+        return 1;
+    case kDataUint16:
+        return 2;
     case kDataInt32:
-    case kDataReal32: return 4;
-    default: return 0;
+    case kDataReal32:
+        return 4;
+    default:
+        return 0;
     }
 }
 
@@ -104,7 +109,9 @@ ImageBuffer* imageCreate(std::int32_t width, std::int32_t height, std::uint16_t 
         *result = img::kNoMemory;
         return nullptr;
     }
-    const std::uint16_t widthOfType = dataType == kDataUint8 ? 8 : dataType == kDataUint16 ? 16 : 32;
+    const std::uint16_t widthOfType = dataType == kDataUint8    ? 8
+                                      : dataType == kDataUint16 ? 16
+                                                                : 32;
     image->width = width;
     image->height = height;
     image->bitsPerSample = bitsPerSample < widthOfType ? bitsPerSample : widthOfType;
@@ -279,14 +286,14 @@ bool imageIsEightBitDisplay(const ImageBuffer* image) noexcept {
 }
 
 const char* pixelTypeName(std::uint32_t value) noexcept {
-    static const char* const names[] = {"NONE", "OTHER", "RAW", "MONO",
+    static const char* const names[] = {"NONE", "OTHER", "RAW",    "MONO",
                                         "RGB",  "YUV",   "YUV422", "YUV420"};
     return nameOf(value, names, 8);
 }
 
 const char* bufferTypeName(std::uint32_t value) noexcept {
-    static const char* const names[] = {"NONE", "OTHER", "RAW_CFA", "RAW_SPLIT", "INTERLEAVED",
-                                        "PLANAR"};
+    static const char* const names[] = {"NONE",      "OTHER",       "RAW_CFA",
+                                        "RAW_SPLIT", "INTERLEAVED", "PLANAR"};
     return nameOf(value, names, 6);
 }
 

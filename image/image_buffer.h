@@ -8,18 +8,38 @@
 #include <memory>
 
 enum PixelType : std::uint32_t {
-    kPixelNone = 0, kPixelOther = 1, kPixelRaw = 2, kPixelMono = 3,
-    kPixelRgb = 4, kPixelYuv = 5, kPixelYuv422 = 6, kPixelYuv420 = 7,
+    kPixelNone = 0,
+    kPixelOther = 1,
+    kPixelRaw = 2,
+    kPixelMono = 3,
+    kPixelRgb = 4,
+    kPixelYuv = 5,
+    kPixelYuv422 = 6,
+    kPixelYuv420 = 7,
 };
 enum BufferType : std::uint32_t {
-    kBufferNone = 0, kBufferOther = 1, kBufferRawCfa = 2, kBufferRawSplit = 3,
-    kBufferInterleaved = 4, kBufferPlanar = 5,
+    kBufferNone = 0,
+    kBufferOther = 1,
+    kBufferRawCfa = 2,
+    kBufferRawSplit = 3,
+    kBufferInterleaved = 4,
+    kBufferPlanar = 5,
 };
 enum DataType : std::uint32_t {
-    kDataNone = 0, kDataOther = 1, kDataUint8 = 2, kDataUint16 = 3, kDataInt32 = 4, kDataReal32 = 5,
+    kDataNone = 0,
+    kDataOther = 1,
+    kDataUint8 = 2,
+    kDataUint16 = 3,
+    kDataInt32 = 4,
+    kDataReal32 = 5,
 };
 enum FileType : std::uint32_t {
-    kFileNone = 0, kFileOther = 1, kFileFixRaw = 2, kFileKqRaw = 3, kFileKqRaw2 = 4, kFileNkRaw = 5,
+    kFileNone = 0,
+    kFileOther = 1,
+    kFileFixRaw = 2,
+    kFileKqRaw = 3,
+    kFileKqRaw2 = 4,
+    kFileNkRaw = 5,
 };
 
 // The four Bayer orders as the second cfa word (first word 0).
@@ -62,7 +82,7 @@ struct ImageBuffer {
     ClipPair clip[4];
     std::uint32_t fileType;
     MetadataEntry* metadata;
-    void* rawHeader;  // KqRawFixedHeader, KqRawContainer or NKRAW block, by fileType
+    void* rawHeader; // KqRawFixedHeader, KqRawContainer or NKRAW block, by fileType
 };
 
 // Creates an image and its sample block. Result in *result: 0, -1 (width or

@@ -14,7 +14,7 @@ constexpr int kFormatKqRaw2 = 4;
 constexpr int kFormatTiff = 6;
 constexpr int kFormatBmp = 7;
 constexpr int kFormatJpeg = 8;
-constexpr int kFormatPnm = 9;  // binary PPM (three samples) or PGM (one sample)
+constexpr int kFormatPnm = 9; // binary PPM (three samples) or PGM (one sample)
 
 constexpr int kDefaultJpegQuality = 90;
 

@@ -1,9 +1,5 @@
 #include "image/jpeg_writer.h"
 
-#include "image/export_messages.h"
-#include "image/image_result.h"
-#include "image/output_file.h"
-
 #include <csetjmp>
 #include <cstdint>
 #include <cstdio>
@@ -12,6 +8,10 @@
 #include <vector>
 
 #include <jpeglib.h>
+
+#include "image/export_messages.h"
+#include "image/image_result.h"
+#include "image/output_file.h"
 
 namespace {
 
@@ -27,7 +27,8 @@ struct JumpingErrorManager {
 }
 
 // The library reports through result codes, never on the console.
-void stayQuiet(j_common_ptr) {}
+void stayQuiet(j_common_ptr) {
+}
 
 // Everything compress() touches lives here, outside its frame, so nothing it
 // needs after a long jump is a local that the jump could leave indeterminate.
@@ -67,8 +68,7 @@ int compress(JpegJob* job) {
     for (std::size_t i = 0; i < job->commentCount; ++i) {
         const std::string& comment = job->comments[i];
         // A text longer than one marker holds makes the library fail (-2).
-        jpeg_write_marker(compressor, JPEG_COM,
-                          reinterpret_cast<const JOCTET*>(comment.data()),
+        jpeg_write_marker(compressor, JPEG_COM, reinterpret_cast<const JOCTET*>(comment.data()),
                           static_cast<unsigned int>(comment.size()));
     }
 

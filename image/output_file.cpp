@@ -5,6 +5,7 @@
 #include <csignal>
 #include <cstdlib>
 #include <cstring>
+
 #include <sys/stat.h>
 #include <unistd.h>
 

@@ -36,8 +36,8 @@ public:
 private:
     std::FILE* stream_ = nullptr;
     std::string target_;
-    std::string temporary_;  // empty for a direct write
-    int registrySlot_ = -1;  // this file's entry among the live temporaries
+    std::string temporary_; // empty for a direct write
+    int registrySlot_ = -1; // this file's entry among the live temporaries
 };
 
 // Removes every temporary file of this process that is not yet committed or

@@ -1,15 +1,15 @@
 #include "image/ppm_writer.h"
 
-#include "image/export_messages.h"
-#include "image/image_result.h"
-#include "image/output_file.h"
-
 #include <cmath>
 #include <cstdint>
 #include <cstring>
 #include <new>
 #include <string>
 #include <vector>
+
+#include "image/export_messages.h"
+#include "image/image_result.h"
+#include "image/output_file.h"
 
 namespace {
 
@@ -44,7 +44,8 @@ void appendMetadataComment(std::string& header, const MetadataEntry& entry) {
 std::string buildHeader(const ImageBuffer& image, std::uint32_t maxValue) {
     std::string header = image.samplesPerPixel == 1 ? "P5\n" : "P6\n";
     text::appendFormatted(header, text::kPnmNumberOfImages, image.numberOfImages);
-    text::appendFormatted(header, text::kPnmSamplesPerPixel, static_cast<int>(image.samplesPerPixel));
+    text::appendFormatted(header, text::kPnmSamplesPerPixel,
+                          static_cast<int>(image.samplesPerPixel));
     text::appendFormatted(header, text::kPnmPixelType, pixelTypeName(image.pixelType));
     // The pattern means something only for sensor images.
     if (image.pixelType == kPixelRaw)
@@ -81,10 +82,10 @@ std::uint32_t toLevel(std::int32_t value, std::uint32_t maxValue) {
     if (value <= 0)
         return 0;
     return static_cast<std::uint32_t>(value) < maxValue ? static_cast<std::uint32_t>(value)
-                                                          : maxValue;
+                                                        : maxValue;
 }
 std::uint32_t toLevel(float value, std::uint32_t maxValue) {
-    if (!(value > 0.0f))  // negative or NaN
+    if (!(value > 0.0f)) // negative or NaN
         return 0;
     const float scaled = value * static_cast<float>(maxValue) + 0.5f;
     return scaled >= static_cast<float>(maxValue) ? maxValue : static_cast<std::uint32_t>(scaled);
@@ -102,8 +103,8 @@ void convertRow(const ImageBuffer& image, std::uint32_t y, std::uint32_t maxValu
     const bool wide = maxValue > 255;
     for (std::uint64_t x = 0; x < width; ++x) {
         for (std::uint64_t s = 0; s < count; ++s) {
-            const std::uint64_t index = planar ? s * planeSize + y * width + x
-                                               : (y * width + x) * count + s;
+            const std::uint64_t index =
+                planar ? s * planeSize + y * width + x : (y * width + x) * count + s;
             const std::uint32_t level = toLevel(samples[index], maxValue);
             if (wide)
                 *out++ = static_cast<std::uint8_t>(level >> 8);
@@ -115,10 +116,18 @@ void convertRow(const ImageBuffer& image, std::uint32_t y, std::uint32_t maxValu
 void convertRow(const ImageBuffer& image, std::uint32_t y, std::uint32_t maxValue,
                 std::uint8_t* out) {
     switch (image.dataType) {
-    case kDataUint8: convertRow<std::uint8_t>(image, y, maxValue, out); break;
-    case kDataUint16: convertRow<std::uint16_t>(image, y, maxValue, out); break;
-    case kDataInt32: convertRow<std::int32_t>(image, y, maxValue, out); break;
-    default: convertRow<float>(image, y, maxValue, out); break;
+    case kDataUint8:
+        convertRow<std::uint8_t>(image, y, maxValue, out);
+        break;
+    case kDataUint16:
+        convertRow<std::uint16_t>(image, y, maxValue, out);
+        break;
+    case kDataInt32:
+        convertRow<std::int32_t>(image, y, maxValue, out);
+        break;
+    default:
+        convertRow<float>(image, y, maxValue, out);
+        break;
     }
 }
 

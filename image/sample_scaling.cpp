@@ -29,8 +29,7 @@ void normalise(const Sample* in, std::uint64_t count, unsigned bits, float* out)
 // [4i, 4i + 4), which hold no sample below index i, so every sample is read
 // before its bytes are written; a chunk is copied out first so that the
 // loop works on separate memory.
-template <typename Sample>
-void normaliseInPlace(void* block, std::uint64_t count, unsigned bits) {
+template <typename Sample> void normaliseInPlace(void* block, std::uint64_t count, unsigned bits) {
     constexpr std::uint64_t kChunk = 4096;
     Sample chunk[kChunk];
     auto* bytes = static_cast<unsigned char*>(block);
@@ -39,7 +38,8 @@ void normaliseInPlace(void* block, std::uint64_t count, unsigned bits) {
     while (end > 0) {
         const std::uint64_t begin = end > kChunk ? end - kChunk : 0;
         const std::uint64_t n = end - begin;
-        std::memcpy(chunk, bytes + begin * sizeof(Sample), static_cast<std::size_t>(n) * sizeof(Sample));
+        std::memcpy(chunk, bytes + begin * sizeof(Sample),
+                    static_cast<std::size_t>(n) * sizeof(Sample));
         normalise(chunk, n, bits, out + begin);
         end = begin;
     }

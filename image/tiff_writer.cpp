@@ -1,19 +1,20 @@
 #include "image/tiff_writer.h"
 
-#include "image/export_messages.h"
-#include "image/image_result.h"
-#include "image/output_file.h"
-
 #include <cstdarg>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <new>
-#include <sys/stat.h>
-#include <sys/types.h>
 #include <vector>
 
 #include <tiffio.h>
+
+#include "image/export_messages.h"
+#include "image/image_result.h"
+#include "image/output_file.h"
+
+#include <sys/stat.h>
+#include <sys/types.h>
 
 namespace {
 
@@ -27,16 +28,16 @@ struct StreamTarget {
 tmsize_t readFromStream(thandle_t handle, void* buffer, tmsize_t size) {
     auto* target = static_cast<StreamTarget*>(handle);
     return size <= 0 ? 0
-                     : static_cast<tmsize_t>(std::fread(buffer, 1, static_cast<std::size_t>(size),
-                                                        target->stream));
+                     : static_cast<tmsize_t>(
+                           std::fread(buffer, 1, static_cast<std::size_t>(size), target->stream));
 }
 
 tmsize_t writeToStream(thandle_t handle, void* buffer, tmsize_t size) {
     auto* target = static_cast<StreamTarget*>(handle);
     if (size <= 0)
         return 0;
-    const std::size_t written = std::fwrite(buffer, 1, static_cast<std::size_t>(size),
-                                            target->stream);
+    const std::size_t written =
+        std::fwrite(buffer, 1, static_cast<std::size_t>(size), target->stream);
     if (written != static_cast<std::size_t>(size))
         target->failed = true;
     return static_cast<tmsize_t>(written);
@@ -67,7 +68,8 @@ int noMapping(thandle_t, void**, toff_t*) {
     return 0;
 }
 
-void noUnmapping(thandle_t, void*, toff_t) {}
+void noUnmapping(thandle_t, void*, toff_t) {
+}
 
 #if TIFFLIB_VERSION >= 20221213
 // Errors and warnings end up in the result code, not on the console.
@@ -133,7 +135,8 @@ bool writeRows(TIFF* tiff, const ImageBuffer& image, std::uint8_t* row) {
     const int planes = planar ? image.samplesPerPixel : 1;
     const std::uint64_t rowBytes = width * sampleBytes * (planar ? 1 : image.samplesPerPixel);
     for (int plane = 0; plane < planes; ++plane) {
-        const std::uint8_t* planeStart = data + static_cast<std::uint64_t>(plane) * height * rowBytes;
+        const std::uint8_t* planeStart =
+            data + static_cast<std::uint64_t>(plane) * height * rowBytes;
         for (std::uint32_t y = 0; y < height; ++y) {
             std::memcpy(row, planeStart + y * rowBytes, static_cast<std::size_t>(rowBytes));
             if (TIFFWriteScanline(tiff, row, y, static_cast<std::uint16_t>(plane)) != 1)
@@ -199,9 +202,9 @@ int tiffWrite(const char* path, const ImageBuffer* image) noexcept {
     if (!tiff)
         return img::kIoError;
     bool ok = setTags(tiff, *image, description.c_str());
-    const std::uint64_t expectedRow = static_cast<std::uint64_t>(image->width) *
-                                      imageSampleBytes(image->dataType) *
-                                      (image->bufferType == kBufferPlanar ? 1 : image->samplesPerPixel);
+    const std::uint64_t expectedRow =
+        static_cast<std::uint64_t>(image->width) * imageSampleBytes(image->dataType) *
+        (image->bufferType == kBufferPlanar ? 1 : image->samplesPerPixel);
     // The scanline libtiff expects must be exactly one row of the image (and
     // addressable here, which a 32-bit host may not manage).
     ok = ok && expectedRow <= static_cast<std::uint64_t>(PTRDIFF_MAX) &&

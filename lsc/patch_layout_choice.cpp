@@ -120,7 +120,7 @@ LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& s
             trial.image.copy(prepared);
             collectSamples(trial, quiet);
             fitLensShading(trial, quiet);
-            trial.image.copy(prepared);  // the fit took the black level out of its copy
+            trial.image.copy(prepared); // the fit took the black level out of its copy
             applyLensShading(trial);
             flatness = correctedFlatness(trial.corrected, kTrialChannel);
         } catch (const std::bad_alloc&) {

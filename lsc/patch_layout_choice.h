@@ -11,7 +11,7 @@
 #include "lsc/processing_context.h"
 
 struct PatchLayout {
-    double left, center, top, middle;  // fractions of width and height
+    double left, center, top, middle; // fractions of width and height
 };
 
 // The configured layout (from `settings`) first, then the symmetric layouts
@@ -29,15 +29,15 @@ double correctedFlatness(const BayerImage& corrected, int channel = -1);
 
 struct LayoutChoice {
     PatchLayout layout;
-    std::size_t index = 0;           // in candidateLayouts; 0: the configured one
-    std::size_t candidates = 0;      // how many were tried
-    std::vector<double> flatness;    // per candidate; negative when its fit failed
+    std::size_t index = 0;        // in candidateLayouts; 0: the configured one
+    std::size_t candidates = 0;   // how many were tried
+    std::vector<double> flatness; // per candidate; negative when its fit failed
 };
 
 // Collects the samples (at half the grid's density along each axis), fits
 // and corrects the prepared image (black level included, as the run holds
 // it) with each candidate, using the fit settings of `settings` quietly but
-// for green/red alone, and picks the one that leaves green/red flattest; a candidate whose fit fails
-// is skipped, and when all fail the configured layout stays (the run's own
-// fit then reports why). The first of equally flat candidates wins.
+// for green/red alone, and picks the one that leaves green/red flattest; a candidate whose fit
+// fails is skipped, and when all fail the configured layout stays (the run's own fit then reports
+// why). The first of equally flat candidates wins.
 LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& settings);

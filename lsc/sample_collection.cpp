@@ -9,8 +9,8 @@
 
 #include "lsc/bayer_phase.h"
 #include "lsc/lsc_messages.h"
-#include "lsc/sample_limit.h"
 #include "lsc/patch_geometry.h"
+#include "lsc/sample_limit.h"
 #include "lsc/sample_window.h"
 #include "lsc/target_levels.h"
 #include "lsc/working_image.h"

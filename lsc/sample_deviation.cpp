@@ -55,7 +55,8 @@ double bend(const double t[3], const float v[3], int sample) {
         value = 2.0 * std::fabs(f[1] - line);
     } else {
         const int near = 1, far = sample == 0 ? 2 : 0;
-        const double line = f[near] + (f[near] - f[far]) * (t[sample] - t[near]) / (t[near] - t[far]);
+        const double line =
+            f[near] + (f[near] - f[far]) * (t[sample] - t[near]) / (t[near] - t[far]);
         value = std::fabs(f[sample] - line);
     }
     return std::isfinite(value) ? value : kInfinity;
@@ -69,8 +70,7 @@ void measureSampleDeviations(const WorkingImage& image, const std::vector<shadin
     const int window = std::max(kCheckWindow, sampleWindow);
     const int phase = bayerPhase(image.cfa);
     auto medianLevels = [&](std::int64_t x, std::int64_t y, float levels[kChannels]) {
-        windowMedians(image, phase, std::uint32_t(x) & ~1u, std::uint32_t(y) & ~1u, window,
-                      levels);
+        windowMedians(image, phase, std::uint32_t(x) & ~1u, std::uint32_t(y) & ~1u, window, levels);
         for (int k = 0; k < kChannels; ++k)
             levels[k] = std::max(0.0f, levels[k] - blackLevel);
     };

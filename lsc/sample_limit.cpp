@@ -1,8 +1,8 @@
 #include "lsc/sample_limit.h"
 
-#include "lsc/lsc_messages.h"
-
 #include <stdexcept>
+
+#include "lsc/lsc_messages.h"
 
 namespace lsc {
 

@@ -1,11 +1,11 @@
 #include "prep/bayer_planes.h"
 
+#include <cstring>
+#include <stdexcept>
+
 #include "image/image_messages.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
-
-#include <cstring>
-#include <stdexcept>
 
 namespace prep {
 namespace {
@@ -122,17 +122,16 @@ BayerImage weave(const BayerImage& planes, int p, std::uint32_t cfa0, std::uint3
     if (width > INT32_MAX || height > INT32_MAX)
         throw std::runtime_error(img::msg::kCannotAllocateImage);
 
-    BayerImage mosaic = createFloatImage(static_cast<std::int32_t>(width),
-                                         static_cast<std::int32_t>(height), planes.bitsPerSample(),
-                                         1, cfa0, cfa1, kPixelRaw, kBufferRawCfa);
+    BayerImage mosaic =
+        createFloatImage(static_cast<std::int32_t>(width), static_cast<std::int32_t>(height),
+                         planes.bitsPerSample(), 1, cfa0, cfa1, kPixelRaw, kBufferRawCfa);
     const float* in = planes.pixels();
     float* out = mosaic.pixels();
     const std::size_t planeWidth = static_cast<std::size_t>(planes.width());
     const std::size_t channels = planes.channels();
     const std::size_t mosaicWidth = static_cast<std::size_t>(width);
     if (p == 2) {
-        weaveTwoByTwo(in, planeWidth, static_cast<std::size_t>(planes.height()), out,
-                      mosaicWidth);
+        weaveTwoByTwo(in, planeWidth, static_cast<std::size_t>(planes.height()), out, mosaicWidth);
         return mosaic;
     }
     for (std::size_t y = 0; y < static_cast<std::size_t>(planes.height()); ++y) {

@@ -8,9 +8,9 @@
 // sample (x, y, k) is at index (y * width + x) * channels + k. Channel
 // k = r * p + c holds the mosaic pixel at column p * x + c, row p * y + r.
 
-#include "image/bayer_image.h"
-
 #include <cstdint>
+
+#include "image/bayer_image.h"
 
 namespace prep {
 

@@ -1,18 +1,18 @@
 #include "prep/delta_ab.h"
 
-#include "lsc/bayer_phase.h"
-#include "prep/prep_image.h"
-#include "prep/prep_messages.h"
-
 #include <cmath>
 #include <cstddef>
 #include <stdexcept>
 #include <vector>
 
+#include "lsc/bayer_phase.h"
+#include "prep/prep_image.h"
+#include "prep/prep_messages.h"
+
 namespace prep {
 namespace {
 
-constexpr float kGamma = 0.45454544f;  // 1 / 2.2
+constexpr float kGamma = 0.45454544f; // 1 / 2.2
 
 // Offset (dx, dy) within each 2 x 2 block of the pixel of `channel`.
 void channelOffset(int channel, int phase, int& dx, int& dy) {

@@ -1,13 +1,13 @@
 #include "prep/delta_ab_report.h"
 
-#include "image/output_file.h"
-#include "prep/prep_messages.h"
-
 #include <cstdio>
 #include <iomanip>
 #include <locale>
 #include <sstream>
 #include <stdexcept>
+
+#include "image/output_file.h"
+#include "prep/prep_messages.h"
 
 namespace prep {
 namespace {
@@ -30,10 +30,10 @@ void writeReport(const std::string& path, const std::string& text) {
 } // namespace
 
 std::string formatDeltaFile(const ProcessingContext& context) {
-    const std::size_t columns = static_cast<std::size_t>(
-        context.deltaAbBlocks[0] > 0 ? context.deltaAbBlocks[0] : 0);
-    const std::size_t rows = static_cast<std::size_t>(
-        context.deltaAbBlocks[1] > 0 ? context.deltaAbBlocks[1] : 0);
+    const std::size_t columns =
+        static_cast<std::size_t>(context.deltaAbBlocks[0] > 0 ? context.deltaAbBlocks[0] : 0);
+    const std::size_t rows =
+        static_cast<std::size_t>(context.deltaAbBlocks[1] > 0 ? context.deltaAbBlocks[1] : 0);
     if (context.deltaImage.size() != columns * rows)
         throw std::invalid_argument(msg::kDeltaGridMismatch);
     std::ostringstream text = reportText();

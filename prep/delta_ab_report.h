@@ -1,9 +1,9 @@
 #pragma once
 // The delta ab files and the acceptance threshold.
 
-#include "lsc/processing_context.h"
-
 #include <string>
+
+#include "lsc/processing_context.h"
 
 namespace prep {
 

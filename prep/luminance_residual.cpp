@@ -46,8 +46,7 @@ float luminanceResidual(const ProcessingContext& context) {
     for (unsigned dy = 0; dy < 2; ++dy)
         for (unsigned dx = 0; dx < 2; ++dx) {
             const int k = bayerChannel(dx, dy, phase);
-            channelWeight[dy][dx] =
-                k == 0 ? weightOf[0] : k == 3 ? weightOf[2] : 0.5 * weightOf[1];
+            channelWeight[dy][dx] = k == 0 ? weightOf[0] : k == 3 ? weightOf[2] : 0.5 * weightOf[1];
         }
 
     std::vector<double> sums(static_cast<std::size_t>(columns) * rows, 0.0);
@@ -57,10 +56,9 @@ float luminanceResidual(const ProcessingContext& context) {
         const float* bottom = top + width;
         double* row = sums.data() + py / blockHeight * columns;
         for (std::size_t px = 0; px < blockWidth * columns; ++px)
-            row[px / blockWidth] += channelWeight[0][0] * top[2 * px] +
-                                    channelWeight[0][1] * top[2 * px + 1] +
-                                    channelWeight[1][0] * bottom[2 * px] +
-                                    channelWeight[1][1] * bottom[2 * px + 1];
+            row[px / blockWidth] +=
+                channelWeight[0][0] * top[2 * px] + channelWeight[0][1] * top[2 * px + 1] +
+                channelWeight[1][0] * bottom[2 * px] + channelWeight[1][1] * bottom[2 * px + 1];
     }
     double mean = 0.0;
     for (double sum : sums)

@@ -1,20 +1,20 @@
 #include "prep/median_filter.h"
 
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <stdexcept>
+
 #include "prep/bayer_planes.h"
 #include "prep/median_tree.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 #include "prep/window_mirror.h"
 
-#include <algorithm>
-#include <cstddef>
-#include <cstdint>
-#include <stdexcept>
-
 namespace prep {
 namespace {
 
-constexpr std::size_t kTreeChannels = 4;  // channels filtered side by side
+constexpr std::size_t kTreeChannels = 4; // channels filtered side by side
 
 } // namespace
 

@@ -10,7 +10,7 @@ namespace prep {
 
 class MedianTree {
 public:
-    static constexpr int kCapacity = 100;  // values per window, repeats included
+    static constexpr int kCapacity = 100; // values per window, repeats included
 
     void clear() {
         nodeCount_ = 0;
@@ -29,7 +29,7 @@ private:
     struct Node {
         float value;
         std::int8_t count;
-        std::int8_t child[2];  // smaller values, then larger ones
+        std::int8_t child[2]; // smaller values, then larger ones
     };
     Node nodes_[kCapacity];
     int nodeCount_ = 0;

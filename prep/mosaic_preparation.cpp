@@ -1,16 +1,16 @@
 #include "prep/mosaic_preparation.h"
 
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <stdexcept>
+
 #include "prep/bayer_planes.h"
 #include "prep/median_filter.h"
 #include "prep/median_tree.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 #include "prep/window_mirror.h"
-
-#include <cstddef>
-#include <cstdint>
-#include <cstring>
-#include <stdexcept>
 
 namespace prep {
 namespace {
@@ -35,11 +35,11 @@ BayerImage prepareInSteps(const BayerImage& mosaic, const MosaicPreparation& set
 // (2x + c, 2y + r), so a plane position addresses a 2 x 2 block.
 struct TwoByTwo {
     const float* in;
-    std::size_t inWidth;   // mosaic samples a row
+    std::size_t inWidth; // mosaic samples a row
     std::int64_t planeWidth, planeHeight;
     float* out;
-    std::size_t outWidth;  // prepared mosaic samples a row
-    std::int32_t width, height;  // down-sampled plane size
+    std::size_t outWidth;       // prepared mosaic samples a row
+    std::int32_t width, height; // down-sampled plane size
     int factor;
 };
 
@@ -123,14 +123,13 @@ void medianFilter(const TwoByTwo& m, int size) {
     const std::int64_t half = size / 2;
     const std::size_t window = static_cast<std::size_t>(size);
     MedianTree trees[4];
-    std::size_t rowOffsets[kMaxMedianSize];  // mosaic offset of the block's top row
-    std::size_t columns[kMaxMedianSize];     // mosaic column of the block's left sample
+    std::size_t rowOffsets[kMaxMedianSize]; // mosaic offset of the block's top row
+    std::size_t columns[kMaxMedianSize];    // mosaic column of the block's left sample
     for (std::int64_t y = 0; y < m.height; ++y) {
         for (std::size_t i = 0; i < window; ++i)
-            rowOffsets[i] = 2 *
-                            mirrorIndex(m.factor * y - half + static_cast<std::int64_t>(i),
-                                        m.planeHeight) *
-                            m.inWidth;
+            rowOffsets[i] =
+                2 * mirrorIndex(m.factor * y - half + static_cast<std::int64_t>(i), m.planeHeight) *
+                m.inWidth;
         float* outTop = m.out + 2 * static_cast<std::size_t>(y) * m.outWidth;
         float* outBottom = outTop + m.outWidth;
         for (std::int64_t x = 0; x < m.width; ++x) {
@@ -143,8 +142,8 @@ void medianFilter(const TwoByTwo& m, int size) {
                 for (std::size_t r = 0; r < 3; ++r) {
                     for (std::size_t c = 0; c < 3; ++c) {
                         const float* block = m.in + rowOffsets[r] + columns[c];
-                        p[3 * r + c] = {{block[0], block[1], block[m.inWidth],
-                                         block[m.inWidth + 1]}};
+                        p[3 * r + c] = {
+                            {block[0], block[1], block[m.inWidth], block[m.inWidth + 1]}};
                     }
                 }
                 if (networkSafe(p)) {

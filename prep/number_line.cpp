@@ -51,7 +51,7 @@ float NumberLine::decimal() {
     skipBlanks();
     std::size_t start = pos_;
     if (pos_ < text_.size() && text_[pos_] == '+')
-        start = ++pos_;  // from_chars takes a minus sign only
+        start = ++pos_; // from_chars takes a minus sign only
     else if (pos_ < text_.size() && text_[pos_] == '-')
         ++pos_;
     std::size_t digits = 0;

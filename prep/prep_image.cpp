@@ -1,10 +1,11 @@
 #include "prep/prep_image.h"
 
+#include <cstdint>
+#include <stdexcept>
+
 #include "image/image_messages.h"
 #include "prep/prep_messages.h"
 
-#include <cstdint>
-#include <stdexcept>
 #include <sys/mman.h>
 
 namespace prep {
@@ -17,10 +18,11 @@ void preferHugePages(void* data, std::size_t bytes) {
     constexpr std::uintptr_t kHuge = 2u << 20;
     if (bytes < 2 * kHuge)
         return;
-    const std::uintptr_t start = (reinterpret_cast<std::uintptr_t>(data) + kHuge - 1) & ~(kHuge - 1);
+    const std::uintptr_t start =
+        (reinterpret_cast<std::uintptr_t>(data) + kHuge - 1) & ~(kHuge - 1);
     const std::uintptr_t end = (reinterpret_cast<std::uintptr_t>(data) + bytes) & ~(kHuge - 1);
     if (end > start)
-        madvise(reinterpret_cast<void*>(start), end - start, MADV_HUGEPAGE);  // advice only
+        madvise(reinterpret_cast<void*>(start), end - start, MADV_HUGEPAGE); // advice only
 #else
     (void)data;
     (void)bytes;

@@ -3,10 +3,10 @@
 // here holds REAL32 samples; a failed allocation throws std::runtime_error
 // "Unable to allocate image memory." as the image object does.
 
-#include "image/bayer_image.h"
-
 #include <cstddef>
 #include <cstdint>
+
+#include "image/bayer_image.h"
 
 namespace prep {
 

@@ -8,7 +8,8 @@ namespace prep::msg {
 inline constexpr char kInvalidWeaveFormat[] = "Invalid image format for Bayer interweaving.";
 inline constexpr char kInvalidWeavePattern[] = "Invalid pattern size for Bayer interweaving.";
 inline constexpr char kNotFloatImage[] = "Image preparation needs a floating-point image.";
-inline constexpr char kNotBayerImage[] = "The flattened image must be a single-channel Bayer image.";
+inline constexpr char kNotBayerImage[] =
+    "The flattened image must be a single-channel Bayer image.";
 inline constexpr char kBadSamplingFactor[] = "The down-sampling factor must be at least 1.";
 inline constexpr char kBadMedianSize[] = "The median filter size must be between 1 and 10.";
 
@@ -43,7 +44,8 @@ inline constexpr char kBadChannelCount[] = "The channel count in the sample file
 inline constexpr char kDimensionsMismatch[] =
     "Width and height in sample file does not match input image dimensions.";
 inline constexpr char kInvalidSampleFormat[] = "Invalid format in sample file.";
-inline constexpr char kSampleOutsideImage[] = "A sample point in the sample file lies outside the image.";
+inline constexpr char kSampleOutsideImage[] =
+    "A sample point in the sample file lies outside the image.";
 
 // White balance and delta ab
 inline constexpr char kNoCentrePixels[] =

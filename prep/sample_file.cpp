@@ -1,17 +1,17 @@
 #include "prep/sample_file.h"
 
+#include <algorithm>
+#include <cstdio>
+#include <iterator>
+#include <memory>
+#include <stdexcept>
+
 #include "image/output_file.h"
 #include "lsc/sample_limit.h"
 #include "prep/image_checks.h"
 #include "prep/number_line.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
-
-#include <algorithm>
-#include <cstdio>
-#include <iterator>
-#include <memory>
-#include <stdexcept>
 
 namespace prep {
 namespace {

@@ -14,12 +14,12 @@
 // S and read back as fractions of full scale (divided by S), the units the fit
 // and the register file use.
 
-#include "lsc/processing_context.h"
-
 #include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include "lsc/processing_context.h"
 
 namespace prep {
 
@@ -27,8 +27,8 @@ namespace prep {
 std::uint16_t sampleFullScale(int bits);
 
 struct SampleFileScale {
-    std::uint32_t fullScale = 0;  // S; at least 1
-    int samplingFactor = 1;       // f; at least 1
+    std::uint32_t fullScale = 0; // S; at least 1
+    int samplingFactor = 1;      // f; at least 1
 };
 
 struct SampleSet {

@@ -1,13 +1,13 @@
 #include "prep/white_balance.h"
 
+#include <cmath>
+#include <cstddef>
+#include <stdexcept>
+
 #include "lsc/bayer_phase.h"
 #include "lsc/target_levels.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
-
-#include <cmath>
-#include <cstddef>
-#include <stdexcept>
 
 namespace prep {
 namespace {
@@ -29,8 +29,8 @@ void centreLevels(const BayerImage& image, float (&levels)[kChannels]) {
     for (std::int32_t y = window.y0; y <= window.y1; ++y) {
         const float* row = image.pixels() + static_cast<std::size_t>(y) * width;
         for (std::int32_t x = window.x0; x <= window.x1; ++x) {
-            const int channel = bayerChannel(static_cast<std::uint64_t>(x),
-                                          static_cast<std::uint64_t>(y), phase);
+            const int channel =
+                bayerChannel(static_cast<std::uint64_t>(x), static_cast<std::uint64_t>(y), phase);
             sums[channel] += row[x];
             ++counts[channel];
         }
@@ -77,7 +77,8 @@ void whiteBalance(ProcessingContext& context) {
     const std::size_t height = static_cast<std::size_t>(image.height());
     float* pixel = image.pixels();
     for (std::size_t y = 0; y < height; ++y) {
-        const float rowGains[2] = {gains[bayerChannel(0, y, phase)], gains[bayerChannel(1, y, phase)]};
+        const float rowGains[2] = {gains[bayerChannel(0, y, phase)],
+                                   gains[bayerChannel(1, y, phase)]};
         for (std::size_t x = 0; x < width; ++x, ++pixel)
             *pixel *= rowGains[x & 1];
     }

@@ -2,9 +2,9 @@
 // White balance of the flattened (corrected) Bayer image and the measurement
 // of its channel levels afterwards.
 
-#include "lsc/processing_context.h"
-
 #include <cstdint>
+
+#include "lsc/processing_context.h"
 
 namespace prep {
 

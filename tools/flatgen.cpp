@@ -2,10 +2,6 @@
 // lsc, as a KQRAW2 container, a fixed-header KQRAW file, or a headerless raw
 // file with its details file.
 
-#include "image/output_file.h"
-#include "tests/support/flat_field.h"
-#include "tests/support/module_shading.h"
-
 #include <charconv>
 #include <cstdio>
 #include <exception>
@@ -14,6 +10,10 @@
 #include <stdexcept>
 #include <string>
 #include <vector>
+
+#include "image/output_file.h"
+#include "tests/support/flat_field.h"
+#include "tests/support/module_shading.h"
 
 using namespace testing_support;
 
@@ -71,7 +71,8 @@ public:
     using std::runtime_error::runtime_error;
 };
 
-template <typename Int> Int parseInt(const std::string& name, const std::string& text, int base = 10) {
+template <typename Int>
+Int parseInt(const std::string& name, const std::string& text, int base = 10) {
     Int value{};
     const char* end = text.data() + text.size();
     const auto [ptr, ec] = std::from_chars(text.data(), end, value, base);
@@ -91,8 +92,7 @@ double parseDouble(const std::string& name, const std::string& text) {
     return value;
 }
 
-std::vector<double> parseList(const std::string& name, const std::string& text,
-                              std::size_t count) {
+std::vector<double> parseList(const std::string& name, const std::string& text, std::size_t count) {
     std::vector<double> values;
     std::size_t start = 0;
     while (true) {

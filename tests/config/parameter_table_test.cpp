@@ -234,7 +234,6 @@ TEST(ConfigDate, ConvertsAsUtc) {
     EXPECT_EQ(config_date_seconds("9999-12-31T23:59"), 253402300740);
 }
 
-
 TEST(ConfigDate, IgnoresTheMachineTimeZone) {
     const char* previous = std::getenv("TZ");
     const std::string saved = previous ? previous : "";

@@ -1,9 +1,8 @@
-#include "driver/changed_settings.h"
+#include <gtest/gtest.h>
 
 #include "config/config_file.h"
 #include "config/parameter_table.h"
-
-#include <gtest/gtest.h>
+#include "driver/changed_settings.h"
 
 namespace {
 

@@ -1,13 +1,12 @@
-#include "driver/output_stream.h"
-
-#include "driver/stage_timer.h"
-#include "lsc/apan_exception.h"
-#include "tests/support/temp_dir.h"
+#include <cstdio>
+#include <thread>
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-#include <thread>
+#include "driver/output_stream.h"
+#include "driver/stage_timer.h"
+#include "lsc/apan_exception.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 

@@ -1,12 +1,12 @@
 // How the run driver reports whatever ends a run.
 
-#include "driver/output_stream.h"
-#include "driver/run.h"
-#include "tests/support/temp_dir.h"
+#include <cstdio>
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
+#include "driver/output_stream.h"
+#include "driver/run.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 

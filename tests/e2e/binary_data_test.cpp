@@ -1,10 +1,10 @@
 // The binary calibration data: built from the register file (and autofocus
 // data), stored, read back and checked, as a station writes it to a module.
 
-#include "tests/e2e/e2e_fixture.h"
-
 #include <cstdio>
 #include <memory>
+
+#include "tests/e2e/e2e_fixture.h"
 
 namespace e2e {
 namespace {
@@ -39,12 +39,11 @@ std::string hexOf(const std::string& bytes) {
 }
 
 TEST_F(BinaryData, IsWrittenReadBackAndDigested) {
-    prepare("shared.cfg_file_date = 2012-05-01T10:30;", smallShape(),
-            [] {
-                CaptureInfo capture;
-                capture.serialNumber = "0a1b2c3d";
-                return capture;
-            }());
+    prepare("shared.cfg_file_date = 2012-05-01T10:30;", smallShape(), [] {
+        CaptureInfo capture;
+        capture.serialNumber = "0a1b2c3d";
+        return capture;
+    }());
     const auto result = calibrateBinary();
     ASSERT_EQ(result.status, 0) << result.out;
     const auto text = lines(result.out);
@@ -90,10 +89,11 @@ TEST_F(BinaryData, MissingDateIsWarnedAndBadDateRefused) {
     std::remove(path("cal.bin").c_str());
     result = calibrateBinary();
     EXPECT_EQ(result.status, 1);
-    EXPECT_EQ(lines(result.out).back(),
-              "ERROR: Invalid value for shared.cfg_file_date attribute (must be YYYY-MM-DDTHH:MM).");
+    EXPECT_EQ(
+        lines(result.out).back(),
+        "ERROR: Invalid value for shared.cfg_file_date attribute (must be YYYY-MM-DDTHH:MM).");
     EXPECT_FALSE(exists("cal.bin"));
-    EXPECT_TRUE(exists("cal.txt"));  // earlier outputs stay
+    EXPECT_TRUE(exists("cal.txt")); // earlier outputs stay
 }
 
 TEST_F(BinaryData, CompressionSettingsAreChecked) {
@@ -125,7 +125,8 @@ TEST_F(BinaryData, CompressionSettingsAreChecked) {
 }
 
 TEST_F(BinaryData, LogFlagDumpsTextThatReadsBackAsConfiguration) {
-    prepare("blob.log_flag = 1; shared.cfg_file_date = 2020-01-02T03:04; shared.program_number = 7;");
+    prepare(
+        "blob.log_flag = 1; shared.cfg_file_date = 2020-01-02T03:04; shared.program_number = 7;");
     const auto result = calibrateBinary();
     ASSERT_EQ(result.status, 0) << result.out;
     const std::string& out = result.out;
@@ -162,14 +163,15 @@ TEST_F(BinaryData, RoundTripsEveryValidConfiguration) {
     const std::string blob = read("cal.bin");
     // The focus block: posture H, macro 100000, hyper 200, inf 300, 40, 5, two pairs.
     EXPECT_NE(blob.find(std::string("H\x00\x01\x86\xa0\x00\x00\x00\xc8\x00\x00\x01\x2c\x00\x28"
-                                     "\x00\x05\x02\x00\x00\x00\x01\x00\x00\x00\x02",
-                                     27)),
+                                    "\x00\x05\x02\x00\x00\x00\x01\x00\x00\x00\x02",
+                                    27)),
               std::string::npos);
 }
 
 TEST_F(BinaryData, OptionAndFileErrors) {
     prepare();
-    auto result = run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-o", "s.txt", "-b", "cal.bin"});
+    auto result =
+        run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-o", "s.txt", "-b", "cal.bin"});
     EXPECT_EQ(result.status, 1);
     EXPECT_EQ(result.out, "ERROR: Binary calibration data (--binary) can only be built with a "
                           "calibration register file (--calibrate).\n");
@@ -180,8 +182,7 @@ TEST_F(BinaryData, OptionAndFileErrors) {
     EXPECT_EQ(lines(result.out).back(), "ERROR: Cannot store binary calibration file.");
 
     const std::pair<std::string, std::string> focusCases[] = {
-        {"module.af.set[0].posture = 'H';\n",
-         "ERROR: Missing value for module.af.set[0].macro."},
+        {"module.af.set[0].posture = 'H';\n", "ERROR: Missing value for module.af.set[0].macro."},
         {"module.af.set[0].posture = 'H'; module.af.set[0].macro = 1; module.af.set[0].hyper = 2;"
          "module.af.set[0].inf = 3; module.af.set[0].settle_time = 70000;"
          "module.af.set[0].hysteresis = 1;",

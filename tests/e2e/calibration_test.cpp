@@ -1,10 +1,10 @@
 // The calibration proper, run as a station runs it: samples, fit, register
 // file, correction, white balance, colour error and the flattened images.
 
-#include "tests/e2e/e2e_fixture.h"
-
 #include <cmath>
 #include <regex>
+
+#include "tests/e2e/e2e_fixture.h"
 
 namespace e2e {
 namespace {
@@ -75,16 +75,19 @@ TEST_F(Calibration, RunPrintsTheFitAndEvaluationLinesInOrder) {
     ASSERT_NE(start, text.end());
     for (std::size_t i = 0; i < expected.size(); ++i)
         EXPECT_EQ(start[static_cast<long>(i)], expected[i]);
-    const auto rest = std::vector<std::string>(start + static_cast<long>(expected.size()), text.end());
+    const auto rest =
+        std::vector<std::string>(start + static_cast<long>(expected.size()), text.end());
     ASSERT_EQ(rest.size(), 11u) << result.out;
     EXPECT_TRUE(std::regex_match(rest[0], std::regex("Measured R/G: 0\\.5[0-9]{5}")));
     EXPECT_TRUE(std::regex_match(rest[1], std::regex("Measured B/G: 0\\.6[0-9]{5}")));
     EXPECT_EQ(rest[2], "Generating configuration file.");
     EXPECT_EQ(rest[3], "Start correcting lens shading.");
     EXPECT_EQ(rest[4], "Performing white balancing.");
-    EXPECT_TRUE(std::regex_match(rest[5], std::regex("Flattened image measured R/G: 1\\.00[0-9]{4}")))
+    EXPECT_TRUE(
+        std::regex_match(rest[5], std::regex("Flattened image measured R/G: 1\\.00[0-9]{4}")))
         << rest[5];
-    EXPECT_TRUE(std::regex_match(rest[6], std::regex("Flattened image measured B/G: 0\\.99[0-9]{4}")))
+    EXPECT_TRUE(
+        std::regex_match(rest[6], std::regex("Flattened image measured B/G: 0\\.99[0-9]{4}")))
         << rest[6];
     EXPECT_EQ(rest[7], "Calculating deltaAB.");
     EXPECT_EQ(rest[8], "Delta ab blocks: 20 x 15");
@@ -140,11 +143,10 @@ TEST_F(Calibration, RegisterFileFormsFollowTheConfiguration) {
             "shared.block_name = module_a; shared.block_num_flag = 1; shared.block_num = 2;");
     ASSERT_EQ(calibrate().status, 0);
     const std::string file = read("cal.txt");
-    for (const char* line : {"module_a.leftPatchWidth       = 160;",
-                             "module_a.centerPatchWidth     = 320;",
-                             "module_a.topPatchHeight       = 120;",
-                             "module_a.middlePatchHeight    = 240;",
-                             "module_a.leftPatchDeltaULSB   = 0xccccccc;"})
+    for (const char* line :
+         {"module_a.leftPatchWidth       = 160;", "module_a.centerPatchWidth     = 320;",
+          "module_a.topPatchHeight       = 120;", "module_a.middlePatchHeight    = 240;",
+          "module_a.leftPatchDeltaULSB   = 0xccccccc;"})
         EXPECT_TRUE(hasLine(file, line)) << line;
     EXPECT_EQ(file.find("light_source"), std::string::npos);
     EXPECT_EQ(file.find("module_a.GR "), std::string::npos);
@@ -176,8 +178,8 @@ TEST_F(Calibration, XTestForcesTheXSurfaceAndSkipsTheColourError) {
 
 TEST_F(Calibration, ColourErrorIsSkippedOnRequest) {
     const std::vector<std::string> files = {"--kq", "-d", "delta.csv", "-t", "stats.csv"};
-    for (const auto& setup : {std::pair<std::string, std::string>{"lsc.avg_luma = 1;", ""},
-                              {"", "--nodelta"}}) {
+    for (const auto& setup :
+         {std::pair<std::string, std::string>{"lsc.avg_luma = 1;", ""}, {"", "--nodelta"}}) {
         prepare(setup.first);
         auto args = files;
         if (!setup.second.empty())
@@ -250,8 +252,8 @@ TEST_F(Calibration, SampleFileRoundTripGivesTheSameRegisterFile) {
     // Full-resolution units: the 640 x 480 capture, four channels.
     EXPECT_EQ(samples[1], "640,480,4");
 
-    const auto result = run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-s", "samples.txt",
-                             "-l", "cal2.txt"});
+    const auto result =
+        run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-s", "samples.txt", "-l", "cal2.txt"});
     ASSERT_EQ(result.status, 0) << result.out;
     EXPECT_TRUE(hasLine(result.out, "Loading sample points from file."));
     EXPECT_FALSE(hasLine(result.out, "Create samples from image."));
@@ -288,13 +290,13 @@ TEST_F(Calibration, SampleFileErrorsAreReported) {
     };
     for (const Case& c : cases) {
         write("samples.txt", c.text);
-        const auto result = run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-s", "samples.txt",
-                                 "-l", "cal.txt"});
+        const auto result = run(
+            {"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-s", "samples.txt", "-l", "cal.txt"});
         EXPECT_EQ(result.status, 1) << c.text;
         EXPECT_EQ(lines(result.out).back(), c.error) << result.out;
     }
-    const auto result = run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-s", "missing.txt",
-                             "-l", "cal.txt"});
+    const auto result =
+        run({"--kq", "-c", "lsc.cfg", "-i", "flat.kqraw", "-s", "missing.txt", "-l", "cal.txt"});
     EXPECT_EQ(lines(result.out).back(), "ERROR: Cannot open input sample file: missing.txt");
     const auto out = calibrate({"--kq", "-o", "no-dir/samples.txt"});
     EXPECT_EQ(lines(out.out).back(), "ERROR: Cannot open sample output file: no-dir/samples.txt");

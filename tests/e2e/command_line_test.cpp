@@ -1,9 +1,9 @@
 // The tool's front door, run as a user runs it: help, version, the option
 // groups, the combination checks and the parser's own errors.
 
-#include "tests/e2e/e2e_fixture.h"
-
 #include <gtest/gtest.h>
+
+#include "tests/e2e/e2e_fixture.h"
 
 using testing_support::runTool;
 
@@ -13,8 +13,11 @@ const char kVersionLine[] = "lsc version 3.8.1\n";
 const char kUsage[] = "Use --help to print out all the options.\n";
 
 TEST(CommandLine, VersionPrintsOneLineAndWinsOverHelp) {
-    for (const auto& args : {std::vector<std::string>{"--version"}, {"-V"}, {"-V", "-H"},
-                             {"--help", "--version", "--kq"}, {"-h", "-V"},
+    for (const auto& args : {std::vector<std::string>{"--version"},
+                             {"-V"},
+                             {"-V", "-H"},
+                             {"--help", "--version", "--kq"},
+                             {"-h", "-V"},
                              {"--kq", "-V", "-h"}}) {
         const auto result = runTool(args);
         EXPECT_EQ(result.status, 0);
@@ -31,9 +34,12 @@ TEST(CommandLine, HelpPrintsTheWholeHelpText) {
         const char* golden;
     };
     const Case cases[] = {
-        {{"--help"}, "help.txt"},        {{"-H"}, "help.txt"},
-        {{"-h"}, "help.txt"},            {{"-h", "-c", "a.cfg"}, "help.txt"},
-        {{"--kq", "-H"}, "help_kq.txt"}, {{"-h", "--kq"}, "help_kq.txt"},
+        {{"--help"}, "help.txt"},
+        {{"-H"}, "help.txt"},
+        {{"-h"}, "help.txt"},
+        {{"-h", "-c", "a.cfg"}, "help.txt"},
+        {{"--kq", "-H"}, "help_kq.txt"},
+        {{"-h", "--kq"}, "help_kq.txt"},
         {{"--kq", "--help", "-q"}, "help_kq.txt"},
     };
     for (const Case& c : cases) {

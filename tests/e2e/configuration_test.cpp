@@ -10,7 +10,7 @@ using Configuration = ToolRun;
 
 struct ErrorCase {
     std::string config;
-    std::string message;  // the whole of standard output
+    std::string message; // the whole of standard output
 };
 
 TEST_F(Configuration, ErrorsEndTheRunWithStatusOneBeforeTheImage) {
@@ -83,8 +83,9 @@ TEST_F(Configuration, CarriageReturnLineEndsKeepEverySetting) {
 }
 
 TEST_F(Configuration, DebugModeStartsWithTheStartLine) {
-    for (const auto& setup : {std::pair<std::string, std::vector<std::string>>{"", {"--kq", "--debug"}},
-                              {"proc.debug = 1;", {}}}) {
+    for (const auto& setup :
+         {std::pair<std::string, std::vector<std::string>>{"", {"--kq", "--debug"}},
+          {"proc.debug = 1;", {}}}) {
         prepare(setup.first);
         const auto result = calibrate(setup.second);
         ASSERT_EQ(result.status, 0) << result.out;
@@ -116,7 +117,8 @@ TEST_F(Configuration, InputIsNeededEvenWithSamples) {
     write("samples.txt", "");
     const auto result = run({"--kq", "-c", "lsc.cfg", "-s", "samples.txt", "-l", "cal.txt"});
     EXPECT_EQ(result.status, 1);
-    EXPECT_EQ(result.out, "lsc version 3.8.1\nERROR: An input flat field image must be specified.\n");
+    EXPECT_EQ(result.out,
+              "lsc version 3.8.1\nERROR: An input flat field image must be specified.\n");
 }
 
 TEST_F(Configuration, QuietLogFileStaysEmptyWhateverHappens) {

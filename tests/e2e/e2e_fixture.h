@@ -2,14 +2,14 @@
 // A working directory with a generated flat field and a configuration file,
 // and a shorthand to run the tool in it.
 
-#include "tests/support/flat_field.h"
-#include "tests/support/temp_dir.h"
-#include "tests/support/tool_runner.h"
+#include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 
-#include <string>
-#include <vector>
+#include "tests/support/flat_field.h"
+#include "tests/support/temp_dir.h"
+#include "tests/support/tool_runner.h"
 
 namespace e2e {
 
@@ -30,7 +30,9 @@ inline FlatFieldShape smallShape() {
 class ToolRun : public ::testing::Test {
 protected:
     std::string path(const std::string& name) const { return dir_.file(name); }
-    std::string read(const std::string& name) const { return testing_support::readFile(path(name)); }
+    std::string read(const std::string& name) const {
+        return testing_support::readFile(path(name));
+    }
     bool exists(const std::string& name) const { return testing_support::fileExists(path(name)); }
     void write(const std::string& name, const std::string& bytes) const {
         testing_support::writeFile(path(name), bytes);
@@ -50,8 +52,8 @@ protected:
     }
     // --config lsc.cfg --input flat.kqraw --calibrate cal.txt, then `extra`.
     ToolResult calibrate(const std::vector<std::string>& extra = {}) const {
-        std::vector<std::string> args = {"--config", "lsc.cfg", "--input", "flat.kqraw",
-                                         "--calibrate", "cal.txt"};
+        std::vector<std::string> args = {"--config",   "lsc.cfg",     "--input",
+                                         "flat.kqraw", "--calibrate", "cal.txt"};
         args.insert(args.end(), extra.begin(), extra.end());
         return run(args);
     }

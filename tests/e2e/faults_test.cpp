@@ -5,11 +5,12 @@
 // for success, never leaves a half-written or temporary file, and never
 // spoils an output that an earlier stage finished.
 
-#include "tests/e2e/e2e_fixture.h"
-
 #include <algorithm>
 #include <cerrno>
 #include <csignal>
+
+#include "tests/e2e/e2e_fixture.h"
+
 #include <dirent.h>
 #include <fcntl.h>
 #include <poll.h>
@@ -344,8 +345,8 @@ const std::vector<std::string> kConfigDirectory = {"ERROR: Unable to open config
                                                    "  %: Is a directory"};
 const std::vector<std::string> kConfigUnreadable = {"ERROR: Unable to open configuration file.",
                                                     "  %: Input/output error"};
-const std::vector<std::string> kConfigEndless = {
-    "ERROR: Configuration file is larger than 64 MiB.", "  %"};
+const std::vector<std::string> kConfigEndless = {"ERROR: Configuration file is larger than 64 MiB.",
+                                                 "  %"};
 const std::vector<std::string> kDetailsUnreadable = {
     "ERROR(264): Unable to read headerless raw image details file.",
     "Likely incorrect file name of headerless raw image details file specified."};
@@ -355,8 +356,9 @@ const std::vector<std::string> kKqrawDirectory = {"ERROR: Cannot read kqraw imag
                                                   "  %: Is a directory"};
 const std::vector<std::string> kKqrawUnreadable = {"ERROR: Cannot read kqraw image.",
                                                    "  %: Input/output error"};
-const std::vector<std::string> kKqrawEndless = {"ERROR: Cannot read kqraw image.",
-                                                "  %: a device or pipe that gives no KQRAW2 or KQRAW raw image"};
+const std::vector<std::string> kKqrawEndless = {
+    "ERROR: Cannot read kqraw image.",
+    "  %: a device or pipe that gives no KQRAW2 or KQRAW raw image"};
 
 const InputCase kInputs[] = {
     {"config",
@@ -451,8 +453,8 @@ TEST_P(InputFaults, EndsWithAClearErrorAndNoSuccess) {
     const std::string name = makeFault(fault);
     const auto result = run(fill(input.args, name));
 
-    const std::vector<std::string>& expected = fault == Fault::kUnreadable ? input.unreadable
-                                               : fault == Fault::kEndless  ? input.endless
+    const std::vector<std::string>& expected = fault == Fault::kUnreadable  ? input.unreadable
+                                               : fault == Fault::kEndless   ? input.endless
                                                : fault == Fault::kDirectory ? input.directory
                                                                             : input.missing;
     const int status = input.status >= 0 ? input.status : std::stoi(expected[0].substr(6, 3));

@@ -1,11 +1,6 @@
 // The synthetic flat-field generator, the raw file builders, the flatgen tool
 // and the bundled example files.
 
-#include "tests/support/flat_field.h"
-#include "tests/support/module_shading.h"
-#include "tests/support/temp_dir.h"
-#include "tests/support/tool_runner.h"
-
 #include <algorithm>
 #include <cctype>
 #include <cmath>
@@ -17,6 +12,11 @@
 #include <tuple>
 
 #include <gtest/gtest.h>
+
+#include "tests/support/flat_field.h"
+#include "tests/support/module_shading.h"
+#include "tests/support/temp_dir.h"
+#include "tests/support/tool_runner.h"
 
 using namespace testing_support;
 
@@ -151,7 +151,7 @@ TEST(FlatFieldLevels, DefectsAreDistinctHotAndDeadPixels) {
     EXPECT_EQ(positions.size(), 7u);
 
     shape.width = shape.height = 2;
-    shape.defects = 100;  // more than there are pixels: every pixel, once
+    shape.defects = 100; // more than there are pixels: every pixel, once
     const FlatField tiny = makeFlatField(shape);
     EXPECT_EQ(tiny.hotPixels.size() + tiny.deadPixels.size(), 4u);
 }
@@ -192,7 +192,7 @@ struct OrderCase {
     const char* name;
     std::uint32_t cfa;
     std::uint32_t code;
-    int channels[4];  // of (0,0), (1,0), (0,1), (1,1)
+    int channels[4]; // of (0,0), (1,0), (0,1), (1,1)
 };
 
 class FlatFieldOrder : public ::testing::TestWithParam<OrderCase> {};
@@ -210,7 +210,7 @@ TEST_P(FlatFieldOrder, MapsPixelsToChannelsAndCodes) {
     const FlatField field = makeFlatField(shape);
     const int at[4][2] = {{0, 0}, {1, 0}, {0, 1}, {1, 1}};
     for (int i = 0; i < 4; ++i) {
-        for (int shift = 0; shift < 4; shift += 2) {  // the pattern repeats every two pixels
+        for (int shift = 0; shift < 4; shift += 2) { // the pattern repeats every two pixels
             const int x = at[i][0] + shift, y = at[i][1] + shift;
             EXPECT_EQ(field.channelAt(x, y), order.channels[i]);
             const double expected = 0.8 * 0.2 * (order.channels[i] + 1) * 1023;
@@ -268,7 +268,7 @@ TEST(RawFileBuilders, Kqraw2HoldsHeaderPixelsCaptureAndSensorInfoBlocks) {
     FlatFieldShape shape = smallShape();
     shape.width = 4;
     shape.height = 2;
-    shape.cfa = 0x43320000;  // BGGR
+    shape.cfa = 0x43320000; // BGGR
     shape.bits = 12;
     const FlatField field = makeFlatField(shape);
     const std::string bytes = kqraw2FileBytes(field, sampleCapture());
@@ -283,7 +283,7 @@ TEST(RawFileBuilders, Kqraw2HoldsHeaderPixelsCaptureAndSensorInfoBlocks) {
     const std::uint32_t header[9] = {4, 2, 0x42474752, 12, 1, 1, 1796115600, 0, 0};
     for (std::size_t i = 0; i < 9; ++i)
         EXPECT_EQ(u32At(bytes, 36 + 4 * i), header[i]) << "header word " << i;
-    EXPECT_EQ(bytes.substr(44, 4), "RGGB");  // BGGR's code, least significant byte first
+    EXPECT_EQ(bytes.substr(44, 4), "RGGB"); // BGGR's code, least significant byte first
 
     EXPECT_EQ(bytes.substr(pixelsAt, 16), "PIXELDATA_111107");
     EXPECT_EQ(u32At(bytes, pixelsAt + 32), 8u + 16u);
@@ -318,7 +318,7 @@ TEST(RawFileBuilders, FixedHeaderFileCarriesCaptureDataAtItsOffsets) {
     FlatFieldShape shape = smallShape();
     shape.width = 3;
     shape.height = 2;
-    shape.cfa = 0x32430000;  // GRBG
+    shape.cfa = 0x32430000; // GRBG
     const FlatField field = makeFlatField(shape);
     const std::string bytes = fixedHeaderFileBytes(field, sampleCapture());
     ASSERT_EQ(bytes.size(), 298672u + 12u);
@@ -338,7 +338,7 @@ TEST(RawFileBuilders, FixedHeaderFileCarriesCaptureDataAtItsOffsets) {
               std::string("\x00\x11\x22\x33\x44\x55\x66\x77\x88\x99\xaa\xbb\xcc\xdd\xee\xff", 16));
     EXPECT_EQ(u32At(bytes, 104), 0xDEADBEEFu);
     EXPECT_EQ(u32At(bytes, 298668), 0xCAFEFEEDu);
-    EXPECT_EQ(bytes.find_first_not_of('\0', 108), 298668u);  // unnamed fields stay zero
+    EXPECT_EQ(bytes.find_first_not_of('\0', 108), 298668u); // unnamed fields stay zero
     EXPECT_EQ(bytes.substr(298672), headerlessFileBytes(field));
 }
 
@@ -495,8 +495,9 @@ std::pair<int, int> preparedRange(const FlatField& field) {
                     for (int dx = -1; dx <= 1; ++dx) {
                         const int px = 2 * mirror(x + dx, width) + plane % 2;
                         const int py = 2 * mirror(y + dy, height) + plane / 2;
-                        window[n++] = field.samples[std::size_t(py) * std::size_t(field.shape.width) +
-                                                    std::size_t(px)];
+                        window[n++] =
+                            field.samples[std::size_t(py) * std::size_t(field.shape.width) +
+                                          std::size_t(px)];
                     }
                 std::nth_element(window, window + 4, window + 9);
                 low = std::min(low, int(window[4]));
@@ -529,22 +530,38 @@ TEST(ExampleFiles, FlatFieldPassesTheExampleConfigurationChecks) {
 
 TEST(ExampleFiles, ConfigurationValuesLieInTheirRanges) {
     const std::map<std::string, std::pair<double, double>> ranges = {
-        {"shared.light_source", {-1, 255}},     {"shared.block_num_flag", {0, 1}},
-        {"shared.block_num", {0, 255}},         {"shared.program_number", {0, 255}},
-        {"shared.proc_sampling_factor", {1, 100}}, {"shared.bit_res", {4, 15}},
-        {"shared.fuse_id_bytes", {0, 16}},      {"shared.jpeg_quality", {0, 100}},
-        {"blob.compression_flag", {0, 1}},      {"blob.log_flag", {0, 1}},
-        {"blob.write_flag", {0, 1}},            {"proc.median_filter_flag", {0, 1}},
-        {"proc.median_filter_size", {1, 10}},   {"proc.debug", {0, 1}},
-        {"lsc.sampling_factor", {1, 100}},      {"lsc.sampling_margin", {0, 500}},
-        {"lsc.leftPatchFactor", {0, 0.5}},      {"lsc.centerPatchFactor", {0, 1}},
-        {"lsc.topPatchFactor", {0, 0.5}},       {"lsc.middlePatchFactor", {0, 1}},
-        {"lsc.falloff_factor", {0, 100}},       {"lsc.wb_avgs_flag", {0, 1}},
-        {"lsc.log_err_flag", {0, 1}},           {"lsc.green_balance", {0, 1}},
-        {"lsc.max_gain", {0, 1000}},            {"lsc.max_rms_err", {0, 1}},
-        {"lsc.max_err", {0, 1}},                {"lsc.avg_luma", {0, 1}},
-        {"lsc.awb_avg_filter_size", {1, 160}},  {"apply_lsc.max_delta_ab", {0, 10}},
-        {"apply_lsc.test_max_delta_ab", {0, 10}}, {"apply_lsc.sampling_factor", {1, 100}},
+        {"shared.light_source", {-1, 255}},
+        {"shared.block_num_flag", {0, 1}},
+        {"shared.block_num", {0, 255}},
+        {"shared.program_number", {0, 255}},
+        {"shared.proc_sampling_factor", {1, 100}},
+        {"shared.bit_res", {4, 15}},
+        {"shared.fuse_id_bytes", {0, 16}},
+        {"shared.jpeg_quality", {0, 100}},
+        {"blob.compression_flag", {0, 1}},
+        {"blob.log_flag", {0, 1}},
+        {"blob.write_flag", {0, 1}},
+        {"proc.median_filter_flag", {0, 1}},
+        {"proc.median_filter_size", {1, 10}},
+        {"proc.debug", {0, 1}},
+        {"lsc.sampling_factor", {1, 100}},
+        {"lsc.sampling_margin", {0, 500}},
+        {"lsc.leftPatchFactor", {0, 0.5}},
+        {"lsc.centerPatchFactor", {0, 1}},
+        {"lsc.topPatchFactor", {0, 0.5}},
+        {"lsc.middlePatchFactor", {0, 1}},
+        {"lsc.falloff_factor", {0, 100}},
+        {"lsc.wb_avgs_flag", {0, 1}},
+        {"lsc.log_err_flag", {0, 1}},
+        {"lsc.green_balance", {0, 1}},
+        {"lsc.max_gain", {0, 1000}},
+        {"lsc.max_rms_err", {0, 1}},
+        {"lsc.max_err", {0, 1}},
+        {"lsc.avg_luma", {0, 1}},
+        {"lsc.awb_avg_filter_size", {1, 160}},
+        {"apply_lsc.max_delta_ab", {0, 10}},
+        {"apply_lsc.test_max_delta_ab", {0, 10}},
+        {"apply_lsc.sampling_factor", {1, 100}},
         {"apply_lsc.luma_normalize_factor", {0, 1}},
     };
     const auto settings = exampleSettings();
@@ -574,11 +591,20 @@ std::string syntheticTuning() {
             cb6000 << comma << 2.0;
         }
     return "{\"version\": 2.0, \"algorithms\": [{\"rpi.black_level\": {}}, {\"rpi.alsc\": {"
-           "\"luminance_lut\": [" + lum.str() + "],"
-           "\"calibrations_Cr\": [{\"ct\": 3000, \"table\": [" + cr3000.str() + "]},"
-           "{\"ct\": 6000, \"table\": [" + cr6000.str() + "]}],"
-           "\"calibrations_Cb\": [{\"ct\": 3000, \"table\": [" + cb3000.str() + "]},"
-           "{\"ct\": 6000, \"table\": [" + cb6000.str() + "]}]}}]}";
+           "\"luminance_lut\": [" +
+           lum.str() +
+           "],"
+           "\"calibrations_Cr\": [{\"ct\": 3000, \"table\": [" +
+           cr3000.str() +
+           "]},"
+           "{\"ct\": 6000, \"table\": [" +
+           cr6000.str() +
+           "]}],"
+           "\"calibrations_Cb\": [{\"ct\": 3000, \"table\": [" +
+           cb3000.str() +
+           "]},"
+           "{\"ct\": 6000, \"table\": [" +
+           cb6000.str() + "]}]}}]}";
 }
 
 TEST(ModuleShadingRender, CellCentresCarryTheTableValuesAtTheNearestColourTemperature) {

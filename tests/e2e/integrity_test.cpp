@@ -3,17 +3,17 @@
 // leaves no temporary file when it is interrupted, and refuses values it
 // would otherwise change or drop without a word.
 
+#include <algorithm>
+#include <csignal>
+
 #include "tests/e2e/e2e_fixture.h"
 
-#include <csignal>
+#include <dirent.h>
 #include <fcntl.h>
 #include <sys/inotify.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <algorithm>
-#include <dirent.h>
 
 namespace e2e {
 namespace {
@@ -190,9 +190,9 @@ TEST_P(OutputOverlaps, AreRefusedBeforeAnyWork) {
 INSTANTIATE_TEST_SUITE_P(Table, OutputOverlaps, ::testing::ValuesIn(kOverlaps));
 
 TEST_F(Integrity, DevicesMayBeSharedByOutputs) {
-    const auto result = run({"--kq", "--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate",
-                             "/dev/null", "--binary", "/dev/null", "--flat", "/dev/null",
-                             "--log", "/dev/null"});
+    const auto result =
+        run({"--kq", "--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate", "/dev/null",
+             "--binary", "/dev/null", "--flat", "/dev/null", "--log", "/dev/null"});
     EXPECT_EQ(result.status, 0);
 }
 
@@ -211,10 +211,9 @@ TEST_F(Integrity, SignalsDuringAWriteLeaveNothingBehind) {
         const int watch = inotify_init1(IN_CLOEXEC);
         ASSERT_GE(watch, 0);
         ASSERT_GE(inotify_add_watch(watch, dir_.path().c_str(), IN_CREATE), 0);
-        const pid_t tool = startTool(
-            {"--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate", "cal.txt",
-             "--inputasbmp", "out.bmp"},
-            dir_.path());
+        const pid_t tool = startTool({"--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate",
+                                      "cal.txt", "--inputasbmp", "out.bmp"},
+                                     dir_.path());
         bool seen = false;
         alignas(inotify_event) char events[4096];
         while (!seen) {
@@ -222,8 +221,8 @@ TEST_F(Integrity, SignalsDuringAWriteLeaveNothingBehind) {
             ASSERT_GT(n, 0);
             for (ssize_t at = 0; at < n;) {
                 const auto* event = reinterpret_cast<const inotify_event*>(events + at);
-                seen = seen || (event->len > 0 &&
-                                std::string(event->name).rfind(".out.bmp.tmp-", 0) == 0);
+                seen = seen ||
+                       (event->len > 0 && std::string(event->name).rfind(".out.bmp.tmp-", 0) == 0);
                 at += static_cast<ssize_t>(sizeof(inotify_event) + event->len);
             }
         }
@@ -251,8 +250,8 @@ TEST_F(Integrity, ImagesBeyondTheSampleMemoryLimitAreRefusedBeforeAllocating) {
     // A container whose pixel block claims 2^31 samples, in a sparse file
     // long enough to hold them.
     testing_support::KqRawBuilder container;
-    container.header(65535, 32769, 0x52474742).block("PIXELDATA_111107", std::string(8, '\0'),
-                                                      0xFFFFFFF8u);
+    container.header(65535, 32769, 0x52474742)
+        .block("PIXELDATA_111107", std::string(8, '\0'), 0xFFFFFFF8u);
     write("huge.kqraw", container.bytes());
     // Summed as off_t: a 32-bit size_t would wrap.
     ASSERT_EQ(truncate(path("huge.kqraw").c_str(),
@@ -267,10 +266,10 @@ TEST_F(Integrity, ImagesBeyondTheSampleMemoryLimitAreRefusedBeforeAllocating) {
 
 struct Refusal {
     const char* name;
-    const char* config;                 // lsc.cfg
-    const char* autofocus;              // af.txt, when not null
-    std::vector<std::string> args;      // after --config lsc.cfg
-    const char* lastLine;               // what the run ends with
+    const char* config;            // lsc.cfg
+    const char* autofocus;         // af.txt, when not null
+    std::vector<std::string> args; // after --config lsc.cfg
+    const char* lastLine;          // what the run ends with
     int status;
 };
 
@@ -296,8 +295,8 @@ const Refusal kRefusals[] = {
      "ERROR: apply_lsc.delta_ab_blocks must hold two values: the block columns and rows.", 1},
     {"LongPosture", "", "module.af.set[0].posture = HV;", kWithAutofocus,
      "ERROR: Value for module.af.set[0].posture must be a single posture character.", 1},
-    {"PairOfThree", "", "module.af.set[0].posture = H; module.af.set[0].FDN_dist_pair[0] = {1, 2, 3};",
-     kWithAutofocus,
+    {"PairOfThree", "",
+     "module.af.set[0].posture = H; module.af.set[0].FDN_dist_pair[0] = {1, 2, 3};", kWithAutofocus,
      "ERROR: Value for module.af.set[0].FDN_dist_pair[0] must hold two values, a pair of focus "
      "distances.",
      1},
@@ -305,8 +304,7 @@ const Refusal kRefusals[] = {
      "ERROR: The autofocus file may only add autofocus data (module.*); it sets "
      "reference.controlPointB[5][5], which would change the calibration data.",
      1},
-    {"AutofocusLightSource", "", "global.configType = 1;\nshared.light_source = 5;",
-     kWithAutofocus,
+    {"AutofocusLightSource", "", "global.configType = 1;\nshared.light_source = 5;", kWithAutofocus,
      "ERROR: The autofocus file may only add autofocus data (module.*); it sets "
      "shared.light_source, which would change the calibration data.",
      1},
@@ -314,25 +312,33 @@ const Refusal kRefusals[] = {
      "ERROR: The autofocus file may only add autofocus data (module.*); it sets "
      "reference.serial_no, which would change the calibration data.",
      1},
-    {"AutofocusWithoutBinary", "", "module.af.set[0].posture = H;",
+    {"AutofocusWithoutBinary",
+     "",
+     "module.af.set[0].posture = H;",
      {"-i", "flat.kqraw", "-l", "cal.txt", "-a", "af.txt"},
      "ERROR: Autofocus calibration data (--autofocus) can only be included in binary "
      "calibration data (--binary).",
      1},
     {"LegacyFormatTwo", "raw.legacy_format = 2;", nullptr, kRaw,
-     "ERROR: Value specified for raw.legacy_format is too high, value must be between 0 and 1.",
-     1},
-    {"GuidNotHexWithLegacyFormat", "raw.legacy_format = 1;", nullptr,
+     "ERROR: Value specified for raw.legacy_format is too high, value must be between 0 and 1.", 1},
+    {"GuidNotHexWithLegacyFormat",
+     "raw.legacy_format = 1;",
+     nullptr,
      {"-i", "flat.raw", "-r", "guid.txt", "-l", "cal.txt"},
      "ERROR: Invalid image.sensor_guid value 'IMX219' in headerless raw details file (with "
      "raw.legacy_format = 1 it must be 1 to 16 hexadecimal digits).",
      1},
-    {"SharedGuidNotHexForAFixedHeader", "shared.sensor_guid = zz;", nullptr,
+    {"SharedGuidNotHexForAFixedHeader",
+     "shared.sensor_guid = zz;",
+     nullptr,
      {"-i", "fixed.kqraw", "-l", "cal.txt"},
      "ERROR: Invalid shared.sensor_guid value 'zz' (a fixed-header raw image stores it as 1 to 16 "
      "hexadecimal digits).",
      1},
-    {"UnknownBayerCode", "", nullptr, {"-i", "odd.kqraw", "-l", "cal.txt"},
+    {"UnknownBayerCode",
+     "",
+     nullptr,
+     {"-i", "odd.kqraw", "-l", "cal.txt"},
      "ERROR: Unknown Bayer order in the input image: its Bayer code is none of RGGB, GRBG, GBRG "
      "and BGGR.",
      1},
@@ -341,14 +347,26 @@ const Refusal kRefusals[] = {
     // Accepted now, each refused or failing before.
     {"DashInBlockName", "shared.block_name = cam-A;", nullptr, kBinary, "Completed.", 0},
     {"LongestBlockName", "", nullptr, kBinary, "Completed.", 0},
-    {"LegacyFormatWordWithoutRaw", "raw.legacy_format = yes;", nullptr,
-     {"-i", "flat.kqraw", "-l", "cal.txt"}, "Completed.", 0},
-    {"GuidModelNameInAContainer", "", nullptr, {"-i", "flat.raw", "-r", "guid.txt", "-l", "cal.txt"},
-     "Completed.", 0},
-    {"SharedGuidNameInAContainer", "shared.sensor_guid = IMX219;", nullptr,
-     {"-i", "flat.kqraw", "-l", "cal.txt"}, "Completed.", 0},
-    {"AutofocusRepeatingTheRegisterFile", "", "global.configType = 1;\nmodule.af.set[0].posture = H;",
-     kWithAutofocus, "Completed.", 0},
+    {"LegacyFormatWordWithoutRaw",
+     "raw.legacy_format = yes;",
+     nullptr,
+     {"-i", "flat.kqraw", "-l", "cal.txt"},
+     "Completed.",
+     0},
+    {"GuidModelNameInAContainer",
+     "",
+     nullptr,
+     {"-i", "flat.raw", "-r", "guid.txt", "-l", "cal.txt"},
+     "Completed.",
+     0},
+    {"SharedGuidNameInAContainer",
+     "shared.sensor_guid = IMX219;",
+     nullptr,
+     {"-i", "flat.kqraw", "-l", "cal.txt"},
+     "Completed.",
+     0},
+    {"AutofocusRepeatingTheRegisterFile", "",
+     "global.configType = 1;\nmodule.af.set[0].posture = H;", kWithAutofocus, "Completed.", 0},
 };
 
 class Refusals : public Integrity, public ::testing::WithParamInterface<Refusal> {};
@@ -361,12 +379,14 @@ TEST_P(Refusals, EndAsTheTableSays) {
     if (name == "BlockNameTooLong")
         config = "shared.block_name = " + longest + "c;";
     if (name == "LongestBlockName")
-        config = "shared.block_name = " + longest + ";\nshared.block_num_flag = 1;\n"
+        config = "shared.block_name = " + longest +
+                 ";\nshared.block_num_flag = 1;\n"
                  "shared.block_num = 255;";
     write("lsc.cfg", config);
     if (refusal.autofocus)
         write("af.txt", refusal.autofocus + std::string("\n") + kAfSet);
-    write("guid.txt", testing_support::headerlessDetailsText(field_) + "image.sensor_guid = IMX219\n");
+    write("guid.txt",
+          testing_support::headerlessDetailsText(field_) + "image.sensor_guid = IMX219\n");
     write("fixed.kqraw", testing_support::fixedHeaderFileBytes(field_));
     testing_support::KqRawBuilder odd;
     odd.header(640, 480, 0x12345678).pixels(field_.samples);
@@ -392,13 +412,13 @@ TEST_F(Integrity, FocusDistancesOf2To31AndAboveKeepTheirValue) {
     const auto result = run({"--config", "lsc.cfg", "-i", "flat.kqraw", "-l", "cal.txt", "-b",
                              "cal.bin", "-a", "af.txt"});
     ASSERT_EQ(result.status, 0) << result.out;
-    EXPECT_TRUE(hasLine(result.out,
-                        "module.af.set[0].FDN_dist_pair[0] = { 3000000001, 4294967295 };"));
+    EXPECT_TRUE(
+        hasLine(result.out, "module.af.set[0].FDN_dist_pair[0] = { 3000000001, 4294967295 };"));
 }
 
 TEST_F(Integrity, ConsoleDescribedCaptureIsNotStoredAsABareDump) {
-    const auto result = run({"--config", "lsc.cfg", "--input", "flat.raw", "--calibrate",
-                             "cal.txt", "--flat", "out.kqraw"},
+    const auto result = run({"--config", "lsc.cfg", "--input", "flat.raw", "--calibrate", "cal.txt",
+                             "--flat", "out.kqraw"},
                             "640\n480\n10\n1\nY\n1\n0\n");
     EXPECT_EQ(result.status, 1);
     EXPECT_EQ(lastLine(result), "ERROR: Cannot store kqraw image.");
@@ -412,8 +432,8 @@ TEST_F(Integrity, ReplacedOutputsKeepTheirPermissionsAndLongNamesWork) {
     ASSERT_EQ(chmod(path("private.txt").c_str(), 0600), 0);
     ASSERT_EQ(symlink("private.txt", path("via-link.txt").c_str()), 0);
     const std::string longName(255, 'n');
-    for (const std::string& output : {std::string("private.txt"), std::string("via-link.txt"),
-                                      longName}) {
+    for (const std::string& output :
+         {std::string("private.txt"), std::string("via-link.txt"), longName}) {
         const auto result = calibrate({"--binary", output});
         ASSERT_EQ(result.status, 0) << output << result.out;
     }

@@ -20,8 +20,8 @@ protected:
         write("details.txt", details);
     }
     ToolResult calibrateHeaderless(const std::vector<std::string>& extra = {}) const {
-        std::vector<std::string> args = {"-c", "lsc.cfg", "-i", "flat.raw", "-r", "details.txt",
-                                         "-l", "cal.txt"};
+        std::vector<std::string> args = {"-c", "lsc.cfg",     "-i", "flat.raw",
+                                         "-r", "details.txt", "-l", "cal.txt"};
         args.insert(args.end(), extra.begin(), extra.end());
         return run(args);
     }
@@ -79,10 +79,11 @@ TEST_F(Loading, DebugRunTimesEveryStageOnce) {
     const auto result = calibrate({"--kq", "--debug", "-u", "in.jpg", "-w", "in.bmp"});
     ASSERT_EQ(result.status, 0) << result.out;
     const std::vector<std::string> labels = {
-        "Reading configuration: ", "Processes configuration: ", "Image load time: ",
-        "JPEG image save time: ", "BMP image save time: ", "Image inspection time: ",
+        "Reading configuration: ",   "Processes configuration: ",
+        "Image load time: ",         "JPEG image save time: ",
+        "BMP image save time: ",     "Image inspection time: ",
         "Bayer deinterweave time: ", "Median filter and down sampling time: ",
-        "Bayer interweave time: ", "Image checking time: "};
+        "Bayer interweave time: ",   "Image checking time: "};
     std::vector<std::string> seen;
     for (const std::string& line : lines(result.out))
         if (line.size() > 4 && line.compare(line.size() - 4, 4, " sec") == 0)
@@ -132,15 +133,15 @@ TEST_F(Loading, IdentityTestPassesForAContainerAndAHeaderlessInput) {
     auto result = calibrate({"--kq", "--debug", "-p", "pre.kqraw"});
     EXPECT_TRUE(hasLine(result.out, "Preprocessed image file: pre.kqraw")) << result.out;
     EXPECT_TRUE(hasLine(result.out, "Performing identity test.")) << result.out;
-    EXPECT_FALSE(hasLine(result.out,
-                         "WARNING - Not all output image pixels match input image pixels."));
+    EXPECT_FALSE(
+        hasLine(result.out, "WARNING - Not all output image pixels match input image pixels."));
 
     prepareHeaderless(details("image.bit_res = 10\n"));
     write("lsc.cfg", config);
     result = calibrateHeaderless({"--kq", "--debug", "-p", "pre.kqraw"});
     EXPECT_TRUE(hasLine(result.out, "Performing identity test.")) << result.out;
-    EXPECT_FALSE(hasLine(result.out,
-                         "WARNING - Not all output image pixels match input image pixels."));
+    EXPECT_FALSE(
+        hasLine(result.out, "WARNING - Not all output image pixels match input image pixels."));
     EXPECT_EQ(result.status, 0);
 }
 
@@ -158,8 +159,7 @@ TEST_F(Loading, HeaderlessRawReadsAndTranslates) {
     EXPECT_TRUE(hasLine(result.out, "Exposure time = 20"));
     EXPECT_TRUE(hasLine(result.out, "Average pixel value = 514.85"));
     // The translated container holds the same image and capture data.
-    const auto fromTranslation =
-        run({"-c", "lsc.cfg", "-i", "translated.kqraw", "-l", "cal.txt"});
+    const auto fromTranslation = run({"-c", "lsc.cfg", "-i", "translated.kqraw", "-l", "cal.txt"});
     auto expected = result.out;
     expected.replace(expected.find("flat.raw"), 8, "translated.kqraw");
     EXPECT_EQ(fromTranslation.out, expected);
@@ -169,7 +169,7 @@ TEST_F(Loading, HeaderlessErrorsCarryTheirCodesAndHints) {
     struct Case {
         std::string details;
         int code;
-        std::string out;  // the error lines
+        std::string out; // the error lines
     };
     const Case cases[] = {
         {details("image.serial_no = abc\n"), 263,
@@ -180,8 +180,7 @@ TEST_F(Loading, HeaderlessErrorsCarryTheirCodesAndHints) {
              std::string(34, 'a') +
              "\nLikely incorrect serial number entered in headerless raw details file.\n"},
         {details("image.serial_no = " + std::string(33, 'a') + "\n"), 263,
-         "ERROR(263): Serial number must be an even number of characters: " +
-             std::string(33, 'a') +
+         "ERROR(263): Serial number must be an even number of characters: " + std::string(33, 'a') +
              "\nLikely incorrect serial number entered in headerless raw details file.\n"},
         {details("image.serial_no = 0g\n"), 263,
          "ERROR(263): Serial number must consist of hexadecimal digits only: 0g\nLikely "
@@ -215,9 +214,10 @@ TEST_F(Loading, HeaderlessMissingFilesAreReported) {
     prepareHeaderless(details());
     auto result = run({"-c", "lsc.cfg", "-i", "flat.raw", "-r", "nothing.txt", "-l", "cal.txt"});
     EXPECT_EQ(result.status, exitStatusOf(264));
-    EXPECT_TRUE(hasLine(result.out, "ERROR(264): Unable to read headerless raw image details file."));
-    EXPECT_TRUE(hasLine(result.out,
-                        "Likely incorrect file name of headerless raw image details file specified."));
+    EXPECT_TRUE(
+        hasLine(result.out, "ERROR(264): Unable to read headerless raw image details file."));
+    EXPECT_TRUE(hasLine(
+        result.out, "Likely incorrect file name of headerless raw image details file specified."));
 
     result = run({"-c", "lsc.cfg", "-i", "nothing.raw", "-r", "details.txt", "-l", "cal.txt"});
     EXPECT_EQ(result.status, exitStatusOf(210));

@@ -2,11 +2,11 @@
 // the help text and every configuration key the program knows, so an option
 // or key added later cannot be left out of it.
 
+#include <regex>
+
 #include "config/config_node.h"
 #include "config/parameter_table.h"
 #include "tests/e2e/e2e_fixture.h"
-
-#include <regex>
 
 namespace e2e {
 namespace {
@@ -22,8 +22,8 @@ std::string manualText() {
 }
 
 bool containsWord(const std::string& text, const std::string& word) {
-    const std::regex whole("(^|[^\\w.-])" + std::regex_replace(word, std::regex(R"([.\-])"),
-                                                                  R"(\$&)") +
+    const std::regex whole("(^|[^\\w.-])" +
+                           std::regex_replace(word, std::regex(R"([.\-])"), R"(\$&)") +
                            "($|[^\\w-])");
     return std::regex_search(text, whole);
 }

@@ -22,9 +22,9 @@ namespace {
 
 struct Module {
     const char* file;
-    int width, height;  // half the sensor's size, to keep the tests quick
+    int width, height; // half the sensor's size, to keep the tests quick
     const char* order;
-    int blackLevel;     // 10-bit units
+    int blackLevel; // 10-bit units
     double temperature;
 };
 
@@ -90,7 +90,7 @@ INSTANTIATE_TEST_SUITE_P(RealModules, ModuleAcceptance,
                                            Module{"rpi_ov5647.json", 1296, 972, "BGGR", 16, 6500}),
                          [](const ::testing::TestParamInfo<Module>& param) {
                              const std::string file = param.param.file;
-                             return file.substr(4, file.size() - 9);  // rpi_<sensor>.json
+                             return file.substr(4, file.size() - 9); // rpi_<sensor>.json
                          });
 
 // On a quarter-size capture prepared as it is (no filter, no reduction), the
@@ -99,7 +99,7 @@ INSTANTIATE_TEST_SUITE_P(RealModules, ModuleAcceptance,
 TEST_F(ModuleRun, DefectsOnASamplePointAreStillRefused) {
     struct Case {
         const char* name;
-        int diameter;  // pixels; 10 is 1.2 % of the width
+        int diameter; // pixels; 10 is 1.2 % of the width
         double factor;
         const char* message;
     };
@@ -113,8 +113,9 @@ TEST_F(ModuleRun, DefectsOnASamplePointAreStillRefused) {
     FlatFieldShape shape = moduleShape(kImx219, 2);
     shape.defects = 0;
     for (const Case& c : cases) {
-        prepare(baseConfig(kImx219) + "proc.median_filter_flag = 0; shared.proc_sampling_factor = 1;"
-                                      "proc.min_pixel_val = 0; proc.max_pixel_val = 1023;",
+        prepare(baseConfig(kImx219) +
+                    "proc.median_filter_flag = 0; shared.proc_sampling_factor = 1;"
+                    "proc.min_pixel_val = 0; proc.max_pixel_val = 1023;",
                 shape);
         paintDisc(397, 297, c.diameter, c.factor, kImx219.blackLevel);
         const auto result = calibrate();
@@ -129,7 +130,7 @@ TEST_F(ModuleRun, LuminanceBoundFailsADustBlotchThatDeltaAbLetsThrough) {
         bool blotch;
         const char* bound;
         int status;
-        const char* line;  // a whole line the output must hold
+        const char* line; // a whole line the output must hold
     };
     const Case cases[] = {
         {false, "3", 0, "Completed."},
@@ -138,10 +139,12 @@ TEST_F(ModuleRun, LuminanceBoundFailsADustBlotchThatDeltaAbLetsThrough) {
     };
     for (const Case& c : cases) {
         // The fit bounds opened, so that only the luminance decides.
-        prepare(baseConfig(kImx219) + "lsc.max_err = 1; lsc.max_rms_err = 1;"
-                                      "apply_lsc.max_luma_residual = " + c.bound + ";",
+        prepare(baseConfig(kImx219) +
+                    "lsc.max_err = 1; lsc.max_rms_err = 1;"
+                    "apply_lsc.max_luma_residual = " +
+                    c.bound + ";",
                 moduleShape(kImx219, 2));
-        if (c.blotch)  // 4 % of the width, 25 % darker
+        if (c.blotch) // 4 % of the width, 25 % darker
             paintDisc(500, 200, 33, 0.75, kImx219.blackLevel);
         const auto result = calibrate();
         EXPECT_EQ(result.status, c.status) << result.out;
@@ -171,7 +174,7 @@ TEST_F(ModuleRun, AutomaticLayoutIsRepeatableAndPassesTheBinaryDataCheck) {
                    "topPatchFactor ([0-9.]+), middlePatchFactor ([0-9.]+) \\(the flattest of "
                    "5\\)\n")))
         << first.out;
-    EXPECT_NE(chosen[1].str(), "0.25");  // this module's corners want larger outer patches
+    EXPECT_NE(chosen[1].str(), "0.25"); // this module's corners want larger outer patches
     EXPECT_NE(registers.find("reference.leftPatchFactor      = " + chosen[1].str() + ";"),
               std::string::npos);
     EXPECT_NE(registers.find("reference.middlePatchFactor    = " + chosen[4].str() + ";"),

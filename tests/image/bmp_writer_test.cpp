@@ -1,13 +1,12 @@
-#include "image/bmp_writer.h"
-
-#include "image/image_buffer.h"
-#include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
 #include <cstdint>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "image/bmp_writer.h"
+#include "image/image_buffer.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -52,9 +51,8 @@ std::vector<std::uint8_t> headers(std::uint32_t fileSize, std::uint32_t offset, 
 TEST(BmpWriter, WritesRgbAsBottomUpBgrRowsPaddedToFourBytes) {
     TempDir dir;
     // Two rows of three pixels: 9 data bytes and 3 padding bytes a row.
-    const ImagePtr image = eightBitImage(3, 2, kPixelRgb, 3,
-                                         {1, 2, 3, 4, 5, 6, 7, 8, 9,
-                                          11, 12, 13, 14, 15, 16, 17, 18, 19});
+    const ImagePtr image = eightBitImage(
+        3, 2, kPixelRgb, 3, {1, 2, 3, 4, 5, 6, 7, 8, 9, 11, 12, 13, 14, 15, 16, 17, 18, 19});
     ASSERT_EQ(bmpWrite(dir.file("rgb.bmp").c_str(), image.get()), 0);
 
     std::vector<std::uint8_t> expected = headers(54 + 2 * 12, 54, 3, 2, 24);
@@ -89,8 +87,8 @@ TEST(BmpWriter, RowsOfAWidthThatIsAMultipleOfFourHaveNoPadding) {
 TEST(BmpWriter, RefusesImagesItCannotRepresent) {
     TempDir dir;
     int result = 0;
-    const ImagePtr wide(imageCreate(2, 2, 16, 1, 1, 0, 0, kPixelMono, kBufferInterleaved,
-                                    kDataUint16, &result));
+    const ImagePtr wide(
+        imageCreate(2, 2, 16, 1, 1, 0, 0, kPixelMono, kBufferInterleaved, kDataUint16, &result));
     EXPECT_EQ(bmpWrite(dir.file("a.bmp").c_str(), wide.get()), -6);
     EXPECT_EQ(bmpWrite(dir.file("a.bmp").c_str(), nullptr), -5);
     EXPECT_FALSE(testing_support::fileExists(dir.file("a.bmp")));

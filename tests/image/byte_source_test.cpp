@@ -1,18 +1,17 @@
 // Reading files through openSource: sizes and offsets past 2 GiB, which a
 // 32-bit host only reaches with 64-bit file offsets.
 
-#include "image/byte_source.h"
-
-#include "tests/support/temp_dir.h"
-
 #include <cstdint>
 #include <memory>
 #include <string>
 
+#include <gtest/gtest.h>
+
+#include "image/byte_source.h"
+#include "tests/support/temp_dir.h"
+
 #include <fcntl.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 using namespace testing_support;
 

@@ -1,12 +1,11 @@
-#include "image/demosaic.h"
-
-#include "image/image_buffer.h"
-
-#include <gtest/gtest.h>
-
 #include <cmath>
 #include <cstdint>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include "image/demosaic.h"
+#include "image/image_buffer.h"
 
 namespace {
 
@@ -29,9 +28,7 @@ ImagePtr demosaic(const ImagePtr& source) {
 
 struct Rgb {
     int r, g, b;
-    bool operator==(const Rgb& other) const {
-        return r == other.r && g == other.g && b == other.b;
-    }
+    bool operator==(const Rgb& other) const { return r == other.r && g == other.g && b == other.b; }
 };
 
 std::ostream& operator<<(std::ostream& out, const Rgb& pixel) {
@@ -79,9 +76,8 @@ protected:
     // R  G  R
     // G  B  G
     // R  G  R
-    ImagePtr rgb = demosaic(bayerImage(3, 3, kCfaRggb, inSteps({8, 16, 40,
-                                                                4, 100, 12,
-                                                                24, 32, 200})));
+    ImagePtr rgb =
+        demosaic(bayerImage(3, 3, kCfaRggb, inSteps({8, 16, 40, 4, 100, 12, 24, 32, 200})));
 };
 
 TEST_F(DemosaicRggb, ProducesAnEightBitInterleavedRgbImage) {
@@ -143,13 +139,13 @@ TEST(Demosaic, RefusesSourcesThatAreNotNormalisedBayerImages) {
     EXPECT_EQ(demosaicToRgb8(nullptr, &result), nullptr);
     EXPECT_EQ(result, -6);
 
-    const ImagePtr sixteenBit(imageCreate(2, 2, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
-                                          kDataUint16, &result));
+    const ImagePtr sixteenBit(
+        imageCreate(2, 2, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa, kDataUint16, &result));
     EXPECT_EQ(demosaicToRgb8(sixteenBit.get(), &result), nullptr);
     EXPECT_EQ(result, -6);
 
-    const ImagePtr mono(imageCreate(2, 2, 32, 1, 1, 0, 0, kPixelMono, kBufferInterleaved,
-                                    kDataReal32, &result));
+    const ImagePtr mono(
+        imageCreate(2, 2, 32, 1, 1, 0, 0, kPixelMono, kBufferInterleaved, kDataReal32, &result));
     EXPECT_EQ(demosaicToRgb8(mono.get(), &result), nullptr);
     EXPECT_EQ(result, -6);
 }

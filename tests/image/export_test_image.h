@@ -1,11 +1,11 @@
 #pragma once
 // An image of any layout for the export writers' tests.
 
-#include "image/image_buffer.h"
+#include <cstdint>
 
 #include <gtest/gtest.h>
 
-#include <cstdint>
+#include "image/image_buffer.h"
 
 inline ImagePtr makeImage(std::int32_t width, std::int32_t height, std::uint16_t bits,
                           std::uint16_t samples, std::uint32_t cfa1, std::uint32_t pixelType,

@@ -1,12 +1,11 @@
-#include "image/image_save.h"
-
-#include "image/image_buffer.h"
-#include "tests/support/temp_dir.h"
+#include <cstdint>
+#include <string>
 
 #include <gtest/gtest.h>
 
-#include <cstdint>
-#include <string>
+#include "image/image_buffer.h"
+#include "image/image_save.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -14,8 +13,8 @@ using testing_support::TempDir;
 
 ImagePtr rgbImage() {
     int result = 0;
-    ImagePtr image(imageCreate(8, 8, 8, 3, 1, 0, 0, kPixelRgb, kBufferInterleaved, kDataUint8,
-                               &result));
+    ImagePtr image(
+        imageCreate(8, 8, 8, 3, 1, 0, 0, kPixelRgb, kBufferInterleaved, kDataUint8, &result));
     EXPECT_EQ(result, 0);
     auto* data = static_cast<std::uint8_t*>(image->data);
     for (int i = 0; i < 8 * 8 * 3; ++i)
@@ -25,8 +24,8 @@ ImagePtr rgbImage() {
 
 ImagePtr sensorImage(std::uint32_t dataType) {
     int result = 0;
-    ImagePtr image(imageCreate(4, 4, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa, dataType,
-                               &result));
+    ImagePtr image(
+        imageCreate(4, 4, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa, dataType, &result));
     EXPECT_EQ(result, 0);
     return image;
 }
@@ -64,8 +63,8 @@ TEST(ImageSave, MissingImageOrSamplesGiveMinusFive) {
     TempDir dir;
     EXPECT_EQ(imageSave(dir.file("a").c_str(), nullptr, 7, nullptr, 0), -5);
     int result = 0;
-    const ImagePtr empty(imageCreate(4, 4, 8, 3, 1, 0, 0, kPixelRgb, kBufferInterleaved,
-                                     kDataNone, &result));
+    const ImagePtr empty(
+        imageCreate(4, 4, 8, 3, 1, 0, 0, kPixelRgb, kBufferInterleaved, kDataNone, &result));
     ASSERT_TRUE(empty);
     EXPECT_EQ(imageSave(dir.file("a").c_str(), empty.get(), 6, nullptr, 0), -5);
 }

@@ -1,16 +1,15 @@
-#include "image/jpeg_writer.h"
-
-#include "image/image_buffer.h"
-#include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
 #include <csetjmp>
 #include <cstdint>
 #include <string>
 #include <vector>
 
+#include <gtest/gtest.h>
+
 #include <jpeglib.h>
+
+#include "image/image_buffer.h"
+#include "image/jpeg_writer.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -34,8 +33,8 @@ struct DecodedJpeg {
     unsigned height = 0;
     int components = 0;
     std::vector<std::string> comments;
-    unsigned firstLuminanceStep = 0;  // first entry of quantisation table 0
-    std::vector<JSAMPLE> row;         // scratch, kept out of the decoding frame
+    unsigned firstLuminanceStep = 0; // first entry of quantisation table 0
+    std::vector<JSAMPLE> row;        // scratch, kept out of the decoding frame
 };
 
 struct DecodeErrors {
@@ -166,8 +165,8 @@ TEST(JpegWriter, ReportsOpenAndWriteFailures) {
 TEST(JpegWriter, RefusesImagesWithoutEightBitSamples) {
     TempDir dir;
     int result = 0;
-    const ImagePtr wide(imageCreate(4, 4, 16, 1, 1, 0, 0, kPixelMono, kBufferInterleaved,
-                                    kDataUint16, &result));
+    const ImagePtr wide(
+        imageCreate(4, 4, 16, 1, 1, 0, 0, kPixelMono, kBufferInterleaved, kDataUint16, &result));
     EXPECT_EQ(jpegWrite(dir.file("a.jpg").c_str(), wide.get(), 90), -6);
     EXPECT_EQ(jpegWrite(dir.file("a.jpg").c_str(), nullptr, 90), -5);
 }

@@ -1,11 +1,11 @@
 // The creation time that a new raw container's header block records.
 
-#include "image/kqraw_block.h"
-
 #include <cstdint>
 #include <ctime>
 
 #include <gtest/gtest.h>
+
+#include "image/kqraw_block.h"
 
 namespace {
 

@@ -1,15 +1,14 @@
-#include "image/ppm_writer.h"
-
-#include "image/image_buffer.h"
-#include "tests/image/export_test_image.h"
-#include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
 #include <cmath>
 #include <cstdint>
 #include <cstring>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include "image/image_buffer.h"
+#include "image/ppm_writer.h"
+#include "tests/image/export_test_image.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 
@@ -25,25 +24,24 @@ TEST(PpmWriter, WritesAGreymapWithItsPropertiesAsComments) {
     const ImagePtr image = makeImage(2, 1, 8, 1, 0, kPixelMono, kBufferInterleaved, kDataUint8);
     static_cast<std::uint8_t*>(image->data)[0] = 'a';
     static_cast<std::uint8_t*>(image->data)[1] = 'b';
-    EXPECT_EQ(written(dir, image.get()),
-              "P5\n"
-              "# MCF_NumberOfImages  = 1\n"
-              "# MCF_SamplesPerPixel = 1\n"
-              "# MCF_PixelType  = MONO\n"
-              "# MCF_BufferType = INTERLEAVED\n"
-              "# MCF_DataType = UINT8\n"
-              "# MCF_BlackVal = 0.000000\n"
-              "# MCF_WhiteVal = 256.000000\n"
-              "# MCF_MinClip  = 0.000000\n"
-              "# MCF_MaxClip  = 256.000000\n"
-              "2 1\n255\nab");
+    EXPECT_EQ(written(dir, image.get()), "P5\n"
+                                         "# MCF_NumberOfImages  = 1\n"
+                                         "# MCF_SamplesPerPixel = 1\n"
+                                         "# MCF_PixelType  = MONO\n"
+                                         "# MCF_BufferType = INTERLEAVED\n"
+                                         "# MCF_DataType = UINT8\n"
+                                         "# MCF_BlackVal = 0.000000\n"
+                                         "# MCF_WhiteVal = 256.000000\n"
+                                         "# MCF_MinClip  = 0.000000\n"
+                                         "# MCF_MaxClip  = 256.000000\n"
+                                         "2 1\n255\nab");
 }
 
 TEST(PpmWriter, WritesSixteenBitSensorSamplesMostSignificantByteFirst) {
     TempDir dir;
     const ImagePtr image = makeImage(2, 1, 12, 1, kCfaBggr, kPixelRaw, kBufferRawCfa, kDataUint16);
     static_cast<std::uint16_t*>(image->data)[0] = 0x0123;
-    static_cast<std::uint16_t*>(image->data)[1] = 0xFFFF;  // above 12 bits: clipped to 4095
+    static_cast<std::uint16_t*>(image->data)[1] = 0xFFFF; // above 12 bits: clipped to 4095
     ASSERT_EQ(imageSetMetadata(image.get(), "Note", "two\nlines"), 0);
     const std::string file = written(dir, image.get());
     EXPECT_NE(file.find("#     MCF_CFA    = BGGR\n"), std::string::npos);
@@ -77,8 +75,8 @@ TEST(PpmWriter, RefusesLayoutsWithoutAPortableForm) {
     TempDir dir;
     const ImagePtr yuv = makeImage(4, 4, 8, 3, 0, kPixelYuv422, kBufferPlanar, kDataUint8);
     EXPECT_EQ(ppmWrite(dir.file("a.pnm").c_str(), yuv.get()), -6);
-    const ImagePtr twoSamples = makeImage(4, 4, 8, 2, 0, kPixelOther, kBufferInterleaved,
-                                          kDataUint8);
+    const ImagePtr twoSamples =
+        makeImage(4, 4, 8, 2, 0, kPixelOther, kBufferInterleaved, kDataUint8);
     EXPECT_EQ(ppmWrite(dir.file("a.pnm").c_str(), twoSamples.get()), -6);
     EXPECT_EQ(ppmWrite(dir.file("a.pnm").c_str(), nullptr), -5);
 }

@@ -1,15 +1,15 @@
 // Widening raw samples to normalised floats in their own block.
 
-#include "image/image_buffer.h"
-#include "image/image_result.h"
-#include "image/sample_memory.h"
-#include "image/sample_scaling.h"
-
 #include <cstdint>
 #include <cstring>
 #include <vector>
 
 #include <gtest/gtest.h>
+
+#include "image/image_buffer.h"
+#include "image/image_result.h"
+#include "image/sample_memory.h"
+#include "image/sample_scaling.h"
 
 namespace {
 

@@ -1,18 +1,17 @@
-#include "image/tiff_writer.h"
-
-#include "image/image_buffer.h"
-#include "tests/image/export_test_image.h"
-#include "tests/support/temp_dir.h"
-
-#include <gtest/gtest.h>
-
 #include <cstdint>
 #include <cstring>
 #include <memory>
 #include <string>
 #include <vector>
 
+#include <gtest/gtest.h>
+
 #include <tiffio.h>
+
+#include "image/image_buffer.h"
+#include "image/tiff_writer.h"
+#include "tests/image/export_test_image.h"
+#include "tests/support/temp_dir.h"
 
 namespace {
 

@@ -1,10 +1,9 @@
-#include "prep/bayer_planes.h"
-
-#include "test_images.h"
-
 #include <stdexcept>
 
 #include <gtest/gtest.h>
+
+#include "prep/bayer_planes.h"
+#include "test_images.h"
 
 using prep_test::fillRamp;
 using prep_test::makeImage;
@@ -24,7 +23,7 @@ TEST(PatternSize, FourWhenFirstWordHasLowBits) {
 
 TEST(PatternSize, OneOtherwise) {
     EXPECT_EQ(prep::patternSize(0, 0), 1);
-    EXPECT_EQ(prep::patternSize(0, 0x23341000), 1);  // bits below 16 set
+    EXPECT_EQ(prep::patternSize(0, 0x23341000), 1); // bits below 16 set
     EXPECT_EQ(prep::patternSize(0x10, 0), 1);
 }
 
@@ -69,8 +68,8 @@ TEST(Split, SensorSizeGivesHalfSizePlanes) {
 TEST(Split, RefusesIntegerSamples) {
     int result = 0;
     BayerImage mosaic;
-    mosaic.reset(imageCreate(4, 4, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa, kDataUint16,
-                             &result));
+    mosaic.reset(
+        imageCreate(4, 4, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa, kDataUint16, &result));
     EXPECT_THROW(prep::split(mosaic), std::invalid_argument);
 }
 

@@ -1,12 +1,11 @@
-#include "prep/delta_ab_report.h"
-
-#include "tests/support/temp_dir.h"
-
 #include <cmath>
 #include <stdexcept>
 #include <string>
 
 #include <gtest/gtest.h>
+
+#include "prep/delta_ab_report.h"
+#include "tests/support/temp_dir.h"
 
 using testing_support::TempDir;
 
@@ -28,8 +27,7 @@ ProcessingContext results() {
     return context;
 }
 
-template <typename Write>
-std::string stringThrown(Write write) {
+template <typename Write> std::string stringThrown(Write write) {
     try {
         write();
     } catch (const std::string& text) {

@@ -1,12 +1,11 @@
-#include "prep/delta_ab.h"
-
-#include "test_images.h"
-
 #include <cmath>
 #include <limits>
 #include <stdexcept>
 
 #include <gtest/gtest.h>
+
+#include "prep/delta_ab.h"
+#include "test_images.h"
 
 using prep_test::makeImage;
 
@@ -57,7 +56,7 @@ TEST(DeltaAb, NormalisesGreenPeakToLumaFactor) {
 
 TEST(DeltaAb, WritesEncodedColoursBackByPosition) {
     ProcessingContext context;
-    context.corrected = makeImage(2, 2, 1, kCfaGbrg);  // G B / R G
+    context.corrected = makeImage(2, 2, 1, kCfaGbrg); // G B / R G
     const float mosaic[4] = {0.4f, 0.25f, 0.5f, 0.2f};
     std::copy(mosaic, mosaic + 4, context.corrected.pixels());
     context.deltaAbBlocks[0] = context.deltaAbBlocks[1] = 1;
@@ -73,15 +72,15 @@ TEST(DeltaAb, WritesEncodedColoursBackByPosition) {
 
 TEST(DeltaAb, ColourMatrixTakesRowVector) {
     ProcessingContext context = greyContext(2, 2, 1, 1);
-    const float matrix[3][3] = {{0, 1, 0}, {0, 0, 0}, {0, 0, 1}};  // red feeds green only
+    const float matrix[3][3] = {{0, 1, 0}, {0, 0, 0}, {0, 0, 1}}; // red feeds green only
     for (int r = 0; r < 3; ++r)
         for (int c = 0; c < 3; ++c)
             context.ccm[r][c] = matrix[r][c];
     prep::evaluateDeltaAb(context);
     const float* out = context.corrected.pixels();
-    EXPECT_EQ(out[0], 0.0f);          // red position: nothing feeds out 0
-    EXPECT_FLOAT_EQ(out[1], 0.75f);   // green: the red sample, normalised
-    EXPECT_GT(out[3], 0.0f);          // blue passes through
+    EXPECT_EQ(out[0], 0.0f);        // red position: nothing feeds out 0
+    EXPECT_FLOAT_EQ(out[1], 0.75f); // green: the red sample, normalised
+    EXPECT_GT(out[3], 0.0f);        // blue passes through
 }
 
 TEST(DeltaAb, NegativeColoursClipToZero) {
@@ -95,7 +94,7 @@ TEST(DeltaAb, DefaultGridOnVgaUsesSixteenPixelBlocks) {
     ProcessingContext context = greyContext(640, 480, 20, 15);
     for (int py = 16; py < 32; ++py)
         for (int px = 16; px < 32; ++px)
-            tint(context, px, py);  // exactly block (1, 1)
+            tint(context, px, py); // exactly block (1, 1)
     prep::evaluateDeltaAb(context);
     ASSERT_EQ(context.deltaImage.size(), 300u);
     const float tinted = context.deltaImage[1 * 20 + 1];
@@ -147,7 +146,7 @@ TEST(DeltaAb, RefusesEmptyBlockGrid) {
 }
 
 TEST(DeltaAb, RefusesBlocksOfZeroSize) {
-    ProcessingContext context = greyContext(8, 8, 5, 1);  // 4 RGB columns for 5 blocks
+    ProcessingContext context = greyContext(8, 8, 5, 1); // 4 RGB columns for 5 blocks
     EXPECT_EQ(evaluationError(context),
               "The flattened image is too small for the delta ab block grid.");
     EXPECT_EQ(context.corrected.pixels()[0], 0.5f);

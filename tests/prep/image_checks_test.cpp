@@ -1,7 +1,3 @@
-#include "prep/image_checks.h"
-
-#include "test_images.h"
-
 #include <functional>
 #include <limits>
 #include <sstream>
@@ -9,6 +5,9 @@
 #include <string>
 
 #include <gtest/gtest.h>
+
+#include "prep/image_checks.h"
+#include "test_images.h"
 
 using prep_test::fill;
 using prep_test::makeImage;
@@ -96,9 +95,9 @@ TEST(RangeScan, LimitsAreInclusive) {
 TEST(RangeScan, ReportsLastOffenderInRowColumnChannelOrder) {
     BayerImage image = makeImage(3, 2, 4);
     fill(image, 0.5f);
-    image.pixels()[(0 * 3 + 2) * 4 + 3] = 0.0f;  // row 0, column 2, channel 3
-    image.pixels()[(1 * 3 + 0) * 4 + 1] = 1.0f;  // row 1, column 0, channel 1
-    image.pixels()[(1 * 3 + 1) * 4 + 0] = 1.0f;  // row 1, column 1, channel 0: last
+    image.pixels()[(0 * 3 + 2) * 4 + 3] = 0.0f; // row 0, column 2, channel 3
+    image.pixels()[(1 * 3 + 0) * 4 + 1] = 1.0f; // row 1, column 0, channel 1
+    image.pixels()[(1 * 3 + 1) * 4 + 0] = 1.0f; // row 1, column 1, channel 0: last
     const prep::OutOfRangePosition found = prep::scanRange(image, 0.1f, 0.9f);
     EXPECT_EQ(found.row, 1);
     EXPECT_EQ(found.column, 1);
@@ -132,10 +131,11 @@ TEST(PixelChecks, RangeFailureExplainsLastOffender) {
     BayerImage image = makeImage(4, 3);
     fill(image, 0.5f);
     image.pixels()[0 * 4 + 1] = 0.0f;
-    image.pixels()[2 * 4 + 3] = 2.0f;  // above full scale: printed capped
+    image.pixels()[2 * 4 + 3] = 2.0f; // above full scale: printed capped
     std::ostringstream out;
-    const std::string text =
-        failureText([&] { prep::checkPixelRange(image, {20.0f, 1000.5f, 0.0f}, 1023, out); });
+    const std::string text = failureText([&] {
+        prep::checkPixelRange(image, {20.0f, 1000.5f, 0.0f}, 1023, out);
+    });
     EXPECT_EQ(text, "Image pixels are not within specified parameters of 20 to 1000.5.\n" +
                         kCauses + "\nOut of range value: (2,3) = 1023.\n");
     EXPECT_EQ(out.str(), "");
@@ -146,8 +146,9 @@ TEST(PixelChecks, PeakBelowMinimumFails) {
     fill(image, 0.25f);
     image.pixels()[3] = 0.5f;
     std::ostringstream out;
-    const std::string text =
-        failureText([&] { prep::checkPeakLevel(image, {0.0f, 1023.0f, 600.0f}, 1023, out); });
+    const std::string text = failureText([&] {
+        prep::checkPeakLevel(image, {0.0f, 1023.0f, 600.0f}, 1023, out);
+    });
     EXPECT_EQ(text, "Peak image pixel value below specified required minimum peak value of "
                     "600.\n" +
                         kCauses + "\nPeak image pixel value: 512.\n");

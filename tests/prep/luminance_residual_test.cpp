@@ -37,7 +37,7 @@ TEST(LuminanceResidual, WeighsEachChannelByItsShareOfTheLuminance) {
 
 TEST(LuminanceResidual, GridThatDoesNotFitIsNotMeasured) {
     EXPECT_LT(residualWithPixel(0, 0, 1.0f, 0, 2), 0.0f);
-    EXPECT_LT(residualWithPixel(0, 0, 1.0f, 9, 2), 0.0f);  // blocks of no RGB pixel
+    EXPECT_LT(residualWithPixel(0, 0, 1.0f, 9, 2), 0.0f); // blocks of no RGB pixel
 }
 
 TEST(LuminanceResidual, BoundInPerCentFailsPastItAndZeroIsOff) {

@@ -1,11 +1,10 @@
-#include "prep/median_filter.h"
-
-#include "prep/median_tree.h"
-#include "test_images.h"
-
 #include <stdexcept>
 
 #include <gtest/gtest.h>
+
+#include "prep/median_filter.h"
+#include "prep/median_tree.h"
+#include "test_images.h"
 
 using prep_test::fillRamp;
 using prep_test::makeImage;
@@ -68,13 +67,13 @@ TEST(MedianFilter, SizeTwoAveragesMiddleTwoOfFour) {
     std::copy(values, values + 9, planes.pixels());
     BayerImage target;
     prep::medianFilterDownsample(planes, 2, 1, target);
-    EXPECT_EQ(target.pixels()[1 * 3 + 1], 3.0f);  // sorted 1 2 4 10
+    EXPECT_EQ(target.pixels()[1 * 3 + 1], 3.0f); // sorted 1 2 4 10
 }
 
 TEST(MedianFilter, RemovesASingleDefect) {
     BayerImage planes = makeImage(5, 5, 4);
     prep_test::fill(planes, 0.25f);
-    planes.pixels()[(2 * 5 + 2) * 4 + 1] = 1.0f;  // hot pixel in channel 1
+    planes.pixels()[(2 * 5 + 2) * 4 + 1] = 1.0f; // hot pixel in channel 1
     BayerImage target;
     prep::medianFilterDownsample(planes, 3, 1, target);
     for (float v : samplesOf(target))

@@ -1,18 +1,17 @@
 // The one-pass preparation against split, median filter or down-sampling and
 // weave done one after the other.
 
-#include "prep/mosaic_preparation.h"
-
-#include "prep/bayer_planes.h"
-#include "prep/median_filter.h"
-#include "tests/prep/test_images.h"
-
 #include <cmath>
 #include <cstring>
 #include <limits>
 #include <random>
 #include <stdexcept>
 #include <string>
+
+#include "prep/bayer_planes.h"
+#include "prep/median_filter.h"
+#include "prep/mosaic_preparation.h"
+#include "tests/prep/test_images.h"
 
 namespace {
 
@@ -43,12 +42,11 @@ BayerImage inSteps(const BayerImage& mosaic, const MosaicPreparation& settings) 
     const BayerImage planes = prep::split(mosaic);
     BayerImage reduced;
     if (settings.medianFilter)
-        prep::medianFilterDownsample(planes, settings.medianSize, settings.samplingFactor,
-                                     reduced);
+        prep::medianFilterDownsample(planes, settings.medianSize, settings.samplingFactor, reduced);
     else
         prep::downsample(planes, settings.samplingFactor, reduced);
-    return prep::weave(reduced, prep::patternSize(buffer->cfa[0], buffer->cfa[1]),
-                       buffer->cfa[0], buffer->cfa[1]);
+    return prep::weave(reduced, prep::patternSize(buffer->cfa[0], buffer->cfa[1]), buffer->cfa[0],
+                       buffer->cfa[1]);
 }
 
 // Same geometry, types and bit for bit the same samples.
@@ -99,7 +97,7 @@ TEST(MosaicPreparation, MatchesPlainDownSamplingWhenTheFilterIsOff) {
     for (std::uint32_t cfa : {kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr})
         for (int factor : {1, 2, 4, 5}) {
             const BayerImage mosaic = noisyMosaic(37, 29, cfa);
-            const MosaicPreparation settings{false, 11, factor};  // the size is not used
+            const MosaicPreparation settings{false, 11, factor}; // the size is not used
             expectSameImage(prep::prepareMosaic(mosaic, settings), inSteps(mosaic, settings));
         }
 }

@@ -1,6 +1,6 @@
-#include "prep/number_line.h"
-
 #include <gtest/gtest.h>
+
+#include "prep/number_line.h"
 
 namespace {
 
@@ -40,8 +40,8 @@ TEST(NumberLine, ReadsDecimalForms) {
 }
 
 TEST(NumberLine, RefusesNonFiniteAndMalformedDecimals) {
-    for (const char* text : {"nan", "inf", "-infinity", "1e", "1e+", ".", "-", "0x1p3", "1e40",
-                             ""}) {
+    for (const char* text :
+         {"nan", "inf", "-infinity", "1e", "1e+", ".", "-", "0x1p3", "1e40", ""}) {
         prep::NumberLine line(text);
         line.decimal();
         line.expectEnd();

@@ -1,19 +1,18 @@
-#include "prep/sample_file.h"
-
-#include "tests/support/temp_dir.h"
-#include "test_images.h"
-
 #include <stdexcept>
 #include <string>
 
 #include <gtest/gtest.h>
 
+#include "prep/sample_file.h"
+#include "test_images.h"
+#include "tests/support/temp_dir.h"
+
 using testing_support::TempDir;
 
 namespace {
 
-std::string parseError(const std::string& text, std::int32_t width = 648,
-                       std::int32_t height = 486, int factor = 4) {
+std::string parseError(const std::string& text, std::int32_t width = 648, std::int32_t height = 486,
+                       int factor = 4) {
     try {
         prep::parseSampleFile(text, width, height, {1023, factor});
     } catch (const std::runtime_error& e) {
@@ -38,19 +37,17 @@ TEST(SampleFullScale, KeptToSixteenBits) {
 TEST(SampleFileFormat, TenBitUnitsCappedAtFullScale) {
     const float levels[4] = {0.5f, 1.0f, 0.999f, 1.2f};
     std::vector<shadingSample> samples = {{2, 4, {0.0f, 0.25f, 1.2f, -0.1f}}};
-    EXPECT_EQ(prep::formatSampleFile(levels, samples, 648, 486, {1023, 1}),
-              "512,1023,1022,1023\n"
-              "648,486,4\n"
-              "2,4,0,256,1023,0\n");
+    EXPECT_EQ(prep::formatSampleFile(levels, samples, 648, 486, {1023, 1}), "512,1023,1022,1023\n"
+                                                                            "648,486,4\n"
+                                                                            "2,4,0,256,1023,0\n");
 }
 
 TEST(SampleFileFormat, SizeAndCoordinatesInFullResolution) {
     const float levels[4] = {0, 0, 0, 0};
     std::vector<shadingSample> samples = {{25, 12, {0, 0, 0, 0}}};
-    EXPECT_EQ(prep::formatSampleFile(levels, samples, 648, 486, {1023, 4}),
-              "0,0,0,0\n"
-              "2592,1944,4\n"
-              "100,48,0,0,0,0\n");
+    EXPECT_EQ(prep::formatSampleFile(levels, samples, 648, 486, {1023, 4}), "0,0,0,0\n"
+                                                                            "2592,1944,4\n"
+                                                                            "100,48,0,0,0,0\n");
 }
 
 TEST(SampleFileParse, ScalesDownBySamplingFactor) {
@@ -101,15 +98,15 @@ TEST(SampleFileParse, SizeMustMatchPreparedImage) {
         "Width and height in sample file does not match input image dimensions.";
     EXPECT_EQ(parseError("1,2,3,4\n2592,1940,4\n"), expected);
     EXPECT_EQ(parseError("1,2,3,4\n648,486,4\n"), expected);
-    EXPECT_EQ(parseError("1,2,3,4\n2595,1947,4\n"), "(no error)");  // divides down to 648 x 486
+    EXPECT_EQ(parseError("1,2,3,4\n2595,1947,4\n"), "(no error)"); // divides down to 648 x 486
 }
 
 TEST(SampleFileParse, RefusesMalformedSampleLines) {
     const std::string head = "1,2,3,4\n2592,1944,4\n";
     const std::string expected = "Invalid format in sample file.";
-    for (const char* line : {"100,50,1,2,3\n", "100,50,1,2,3,4,5\n", "100,50,1,2,3,4 junk\n",
-                             "100,50,nan,2,3,4\n", "100,50,1,inf,3,4\n", "100.5,50,1,2,3,4\n",
-                             "100;50;1;2;3;4\n"})
+    for (const char* line :
+         {"100,50,1,2,3\n", "100,50,1,2,3,4,5\n", "100,50,1,2,3,4 junk\n", "100,50,nan,2,3,4\n",
+          "100,50,1,inf,3,4\n", "100.5,50,1,2,3,4\n", "100;50;1;2;3;4\n"})
         EXPECT_EQ(parseError(head + line), expected) << line;
 }
 

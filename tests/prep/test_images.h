@@ -1,13 +1,13 @@
 #pragma once
 // Small float images for the preparation tests.
 
-#include "image/bayer_image.h"
-#include "image/image_buffer.h"
-
 #include <cstdint>
 #include <vector>
 
 #include <gtest/gtest.h>
+
+#include "image/bayer_image.h"
+#include "image/image_buffer.h"
 
 namespace prep_test {
 
@@ -17,30 +17,30 @@ inline BayerImage makeImage(std::int32_t width, std::int32_t height, std::uint16
     BayerImage image;
     const bool raw = channels == 1;
     image.reset(imageCreate(width, height, bits, channels, 1, 0, cfa1,
-                            raw ? kPixelRaw : kPixelOther,
-                            raw ? kBufferRawCfa : kBufferInterleaved, kDataReal32, &result));
+                            raw ? kPixelRaw : kPixelOther, raw ? kBufferRawCfa : kBufferInterleaved,
+                            kDataReal32, &result));
     EXPECT_EQ(result, 0);
     return image;
 }
 
 // Fills every sample with its index scaled into 0..1.
 inline void fillRamp(BayerImage& image) {
-    const std::size_t count = static_cast<std::size_t>(image.width()) * image.height() *
-                              image.channels();
+    const std::size_t count =
+        static_cast<std::size_t>(image.width()) * image.height() * image.channels();
     for (std::size_t i = 0; i < count; ++i)
         image.pixels()[i] = static_cast<float>(i) / static_cast<float>(count);
 }
 
 inline void fill(BayerImage& image, float value) {
-    const std::size_t count = static_cast<std::size_t>(image.width()) * image.height() *
-                              image.channels();
+    const std::size_t count =
+        static_cast<std::size_t>(image.width()) * image.height() * image.channels();
     for (std::size_t i = 0; i < count; ++i)
         image.pixels()[i] = value;
 }
 
 inline std::vector<float> samplesOf(const BayerImage& image) {
-    const std::size_t count = static_cast<std::size_t>(image.width()) * image.height() *
-                              image.channels();
+    const std::size_t count =
+        static_cast<std::size_t>(image.width()) * image.height() * image.channels();
     return std::vector<float>(image.pixels(), image.pixels() + count);
 }
 

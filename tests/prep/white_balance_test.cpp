@@ -1,10 +1,9 @@
-#include "prep/white_balance.h"
-
-#include "test_images.h"
-
 #include <stdexcept>
 
 #include <gtest/gtest.h>
+
+#include "prep/white_balance.h"
+#include "test_images.h"
 
 using prep_test::makeImage;
 
@@ -59,8 +58,10 @@ TEST_P(WhiteBalance, TargetLevelsGiveGainsPerChannel) {
     prep::whiteBalance(context);
     const float gains[4] = {2.0f, 1.0f, 1.0f, 4.0f};
     // Channel k of (x, y) for the pattern under test.
-    const int phase = GetParam() == kCfaGrbg ? 1 : GetParam() == kCfaGbrg ? 2
-                                                 : GetParam() == kCfaBggr ? 3 : 0;
+    const int phase = GetParam() == kCfaGrbg   ? 1
+                      : GetParam() == kCfaGbrg ? 2
+                      : GetParam() == kCfaBggr ? 3
+                                               : 0;
     for (int y = 0; y < 4; ++y)
         for (int x = 0; x < 4; ++x) {
             const int channel = ((x + phase) & 1) + ((y + (phase >> 1)) & 1) * 2;
@@ -138,14 +139,14 @@ TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
 
 TEST(MeasureLevels, BoxMeanShrinksAtBorders) {
     ProcessingContext context;
-    context.corrected = channelImage(10, 10, {0, 0, 0, 0});  // 5 x 5 planes
-    context.awbFilterSize = 6;                                 // side 3
-    context.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;     // red plane (2, 2)
-    context.corrected.pixels()[0 * 10 + 1] = 9.0f;             // green/red plane (0, 0)
+    context.corrected = channelImage(10, 10, {0, 0, 0, 0}); // 5 x 5 planes
+    context.awbFilterSize = 6;                              // side 3
+    context.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;  // red plane (2, 2)
+    context.corrected.pixels()[0 * 10 + 1] = 9.0f;          // green/red plane (0, 0)
     float levels[4];
     prep::measureLevels(levels, context);
-    EXPECT_FLOAT_EQ(levels[0], 1.0f);   // 9 over a full 3 x 3 window
-    EXPECT_FLOAT_EQ(levels[1], 2.25f);  // 9 over the 2 x 2 corner window
+    EXPECT_FLOAT_EQ(levels[0], 1.0f);  // 9 over a full 3 x 3 window
+    EXPECT_FLOAT_EQ(levels[1], 2.25f); // 9 over the 2 x 2 corner window
     EXPECT_FLOAT_EQ(levels[2], 0.0f);
 }
 

@@ -19,7 +19,7 @@ namespace {
 struct BayerOrder {
     const char* name;
     std::uint32_t cfa;
-    std::uint32_t code;  // four-character code of a container header
+    std::uint32_t code; // four-character code of a container header
     int phase;
 };
 
@@ -84,7 +84,7 @@ struct Geometry {
 
     double radiusSquared(double x, double y) const {
         if (halfDiagonal <= 0.0)
-            return 0.0;  // a single pixel has no falloff
+            return 0.0; // a single pixel has no falloff
         const double dx = (x - cx) / halfDiagonal, dy = (y - cy) / halfDiagonal;
         return dx * dx + dy * dy;
     }
@@ -259,8 +259,8 @@ std::string kqraw2FileBytes(const FlatField& field, const CaptureInfo& capture) 
 
 std::string fixedHeaderFileBytes(const FlatField& field, const CaptureInfo& capture) {
     std::string bytes(kFixedHeaderSize, '\0');
-    putU32(bytes, 0, 1);  // format version
-    putU32(bytes, 4, 1);  // header revision: exposure time as float at +36
+    putU32(bytes, 0, 1); // format version
+    putU32(bytes, 4, 1); // header revision: exposure time as float at +36
     putU32(bytes, 8, std::uint32_t(field.shape.width));
     putU32(bytes, 12, std::uint32_t(field.shape.height));
     putU32(bytes, 16, bayerCodeOf(field.shape.cfa));

@@ -18,14 +18,14 @@ class ModuleShading;
 struct FlatFieldShape {
     int width = 640;
     int height = 480;
-    int bits = 10;                          // sample bit depth, 1..16
-    std::uint32_t cfa = 0x23340000;         // second cfa word: RGGB
-    double centerLevel = 0.8;               // green level at the optical centre, fraction of full scale
-    double cornerLevel = 0.5;               // green level in the corners relative to the centre, (0, 1]
-    double centerX = 0.5, centerY = 0.5;    // optical centre, fraction of width and height
-    double channelLevel[4] = {0.55, 1.0, 1.0, 0.65};  // R, GR, GB, B relative to green
-    double colourShading = 0.08;            // extra relative fall of red and rise of blue at the corners
-    double noise = 0.0;                     // standard deviation, fraction of full scale
+    int bits = 10;                  // sample bit depth, 1..16
+    std::uint32_t cfa = 0x23340000; // second cfa word: RGGB
+    double centerLevel = 0.8;       // green level at the optical centre, fraction of full scale
+    double cornerLevel = 0.5;       // green level in the corners relative to the centre, (0, 1]
+    double centerX = 0.5, centerY = 0.5;             // optical centre, fraction of width and height
+    double channelLevel[4] = {0.55, 1.0, 1.0, 0.65}; // R, GR, GB, B relative to green
+    double colourShading = 0.08; // extra relative fall of red and rise of blue at the corners
+    double noise = 0.0;          // standard deviation, fraction of full scale
     // When set, the shading measured on a real module replaces the radial
     // model (corner level, centre and colour shading are then unused), scaled
     // so that its brightest green is centerLevel.
@@ -35,14 +35,14 @@ struct FlatFieldShape {
     // sample units.
     double fullWell = 0.0;
     double readNoise = 0.0;
-    int defects = 0;                        // hot and dead pixels, placed at random
-    int blackLevel = 0;                     // pedestal added to every sample, in sample units
+    int defects = 0;    // hot and dead pixels, placed at random
+    int blackLevel = 0; // pedestal added to every sample, in sample units
     std::uint32_t seed = 1;
 };
 
 struct FlatField {
     FlatFieldShape shape;
-    std::vector<std::uint16_t> samples;     // width * height, row-major
+    std::vector<std::uint16_t> samples; // width * height, row-major
     // Sample indices (y * width + x) of the defects: hot ones at full scale, dead ones at 0.
     std::vector<std::size_t> hotPixels, deadPixels;
 
@@ -66,8 +66,8 @@ FlatField makeFlatField(const FlatFieldShape& shape);
 struct CaptureInfo {
     float exposureTime = 33.0f;
     float gains[4] = {1.0f, 1.0f, 1.0f, 1.0f};
-    std::string serialNumber;               // text, as the camera stack writes it
-    std::uint64_t sensorGuid = 0;           // fixed-header file and details file only
+    std::string serialNumber;     // text, as the camera stack writes it
+    std::uint64_t sensorGuid = 0; // fixed-header file and details file only
 };
 
 // Creation time stamped into every header block: 2026-12-01 09:00 UTC, so files are reproducible.
@@ -101,9 +101,10 @@ public:
     // Any block, with an explicit size field (which may lie) and reserved bytes.
     // The tag and the reserved bytes must be 16 bytes long (std::invalid_argument).
     KqRawBuilder& block(const std::string& tag16, const std::string& payload,
-                        std::uint32_t sizeField, const std::string& reserved16 = std::string(16, '\0'));
+                        std::uint32_t sizeField,
+                        const std::string& reserved16 = std::string(16, '\0'));
     KqRawBuilder& block(const std::string& tag16, const std::string& payload);
-    KqRawBuilder& raw(const std::string& bytes);  // anything, appended as is
+    KqRawBuilder& raw(const std::string& bytes); // anything, appended as is
     const std::string& bytes() const { return bytes_; }
 
 private:

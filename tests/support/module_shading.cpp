@@ -131,9 +131,10 @@ std::vector<double> splineWeights(int count, double size, double t) {
         } else {
             const int i = static_cast<int>(std::floor(position));
             const double s = position - i, r = 1.0 - s;
-            value = r * y(i) + s * y(i + 1) +
-                    h * h / 6.0 *
-                        ((r * r * r - r) * m[std::size_t(i)] + (s * s * s - s) * m[std::size_t(i + 1)]);
+            value =
+                r * y(i) + s * y(i + 1) +
+                h * h / 6.0 *
+                    ((r * r * r - r) * m[std::size_t(i)] + (s * s * s - s) * m[std::size_t(i + 1)]);
         }
         weights[std::size_t(node)] = value;
     }

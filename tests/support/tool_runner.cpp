@@ -2,11 +2,12 @@
 
 #include <cstdio>
 #include <cstdlib>
+
+#include "tests/support/temp_dir.h"
+
 #include <fcntl.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include "tests/support/temp_dir.h"
 
 namespace testing_support {
 
@@ -64,7 +65,7 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
         dup2(fileno(err), 2);
         if (!dir.empty() && chdir(dir.c_str()) != 0)
             _exit(127);
-        execvp(argv[0], argv.data());  // the emulator may be named without a path
+        execvp(argv[0], argv.data()); // the emulator may be named without a path
         _exit(127);
     }
     int status = 0;

@@ -7,9 +7,9 @@
 namespace testing_support {
 
 struct ToolResult {
-    int status = -1;  // exit status; -1 when the tool did not exit normally
-    std::string out;  // standard output
-    std::string err;  // standard error
+    int status = -1; // exit status; -1 when the tool did not exit normally
+    std::string out; // standard output
+    std::string err; // standard error
 };
 
 // Runs the tool with the arguments (not including the program name) in the
