@@ -16,6 +16,7 @@ test_packages=(
     python3                 # the report tests; the man page and bash completion
     python3-jsonschema      # the result tests validate --json documents against their schema
     groff-base              # the install test renders the man page
+    clang-format-14         # scripts/check-format.sh: the sources follow .clang-format
 )
 
 . "$(dirname "$0")/lib/apt-missing.sh"
