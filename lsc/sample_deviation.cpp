@@ -77,7 +77,9 @@ void measureSampleDeviations(const WorkingImage& image, const std::vector<shadin
     const std::int64_t width = image.width, height = image.height;
     // Neighbours' windows just clear of the sample's (2 x window pixels wide).
     const std::int64_t d =
-        std::max<std::int64_t>(static_cast<std::int64_t>(0.03 * width), 2 * window) & ~1;
+        std::max<std::int64_t>(static_cast<std::int64_t>(0.03 * static_cast<double>(width)),
+                               2 * window) &
+        ~1;
 
     double sumOfSquares[kChannels] = {0, 0, 0, 0};
     std::size_t count = 0;

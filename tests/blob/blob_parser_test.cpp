@@ -174,7 +174,7 @@ TEST_F(BlobParser, EmptySerialIsStoredEmpty) {
 }
 
 TEST_F(BlobParser, TrackingLengthBelowItsOwnSizeIsCorrupt) {
-    for (std::uint8_t length : {0, 1}) {
+    for (std::uint8_t length : {std::uint8_t{0}, std::uint8_t{1}}) {
         EXPECT_EQ(failure(BlobBuilder().block(kTrackingBlock, {0, length, 0, 0}).build()),
                   "Binary calibration data is corrupt.");
     }

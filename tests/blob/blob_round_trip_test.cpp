@@ -43,7 +43,8 @@ std::string calibrationText(const std::string& controlPointPrefix) {
                 value.precision(12);
                 value << (c == 2 && i == 0 && j == 0
                               ? -0.001f
-                              : 1.1f + 0.0371f * (c + i * j) - (i == 9 ? 3.0f : 0.0f));
+                              : 1.1f + 0.0371f * static_cast<float>(c + i * j) -
+                                    (i == 9 ? 3.0f : 0.0f));
                 text += controlPointPrefix + ".controlPoint" + names[c] + "[" + std::to_string(i) +
                         "][" + std::to_string(j) + "]  = " + value.str() + ";\n";
             }

@@ -78,8 +78,9 @@ INSTANTIATE_TEST_SUITE_P(AllOrders, BlockMeansByOrder,
 
 TEST(BlockMeans, AveragesEachBlockOverItsOwnCells) {
     // Red grows with the cell column: cells 0..5 across, two blocks of three cells.
-    const BayerImage image =
-        makeMosaic(12, 4, kCfaRggb, [](int x, int y) { return (x + y) % 2 ? 0.0f : x / 2 + 0.0f; });
+    const BayerImage image = makeMosaic(12, 4, kCfaRggb, [](int x, int y) {
+        return (x + y) % 2 ? 0.0f : static_cast<float>(x / 2);
+    });
     const ChannelBlockMeans means = blockMeans(image, 2, 1);
     ASSERT_EQ(means.mean[0].size(), 2u);
     EXPECT_FLOAT_EQ(means.mean[0][0], 1.0f); // cells 0, 1, 2
@@ -88,8 +89,9 @@ TEST(BlockMeans, AveragesEachBlockOverItsOwnCells) {
 
 TEST(BlockMeans, DealsUnevenCellsToBlocksInOrder) {
     // Five cells across into two blocks: cells 0..2 and 3..4.
-    const BayerImage image =
-        makeMosaic(10, 2, kCfaRggb, [](int x, int y) { return (x + y) % 2 ? 0.0f : x / 2 + 0.0f; });
+    const BayerImage image = makeMosaic(10, 2, kCfaRggb, [](int x, int y) {
+        return (x + y) % 2 ? 0.0f : static_cast<float>(x / 2);
+    });
     const ChannelBlockMeans means = blockMeans(image, 2, 1);
     EXPECT_FLOAT_EQ(means.mean[0][0], 1.0f);
     EXPECT_FLOAT_EQ(means.mean[0][1], 3.5f);
@@ -183,7 +185,9 @@ TEST(GainSurface, ConstantGridGivesThatGainEverywhere) {
 
 TEST(GainSurface, SamplesCellCentresWithTheCorrectionsPatchChoice) {
     float grid[kGridPoints];
-    fillGrid(grid, [](int r, int c) { return 1.0f + 0.1f * r + 0.01f * c; });
+    fillGrid(grid, [](int r, int c) {
+        return 1.0f + 0.1f * static_cast<float>(r) + 0.01f * static_cast<float>(c);
+    });
     const GainSurface surface = sampleGainSurface(grid, 1000, 800, kDefaultFractions, 4, 2);
     // Cell (column 1, row 0) has its centre at pixel (375, 200): centre patch
     // column with u = 125 / 500, top patch row with v = 0.

@@ -18,7 +18,7 @@ std::size_t count(const std::string& text, const std::string& part) {
 }
 
 double luminance(const std::string& colour) {
-    const long rgb = std::strtol(colour.c_str() + 1, nullptr, 16);
+    const auto rgb = static_cast<int>(std::strtol(colour.c_str() + 1, nullptr, 16));
     return 0.2126 * ((rgb >> 16) & 0xff) + 0.7152 * ((rgb >> 8) & 0xff) + 0.0722 * (rgb & 0xff);
 }
 

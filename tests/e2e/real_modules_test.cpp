@@ -223,7 +223,7 @@ double calibrationError(const FlatField& field, const BayerImage& capture,
             }
         double mean = 0.0;
         for (double m : means)
-            mean += m / means.size();
+            mean += m / static_cast<double>(means.size());
         for (double m : means)
             worst = std::max(worst, std::fabs(m / mean - 1.0));
     }
@@ -238,7 +238,7 @@ TEST_F(ModuleRun, AutomaticLayoutIsNoWorseThanTheConfiguredOne) {
     BayerImage capture;
     capture.read(path("flat.kqraw"));
     ProcessingContext settings;
-    settings.blackLevel = kImx219.blackLevel / 1023.0f;
+    settings.blackLevel = static_cast<float>(kImx219.blackLevel) / 1023.0f;
     settings.sampleAngleStep = 8;
     const LayoutChoice choice = chooseLayout(capture, settings);
     const LayoutChoice again = chooseLayout(capture, settings);

@@ -30,8 +30,8 @@ ImagePtr rawImage(std::int32_t width, std::int32_t height, std::uint16_t bits, s
 
 // Widening gives exactly what the copying conversion gives, for every sample
 // (the image spans several of the in-place chunks and ends in a partial one).
-void expectWideningMatchesCopy(std::uint16_t bits, std::uint32_t type, bool room) {
-    ImagePtr image = rawImage(131, 97, bits, type, room);
+void expectWideningMatchesCopy(int bits, std::uint32_t type, bool room) {
+    ImagePtr image = rawImage(131, 97, static_cast<std::uint16_t>(bits), type, room);
     const std::size_t count = 131 * 97;
     for (std::size_t i = 0; i < count; ++i) {
         const auto value = static_cast<std::uint32_t>(i * 2654435761u >> 7);
@@ -54,9 +54,9 @@ void expectWideningMatchesCopy(std::uint16_t bits, std::uint32_t type, bool room
 
 TEST(WidenSamplesToFloat, MatchesTheCopyingConversionInPlaceOrNot) {
     for (bool room : {true, false}) {
-        for (std::uint16_t bits : {1, 10, 12, 16})
+        for (int bits : {1, 10, 12, 16})
             expectWideningMatchesCopy(bits, kDataUint16, room);
-        for (std::uint16_t bits : {4, 8})
+        for (int bits : {4, 8})
             expectWideningMatchesCopy(bits, kDataUint8, room);
     }
 }

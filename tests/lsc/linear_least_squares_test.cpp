@@ -20,13 +20,13 @@ using lsc_test::caught;
 // Least squares through the normal equations AᵀA x = Aᵀb, in long double with
 // partial pivoting: an independent reference for well-conditioned problems.
 std::vector<long double> normalEquations(const denseMatrix& a, const denseMatrix& b) {
-    const std::size_t m = a.rows(), n = a.columns();
+    const std::uint32_t m = a.rows(), n = a.columns();
     std::vector<long double> g(n * (n + 1), 0.0L);
-    for (std::size_t i = 0; i < n; ++i) {
-        for (std::size_t j = 0; j < n; ++j)
-            for (std::size_t r = 0; r < m; ++r)
+    for (std::uint32_t i = 0; i < n; ++i) {
+        for (std::uint32_t j = 0; j < n; ++j)
+            for (std::uint32_t r = 0; r < m; ++r)
                 g[i * (n + 1) + j] += static_cast<long double>(a(r, i)) * a(r, j);
-        for (std::size_t r = 0; r < m; ++r)
+        for (std::uint32_t r = 0; r < m; ++r)
             g[i * (n + 1) + n] += static_cast<long double>(a(r, i)) * b[r];
     }
     for (std::size_t k = 0; k < n; ++k) {

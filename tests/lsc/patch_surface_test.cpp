@@ -74,7 +74,7 @@ TEST(PatchSurface, CopyToGridWritesEveryGlobalPointOnce) {
     float grid[100];
     s.copyToGrid(grid);
     for (int i = 0; i < 100; ++i)
-        EXPECT_EQ(grid[i], i + 0.25f) << i;
+        EXPECT_EQ(grid[i], static_cast<float>(i) + 0.25f) << i;
 }
 
 TEST(PatchSurface, FitReproducesAPlaneExactly) {

@@ -39,7 +39,7 @@ TEST(MosaicStream, GivesTheBitsOfTheFloatPreparation) {
         const std::uint32_t mask = (1u << c.bits) - 1u;
         std::vector<std::uint16_t> samples(static_cast<std::size_t>(c.width) * c.height);
         for (std::uint16_t& s : samples) {
-            const std::uint32_t pick = random() % 100;
+            const auto pick = static_cast<std::uint32_t>(random() % 100);
             s = static_cast<std::uint16_t>(pick < 3    ? mask
                                            : pick < 6  ? 0
                                            : pick < 30 ? mask / 2
