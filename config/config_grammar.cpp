@@ -22,6 +22,7 @@
 #include "config/config_messages.h"
 #include "config/value_text.h"
 #include "image/error_detail.h"
+#include "image/file_ptr.h"
 
 namespace {
 
@@ -214,10 +215,6 @@ private:
     qi::rule<Iterator, Value()> value_;
 };
 
-struct FileClose {
-    void operator()(std::FILE* file) const noexcept { std::fclose(file); }
-};
-
 } // namespace
 
 void parse_config_text(std::string_view text, config_node& config, const std::string& sourceName) {
@@ -242,7 +239,7 @@ void parse_config_text(std::string_view text, config_node& config, const std::st
 }
 
 std::string read_config_text(const std::string& path) {
-    std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
+    img::FilePtr file(std::fopen(path.c_str(), "rb"));
     if (!file)
         throw DetailedError<std::invalid_argument>(systemReason(path, errno),
                                                    config::msg::kCannotOpenConfig);

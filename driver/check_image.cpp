@@ -5,10 +5,10 @@
 #include <cstdint>
 #include <stdexcept>
 
+#include "image/bayer_phase.h"
 #include "image/error_detail.h"
 #include "image/image_buffer.h"
 #include "image/tiff_writer.h"
-#include "lsc/bayer_phase.h"
 #include "lsc/lens_shading_correction.h"
 
 void writeCheckImage(const std::string& path, BayerImage capture, const ProcessingContext& fit) {
@@ -36,14 +36,14 @@ void writeCheckImage(const std::string& path, BayerImage capture, const Processi
                              kPixelRaw, kBufferRawCfa, kDataUint16, &rc));
     if (!out)
         throw std::runtime_error("Unable to allocate image memory.");
-    const int phase = bayerPhase(corrected.cfa());
+    const int phase = img::bayerPhase(corrected.cfa());
     const float* in = corrected.pixels();
     auto* samples = static_cast<std::uint16_t*>(out->data);
     const std::int32_t width = corrected.width();
     for (std::int32_t y = 0; y < corrected.height(); ++y) {
         const float rowBalance[2] = {
-            balance[bayerChannel(0, static_cast<std::uint64_t>(y), phase)],
-            balance[bayerChannel(1, static_cast<std::uint64_t>(y), phase)]};
+            balance[img::bayerChannel(0, static_cast<std::uint64_t>(y), phase)],
+            balance[img::bayerChannel(1, static_cast<std::uint64_t>(y), phase)]};
         const std::size_t row = static_cast<std::size_t>(y) * static_cast<std::size_t>(width);
         for (std::int32_t x = 0; x < width; ++x) {
             const float value = in[row + x] * rowBalance[x & 1] * 65535.0f + 0.5f;

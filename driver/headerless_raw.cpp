@@ -12,6 +12,7 @@
 
 #include "config/strip_comments.h"
 #include "driver/driver_messages.h"
+#include "image/file_ptr.h"
 #include "image/hex_text.h"
 #include "image/image_buffer.h"
 #include "lsc/apan_exception.h"
@@ -90,10 +91,6 @@ void checkSerial(const std::string& serial) {
         throw apan::exception(263, msg::kSerialNotHex + serial, msg::kSerialHint);
 }
 
-struct FileClose {
-    void operator()(std::FILE* file) const noexcept { std::fclose(file); }
-};
-
 bool isDirectory(std::FILE* file) {
     struct stat info;
     return fstat(fileno(file), &info) == 0 && S_ISDIR(info.st_mode);
@@ -106,7 +103,7 @@ constexpr std::size_t kMaxDetailsBytes = 1 << 20;
 // The whole details file, or false when it cannot be opened or read (a
 // directory, a read error, no end within kMaxDetailsBytes).
 bool readDetailsText(const std::string& path, std::string& text) {
-    std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
+    img::FilePtr file(std::fopen(path.c_str(), "rb"));
     if (!file || isDirectory(file.get()))
         return false;
     char chunk[4096];
@@ -170,7 +167,7 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
                                     "' in headerless raw details file (with raw.legacy_format = 1 "
                                     "it must be 1 to 16 hexadecimal digits).");
 
-    std::unique_ptr<std::FILE, FileClose> file(std::fopen(rawPath.c_str(), "rb"));
+    img::FilePtr file(std::fopen(rawPath.c_str(), "rb"));
     // A directory opens for reading but holds no samples.
     if (!file || isDirectory(file.get()))
         throw apan::exception(210, msg::kRawOpen + rawPath, msg::kRawOpenHint);

@@ -30,6 +30,7 @@
 #include "driver/run_result_json.h"
 #include "driver/unknown_settings.h"
 #include "driver/version.h"
+#include "image/bayer_phase.h"
 #include "image/hex_text.h"
 #include "image/output_file.h"
 #include "lsc/lens_shading_correction.h"
@@ -326,8 +327,7 @@ void Pipeline::loadInput() {
         }
         // A code the reader does not know leaves no Bayer order: every later
         // stage would fail with a message that points elsewhere.
-        const std::uint32_t cfa = input_.cfa();
-        if (cfa != kCfaRggb && cfa != kCfaGrbg && cfa != kCfaGbrg && cfa != kCfaBggr)
+        if (img::knownBayerPhase(input_.cfa()) < 0)
             throw std::runtime_error(msg::kUnknownBayerOrder);
     } else {
         const int bits = settings_.bitRes == 0 ? 10 : settings_.bitRes;

@@ -6,7 +6,7 @@
 #include <stdexcept>
 
 #include "driver/report_messages.h"
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "lsc/eval_patch.h"
 
 namespace {
@@ -57,12 +57,12 @@ ChannelBlockMeans blockMeans(const BayerImage& mosaic, int columns, int rows) {
     std::vector<double> sums(blocks * kChannels, 0.0);
     std::vector<std::uint64_t> cells(blocks, 0);
 
-    const int phase = bayerPhase(image->cfa[1]);
+    const int phase = img::bayerPhase(image->cfa[1]);
     const float* pixels = static_cast<const float*>(image->data);
     for (std::uint64_t y = 0; y < 2 * cellsY; ++y) {
         const std::size_t blockRow = static_cast<std::size_t>((y / 2) * means.rows / cellsY);
         const float* row = pixels + y * width;
-        const int channels[2] = {bayerChannel(0, y, phase), bayerChannel(1, y, phase)};
+        const int channels[2] = {img::bayerChannel(0, y, phase), img::bayerChannel(1, y, phase)};
         for (std::size_t b = 0; b < static_cast<std::size_t>(means.columns); ++b) {
             // A row's share of one block in single precision, gathered in double.
             float even = 0.0f, odd = 0.0f;

@@ -8,6 +8,7 @@
 #include <stdexcept>
 
 #include "image/error_detail.h"
+#include "image/file_ptr.h"
 #include "image/hex_text.h"
 #include "image/image_messages.h"
 #include "image/image_result.h"
@@ -30,12 +31,11 @@ namespace {
 // image.": the system's reason when the file does not open, else what the
 // reader found wrong with it.
 std::string readFailureReason(const std::string& path, int rc) {
-    std::FILE* file = std::fopen(path.c_str(), "rb");
+    const img::FilePtr file(std::fopen(path.c_str(), "rb"));
     if (!file)
         return systemReason(path, errno);
-    const int first = std::fgetc(file);
-    const int error = std::ferror(file) ? errno : 0;
-    std::fclose(file);
+    const int first = std::fgetc(file.get());
+    const int error = std::ferror(file.get()) ? errno : 0;
     if (error != 0)
         return systemReason(path, error);
     if (first == EOF)

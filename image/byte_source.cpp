@@ -6,6 +6,7 @@
 #include <memory>
 #include <new>
 
+#include "image/file_ptr.h"
 #include "image/image_result.h"
 
 #include <sys/stat.h>
@@ -66,10 +67,7 @@ bool FileSource::readAt(std::uint64_t position, void* dst, std::size_t n) noexce
 
 namespace {
 
-struct FileClose {
-    void operator()(std::FILE* file) const noexcept { std::fclose(file); }
-};
-using FilePtr = std::unique_ptr<std::FILE, FileClose>;
+using img::FilePtr;
 
 // Reads a stream of unknown length into one malloc'd block.
 ByteSource* readStream(FilePtr file, const char* path, int* result) {

@@ -3,30 +3,13 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "image/bayer_phase.h"
 #include "image/image_result.h"
 
 namespace {
 
 // Colour of a pixel within its 2x2 cell.
 enum Site { kRed = 0, kGreenOnRedRow = 1, kGreenOnBlueRow = 2, kBlue = 3 };
-
-// Bayer phase of a pattern (0 to 3), or -1 for anything else.
-int bayerPhase(std::uint32_t cfa0, std::uint32_t cfa1) {
-    if (cfa0 != 0)
-        return -1;
-    switch (cfa1) {
-    case kCfaRggb:
-        return 0;
-    case kCfaGrbg:
-        return 1;
-    case kCfaGbrg:
-        return 2;
-    case kCfaBggr:
-        return 3;
-    default:
-        return -1;
-    }
-}
 
 // The neighbour beyond an edge is the one on the other side, which has the
 // same colour. A line of one pixel has no other side and uses the pixel itself.
@@ -110,7 +93,8 @@ ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept {
         *result = img::kUnsupported;
         return nullptr;
     }
-    const int phase = bayerPhase(source->cfa[0], source->cfa[1]);
+    // A cfa pattern word in the first slot is no 2 x 2 pattern.
+    const int phase = source->cfa[0] != 0 ? -1 : img::knownBayerPhase(source->cfa[1]);
     if (phase < 0) {
         *result = img::kWrongFormat;
         return nullptr;
@@ -133,8 +117,7 @@ ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept {
         const RowNeighbours rows{samples + mirror(row - 1, height) * width, samples + y * width,
                                  samples + mirror(row + 1, height) * width};
         std::uint8_t* rgbRow = out + 3 * y * width;
-        const int rowSite = ((static_cast<int>(y % 2) + (phase >> 1)) & 1) * 2;
-        switch (rowSite + (phase & 1)) {
+        switch (img::bayerChannel(0, y, phase)) {
         case kRed:
             demosaicRow<kRed, kGreenOnRedRow>(rows, width, rgbRow);
             break;

@@ -12,6 +12,7 @@
 #include "image/export_messages.h"
 #include "image/image_result.h"
 #include "image/output_file.h"
+#include "image/tiff_ptr.h"
 
 #include <sys/stat.h>
 #include <sys/types.h>
@@ -198,28 +199,26 @@ int tiffWrite(const char* path, const ImageBuffer* image) noexcept {
     if (!file.open(path))
         return img::kBadArgument;
     StreamTarget target{file.stream(), false};
-    TIFF* tiff = openTiff(&target, path);
+    const img::TiffPtr tiff(openTiff(&target, path));
     if (!tiff)
         return img::kIoError;
-    bool ok = setTags(tiff, *image, description.c_str());
+    bool ok = setTags(tiff.get(), *image, description.c_str());
     const std::uint64_t expectedRow =
         static_cast<std::uint64_t>(image->width) * imageSampleBytes(image->dataType) *
         (image->bufferType == kBufferPlanar ? 1 : image->samplesPerPixel);
     // The scanline libtiff expects must be exactly one row of the image (and
     // addressable here, which a 32-bit host may not manage).
     ok = ok && expectedRow <= static_cast<std::uint64_t>(PTRDIFF_MAX) &&
-         static_cast<std::uint64_t>(TIFFScanlineSize(tiff)) == expectedRow;
+         static_cast<std::uint64_t>(TIFFScanlineSize(tiff.get())) == expectedRow;
     if (ok) {
         try {
             row.resize(static_cast<std::size_t>(expectedRow));
         } catch (const std::bad_alloc&) {
-            TIFFClose(tiff);
             return img::kNoMemory;
         }
-        ok = writeRows(tiff, *image, row.data());
+        ok = writeRows(tiff.get(), *image, row.data());
     }
-    ok = ok && TIFFFlush(tiff) == 1;
-    TIFFClose(tiff);
+    ok = ok && TIFFFlush(tiff.get()) == 1;
     if (!ok || target.failed)
         return img::kIoError;
     return file.commit() ? img::kOk : img::kIoError;

@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <stdexcept>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "lsc/eval_patch.h"
 #include "lsc/lsc_messages.h"
 #include "lsc/patch_geometry.h"
@@ -35,12 +35,12 @@ void applyLensShading(ProcessingContext& context) {
         throw std::runtime_error(lsc::msg::kImageAllocation);
     context.corrected.reset(out);
 
-    const int phase = bayerPhase(in.cfa);
+    const int phase = img::bayerPhase(in.cfa);
     int channelAt[2][2];
     for (int dy = 0; dy < 2; ++dy)
         for (int dx = 0; dx < 2; ++dx)
             channelAt[dy][dx] =
-                bayerChannel(static_cast<unsigned>(dx), static_cast<unsigned>(dy), phase);
+                img::bayerChannel(static_cast<unsigned>(dx), static_cast<unsigned>(dy), phase);
     // The row cubics of every patch of every channel, built once: the
     // per-pixel work is then one patch evaluation from them (same arithmetic
     // as evalPatch on the grid).

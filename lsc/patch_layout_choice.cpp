@@ -4,7 +4,7 @@
 #include <new>
 #include <sstream>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
 #include "lsc/patch_geometry.h"
@@ -68,7 +68,7 @@ double correctedFlatness(const BayerImage& corrected, int channel) {
     const std::uint32_t columns = width / kFlatnessBlock, rows = height / kFlatnessBlock;
     if (columns == 0 || rows == 0)
         return 0.0;
-    const int phase = bayerPhase(corrected.cfa());
+    const int phase = img::bayerPhase(corrected.cfa());
     // Per block and channel: sum (the counts are equal, 64 each, for an even block side).
     std::vector<double> sums(std::size_t(columns) * rows * kChannels, 0.0);
     const float* pixels = corrected.pixels();
@@ -76,7 +76,7 @@ double correctedFlatness(const BayerImage& corrected, int channel) {
         const float* row = pixels + std::size_t(y) * width;
         double* blockRow = &sums[std::size_t(y / kFlatnessBlock) * columns * kChannels];
         for (std::uint32_t x = 0; x < columns * kFlatnessBlock; ++x)
-            blockRow[(x / kFlatnessBlock) * kChannels + bayerChannel(x, y, phase)] += row[x];
+            blockRow[(x / kFlatnessBlock) * kChannels + img::bayerChannel(x, y, phase)] += row[x];
     }
     double worst = 0.0;
     const std::size_t blocks = std::size_t(columns) * rows;

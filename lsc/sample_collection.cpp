@@ -7,7 +7,7 @@
 #include <utility>
 #include <vector>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "lsc/lsc_messages.h"
 #include "lsc/patch_geometry.h"
 #include "lsc/sample_limit.h"
@@ -25,7 +25,7 @@ class SampleTaker {
 public:
     SampleTaker(const WorkingImage& image, std::int64_t margin, int window,
                 std::vector<shadingSample>& out)
-        : image_(image), margin_(margin), window_(window), phase_(bayerPhase(image.cfa)),
+        : image_(image), margin_(margin), window_(window), phase_(img::bayerPhase(image.cfa)),
           out_(out) {}
 
     std::int64_t margin() const { return margin_; }
@@ -47,7 +47,7 @@ public:
         else
             for (std::uint32_t dy = 0; dy < 2; ++dy)
                 for (std::uint32_t dx = 0; dx < 2; ++dx)
-                    sample.value[bayerChannel(dx, dy, phase_)] =
+                    sample.value[img::bayerChannel(dx, dy, phase_)] =
                         image_.pixels[static_cast<std::size_t>(by + dy) * image_.width + bx + dx];
         out_.push_back(sample);
     }

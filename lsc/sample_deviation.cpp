@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <limits>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "lsc/sample_window.h"
 
 namespace {
@@ -68,7 +68,7 @@ void measureSampleDeviations(const WorkingImage& image, const std::vector<shadin
                              int sampleWindow, bool samplesFromImage, float blackLevel,
                              FitDeviation deviations[kChannels]) {
     const int window = std::max(kCheckWindow, sampleWindow);
-    const int phase = bayerPhase(image.cfa);
+    const int phase = img::bayerPhase(image.cfa);
     auto medianLevels = [&](std::int64_t x, std::int64_t y, float levels[kChannels]) {
         windowMedians(image, phase, std::uint32_t(x) & ~1u, std::uint32_t(y) & ~1u, window, levels);
         for (int k = 0; k < kChannels; ++k)

@@ -4,7 +4,7 @@
 #include <cstddef>
 #include <stdexcept>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 
 namespace {
 
@@ -58,7 +58,7 @@ void windowMedians(const WorkingImage& image, int phase, std::uint32_t blockX, s
     std::size_t offset[kChannels];
     for (std::uint32_t dy = 0; dy < 2; ++dy)
         for (std::uint32_t dx = 0; dx < 2; ++dx)
-            offset[bayerChannel(dx, dy, phase)] = dy * stride + dx;
+            offset[img::bayerChannel(dx, dy, phase)] = dy * stride + dx;
 
     float values[kMaxSampleWindow * kMaxSampleWindow];
     for (int k = 0; k < kChannels; ++k) {

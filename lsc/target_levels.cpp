@@ -4,7 +4,7 @@
 #include <cstddef>
 #include <vector>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 
 namespace {
 
@@ -67,12 +67,12 @@ void targetLevelsOf(const WorkingImage& image, int windowSize, float levels[4]) 
     }
     const std::size_t radius = windowSize > 1 ? static_cast<std::size_t>(windowSize) / 2 : 0;
     std::vector<double> columnSums(width);
-    const int phase = bayerPhase(image.cfa);
+    const int phase = img::bayerPhase(image.cfa);
     for (int dy = 0; dy < 2; ++dy)
         for (int dx = 0; dx < 2; ++dx) {
             const ChannelPlane plane{image.pixels + static_cast<std::size_t>(dy) * image.width + dx,
                                      2 * static_cast<std::size_t>(image.width), width, height};
-            levels[bayerChannel(static_cast<unsigned>(dx), static_cast<unsigned>(dy), phase)] =
+            levels[img::bayerChannel(static_cast<unsigned>(dx), static_cast<unsigned>(dy), phase)] =
                 largestBoxMean(plane, radius, columnSums);
         }
 }

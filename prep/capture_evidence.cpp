@@ -6,7 +6,7 @@
 #include <cstdio>
 #include <vector>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "prep/prep_image.h"
 
 namespace prep {
@@ -82,14 +82,14 @@ CentreLevels centreLevels(const BayerImage& mosaic, float blackLevel) {
     const std::int32_t height = mosaic.height();
     if (mosaic.channels() != 1 || width < 6 || height < 6)
         return levels;
-    const int phase = bayerPhase(mosaic.cfa());
+    const int phase = img::bayerPhase(mosaic.cfa());
     double sum[4] = {0, 0, 0, 0};
     std::size_t count[4] = {0, 0, 0, 0};
     const float* samples = mosaic.pixels();
     for (std::int32_t y = height / 3; y < height - height / 3; ++y)
         for (std::int32_t x = width / 3; x < width - width / 3; ++x) {
-            const int channel =
-                bayerChannel(static_cast<std::uint64_t>(x), static_cast<std::uint64_t>(y), phase);
+            const int channel = img::bayerChannel(static_cast<std::uint64_t>(x),
+                                                  static_cast<std::uint64_t>(y), phase);
             sum[channel] += samples[static_cast<std::size_t>(y) * width + x];
             ++count[channel];
         }

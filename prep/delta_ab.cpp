@@ -5,7 +5,7 @@
 #include <stdexcept>
 #include <vector>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
 
@@ -13,12 +13,6 @@ namespace prep {
 namespace {
 
 constexpr float kGamma = 0.45454544f; // 1 / 2.2
-
-// Offset (dx, dy) within each 2 x 2 block of the pixel of `channel`.
-void channelOffset(int channel, int phase, int& dx, int& dy) {
-    dx = (channel & 1) ^ (phase & 1);
-    dy = ((channel >> 1) & 1) ^ ((phase >> 1) & 1);
-}
 
 struct Rgb {
     float r = 0.0f, g = 0.0f, b = 0.0f;
@@ -79,10 +73,13 @@ void evaluateDeltaAb(ProcessingContext& context) {
     // separate RGB image would take them, so no such image is kept.
     const std::size_t blockCount = static_cast<std::size_t>(columns) * rows;
     std::vector<Rgb> sums(blockCount);
-    const int phase = bayerPhase(image.cfa());
+    const int phase = img::bayerPhase(image.cfa());
     int offsetX[kChannels], offsetY[kChannels];
-    for (int k = 0; k < kChannels; ++k)
-        channelOffset(k, phase, offsetX[k], offsetY[k]);
+    for (int k = 0; k < kChannels; ++k) {
+        const img::BlockOffset offset = img::channelOffset(k, phase);
+        offsetX[k] = offset.x;
+        offsetY[k] = offset.y;
+    }
     const auto& m = context.ccm;
     float* pixels = image.pixels();
     float greenMax = 0.0f;

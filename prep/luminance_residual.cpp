@@ -7,7 +7,7 @@
 #include <stdexcept>
 #include <vector>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "prep/prep_messages.h"
 
 namespace prep {
@@ -41,11 +41,11 @@ float luminanceResidual(const ProcessingContext& context) {
     for (int input = 0; input < 3; ++input)
         weightOf[input] = kLumaWeights[0] * m[input][0] + kLumaWeights[1] * m[input][1] +
                           kLumaWeights[2] * m[input][2];
-    const int phase = bayerPhase(image.cfa());
+    const int phase = img::bayerPhase(image.cfa());
     double channelWeight[2][2];
     for (unsigned dy = 0; dy < 2; ++dy)
         for (unsigned dx = 0; dx < 2; ++dx) {
-            const int k = bayerChannel(dx, dy, phase);
+            const int k = img::bayerChannel(dx, dy, phase);
             channelWeight[dy][dx] = k == 0 ? weightOf[0] : k == 3 ? weightOf[2] : 0.5 * weightOf[1];
         }
 

@@ -6,6 +6,7 @@
 #include <memory>
 #include <stdexcept>
 
+#include "image/file_ptr.h"
 #include "image/output_file.h"
 #include "lsc/sample_limit.h"
 #include "prep/image_checks.h"
@@ -54,10 +55,6 @@ private:
     std::size_t pos_ = 0;
 };
 
-struct FileClose {
-    void operator()(std::FILE* file) const noexcept { std::fclose(file); }
-};
-
 // Far more than the samples of any sensor; a device such as /dev/zero named
 // as the sample file would otherwise be read until memory runs out.
 constexpr std::size_t kMaxSampleFileBytes = std::size_t{64} << 20;
@@ -66,7 +63,7 @@ enum class ReadResult { kOk, kUnreadable, kTooLarge };
 
 // The whole file, refused when it cannot be opened or read or is too large.
 ReadResult readWholeFile(const std::string& path, std::string& text) {
-    std::unique_ptr<std::FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
+    img::FilePtr file(std::fopen(path.c_str(), "rb"));
     if (!file)
         return ReadResult::kUnreadable;
     char block[65536];

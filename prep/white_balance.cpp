@@ -4,7 +4,7 @@
 #include <cstddef>
 #include <stdexcept>
 
-#include "lsc/bayer_phase.h"
+#include "image/bayer_phase.h"
 #include "lsc/target_levels.h"
 #include "prep/prep_image.h"
 #include "prep/prep_messages.h"
@@ -22,15 +22,15 @@ void requireBayerImage(const BayerImage& image) {
 // least 2 x 2 pixels holds every channel; a smaller one is refused.
 void centreLevels(const BayerImage& image, float (&levels)[kChannels]) {
     const CentreWindow window = centreWindow(image.width(), image.height());
-    const int phase = bayerPhase(image.cfa());
+    const int phase = img::bayerPhase(image.cfa());
     const std::size_t width = static_cast<std::size_t>(image.width());
     float sums[kChannels] = {0, 0, 0, 0};
     std::uint64_t counts[kChannels] = {0, 0, 0, 0};
     for (std::int32_t y = window.y0; y <= window.y1; ++y) {
         const float* row = image.pixels() + static_cast<std::size_t>(y) * width;
         for (std::int32_t x = window.x0; x <= window.x1; ++x) {
-            const int channel =
-                bayerChannel(static_cast<std::uint64_t>(x), static_cast<std::uint64_t>(y), phase);
+            const int channel = img::bayerChannel(static_cast<std::uint64_t>(x),
+                                                  static_cast<std::uint64_t>(y), phase);
             sums[channel] += row[x];
             ++counts[channel];
         }
@@ -72,13 +72,13 @@ void whiteBalance(ProcessingContext& context) {
     for (int k = 0; k < kChannels; ++k)
         gains[k] = largest / levels[k];
 
-    const int phase = bayerPhase(image.cfa());
+    const int phase = img::bayerPhase(image.cfa());
     const std::size_t width = static_cast<std::size_t>(image.width());
     const std::size_t height = static_cast<std::size_t>(image.height());
     float* pixel = image.pixels();
     for (std::size_t y = 0; y < height; ++y) {
-        const float rowGains[2] = {gains[bayerChannel(0, y, phase)],
-                                   gains[bayerChannel(1, y, phase)]};
+        const float rowGains[2] = {gains[img::bayerChannel(0, y, phase)],
+                                   gains[img::bayerChannel(1, y, phase)]};
         for (std::size_t x = 0; x < width; ++x, ++pixel)
             *pixel *= rowGains[x & 1];
     }

@@ -7,6 +7,7 @@
 
 #include <tiffio.h>
 
+#include "image/tiff_ptr.h"
 #include "tests/e2e/e2e_fixture.h"
 
 namespace e2e {
@@ -129,10 +130,6 @@ TEST_F(Frames, FourNoisyFramesLowerTheResidual) {
 
 // --- The check image --------------------------------------------------------
 
-struct TiffClose {
-    void operator()(TIFF* tiff) const { TIFFClose(tiff); }
-};
-
 TEST_F(Frames, CheckImageIsTheCorrectedCaptureAtFullSize) {
     prepare();
     auto args = frameArgs({"flat.kqraw"});
@@ -141,7 +138,7 @@ TEST_F(Frames, CheckImageIsTheCorrectedCaptureAtFullSize) {
     ASSERT_EQ(result.status, 0) << result.out;
     EXPECT_TRUE(hasLine(result.out, "Writing full-resolution check image."));
 
-    std::unique_ptr<TIFF, TiffClose> tiff(TIFFOpen(path("check.tiff").c_str(), "r"));
+    img::TiffPtr tiff(TIFFOpen(path("check.tiff").c_str(), "r"));
     ASSERT_TRUE(tiff);
     std::uint32_t width = 0, height = 0;
     std::uint16_t bits = 0, samples = 0, photometric = 0;

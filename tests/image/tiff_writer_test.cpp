@@ -9,6 +9,7 @@
 #include <tiffio.h>
 
 #include "image/image_buffer.h"
+#include "image/tiff_ptr.h"
 #include "image/tiff_writer.h"
 #include "tests/image/export_test_image.h"
 #include "tests/support/temp_dir.h"
@@ -17,10 +18,7 @@ namespace {
 
 using testing_support::TempDir;
 
-struct TiffClose {
-    void operator()(TIFF* tiff) const { TIFFClose(tiff); }
-};
-using TiffPtr = std::unique_ptr<TIFF, TiffClose>;
+using img::TiffPtr;
 
 std::uint16_t tag16(TIFF* tiff, ttag_t tag) {
     std::uint16_t value = 0;

@@ -4,8 +4,8 @@
 
 #include <gtest/gtest.h>
 
+#include "image/bayer_phase.h"
 #include "image/image_buffer.h"
-#include "lsc/bayer_phase.h"
 #include "lsc/sample_window.h"
 
 namespace {
@@ -21,10 +21,10 @@ public:
 
     // The pixel of `channel` in the 2x2 block at even (blockX, blockY).
     float& at(std::uint32_t blockX, std::uint32_t blockY, int channel) {
-        const int phase = bayerPhase(image_.cfa);
+        const int phase = img::bayerPhase(image_.cfa);
         for (std::uint32_t dy = 0; dy < 2; ++dy)
             for (std::uint32_t dx = 0; dx < 2; ++dx)
-                if (bayerChannel(dx, dy, phase) == channel)
+                if (img::bayerChannel(dx, dy, phase) == channel)
                     return pixel(blockX + dx, blockY + dy);
         throw std::logic_error("no such channel");
     }
@@ -32,7 +32,7 @@ public:
 
     std::vector<float> medians(std::uint32_t blockX, std::uint32_t blockY, int window) const {
         std::vector<float> result(kChannels);
-        windowMedians(image_, bayerPhase(image_.cfa), blockX, blockY, window, result.data());
+        windowMedians(image_, img::bayerPhase(image_.cfa), blockX, blockY, window, result.data());
         return result;
     }
 
