@@ -18,7 +18,7 @@ void packCodes(const std::vector<std::uint32_t>& codes, unsigned bits,
 
 // Reads `count` codes of `bits` bits (1..32) from data[0, size). False, with
 // nothing read, when the data is shorter than packedSize(count, bits).
-bool unpackCodes(const std::uint8_t* data, std::size_t size, unsigned bits, std::size_t count,
-                 std::vector<std::uint32_t>& codes);
+[[nodiscard]] bool unpackCodes(const std::uint8_t* data, std::size_t size, unsigned bits,
+                               std::size_t count, std::vector<std::uint32_t>& codes);
 
 } // namespace blob

@@ -201,7 +201,10 @@ void BlobParser::readLensShading(std::size_t offset) {
     requireComplete(block);
     countBlockBytes(kLscHeaderSize + packed);
     std::vector<std::uint32_t> codes;
-    unpackCodes(data, static_cast<std::size_t>(packed), format.codeBits(), kLscCodeCount, codes);
+    // The block holds `packed` bytes (checked above): the codes are all there.
+    if (!unpackCodes(data, static_cast<std::size_t>(packed), format.codeBits(), kLscCodeCount,
+                     codes))
+        fail(msg::kCorruptOrTruncated);
 
     checkLightSource(light);
     store(config_["blob"]["compression_res"], valueFormatText(format));

@@ -10,13 +10,13 @@
 // Whole-text signed 32-bit integer: an optional "-" or "+", then one or more
 // decimal digits and nothing else. False when the text does not match or the
 // number lies outside -2147483648..2147483647.
-bool parseIntegerText(std::string_view text, std::int32_t& value);
+[[nodiscard]] bool parseIntegerText(std::string_view text, std::int32_t& value);
 
 // Whole-text single-precision number: optional sign, digits with an optional
 // fraction and exponent, or one of the spellings nan, inf, infinity in any
 // letter case. False when the text does not match or the value overflows the
 // float range (values below the smallest float come out as zero).
-bool parseFloatText(std::string_view text, float& value);
+[[nodiscard]] bool parseFloatText(std::string_view text, float& value);
 
 // Plain decimal with a leading "-" when negative.
 std::string integerText(std::int64_t value);

@@ -2,4 +2,4 @@
 
 // The program: runs every stage and turns whatever ends the run into the
 // printed report and the exit status.
-int runProgram(int argc, const char* const argv[]);
+[[nodiscard]] int runProgram(int argc, const char* const argv[]);

@@ -48,7 +48,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         return 0;
     KqRawContainerPtr copy(kqrawContainerCreate());
     if (copy)
-        kqrawContainerCopyBlocks(copy.get(), container.get());
+        (void)kqrawContainerCopyBlocks(copy.get(), container.get());
     checkRewrite(container.get());
     return 0;
 }

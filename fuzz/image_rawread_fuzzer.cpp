@@ -47,7 +47,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     ImageBuffer* header = nullptr;
     std::uint64_t samplesAt = 0;
     if (img::rawReadHeaderOnly(source, &header, &samplesAt) == 0 && header)
-        img::readDeferredSamples(source, samplesAt, header);
+        (void)img::readDeferredSamples(source, samplesAt, header);
     imageRelease(header);
     return 0;
 }

@@ -87,12 +87,10 @@ KqRawContainer* headerlessContainer(float exposureTime, float gain, const std::s
         return nullptr;
     header.release();
     KqRawBlockPtr capture(kqrawBlockCreateCapture());
-    if (!capture)
-        return nullptr;
-    kqrawBlockSetFloat(capture.get(), kqcap::kExposureTime, exposureTime);
+    bool set = capture && kqrawBlockSetFloat(capture.get(), kqcap::kExposureTime, exposureTime);
     for (std::uint32_t c = 0; c < 4; ++c)
-        kqrawBlockSetFloat(capture.get(), kqcap::kGain0 + 4 * c, gain);
-    if (!kqrawContainerAdd(container.get(), capture.get()))
+        set = set && kqrawBlockSetFloat(capture.get(), kqcap::kGain0 + 4 * c, gain);
+    if (!set || !kqrawContainerAdd(container.get(), capture.get()))
         return nullptr;
     capture.release();
     KqRawBlockPtr info(kqrawBlockCreateSensorInfo());

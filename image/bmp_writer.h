@@ -8,4 +8,4 @@
 // cannot be opened; -2 a write, the flush or the close failed; -3 no row
 // buffer; -5 no samples; -6 not one or three UINT8 samples a pixel, or a file
 // too large for the format's 32-bit size field.
-int bmpWrite(const char* path, const ImageBuffer* image) noexcept;
+[[nodiscard]] int bmpWrite(const char* path, const ImageBuffer* image) noexcept;

@@ -20,15 +20,16 @@ public:
 
     // Reads exactly n bytes at the position and steps over them. False when
     // fewer remain or the read fails; the position is then unspecified.
-    bool read(void* dst, std::size_t n) noexcept;
+    [[nodiscard]] bool read(void* dst, std::size_t n) noexcept;
     // Moves to an absolute position within the data.
-    bool seek(std::uint64_t position) noexcept;
+    [[nodiscard]] bool seek(std::uint64_t position) noexcept;
     // Name for messages (the file path, or what the caller chose).
     const char* name() const { return name_; }
 
 protected:
     ByteSource(std::uint64_t size, const char* name) : size_(size), name_(name ? name : "") {}
-    virtual bool readAt(std::uint64_t position, void* dst, std::size_t n) noexcept = 0;
+    [[nodiscard]] virtual bool readAt(std::uint64_t position, void* dst,
+                                      std::size_t n) noexcept = 0;
 
 private:
     std::uint64_t size_;
@@ -47,7 +48,7 @@ public:
     static MemorySource* adopt(std::uint8_t* data, std::size_t size, const char* name) noexcept;
 
 private:
-    bool readAt(std::uint64_t position, void* dst, std::size_t n) noexcept override;
+    [[nodiscard]] bool readAt(std::uint64_t position, void* dst, std::size_t n) noexcept override;
     const std::uint8_t* data_;
     std::uint8_t* owned_ = nullptr;
 };
@@ -63,7 +64,7 @@ public:
     FileSource& operator=(const FileSource&) = delete;
 
 private:
-    bool readAt(std::uint64_t position, void* dst, std::size_t n) noexcept override;
+    [[nodiscard]] bool readAt(std::uint64_t position, void* dst, std::size_t n) noexcept override;
     std::FILE* file_;
     std::uint64_t filePosition_ = 0;
 };
@@ -75,6 +76,6 @@ constexpr std::uint64_t kMaxStreamBytes = std::uint64_t{1} << 30;
 // (a pipe, /dev/stdin) is first read into memory, at most kMaxStreamBytes.
 // Returns the source (the caller deletes it) or null with *result: -1 the
 // file cannot be opened; -2 read error; -3 no memory or a stream too long.
-ByteSource* openSource(const char* path, int* result) noexcept;
+[[nodiscard]] ByteSource* openSource(const char* path, int* result) noexcept;
 
 } // namespace img

@@ -89,10 +89,12 @@ struct ImageBuffer {
 // height below 1), -6 (samplesPerPixel does not suit the pixel type), -3 (no
 // memory, or a block too large to address). Data type NONE gets no block;
 // OTHER is refused (-6).
-ImageBuffer* imageCreate(std::int32_t width, std::int32_t height, std::uint16_t bitsPerSample,
-                         std::uint16_t samplesPerPixel, std::uint32_t numberOfImages,
-                         std::uint32_t cfa0, std::uint32_t cfa1, std::uint32_t pixelType,
-                         std::uint32_t bufferType, std::uint32_t dataType, int* result) noexcept;
+[[nodiscard]] ImageBuffer* imageCreate(std::int32_t width, std::int32_t height,
+                                       std::uint16_t bitsPerSample, std::uint16_t samplesPerPixel,
+                                       std::uint32_t numberOfImages, std::uint32_t cfa0,
+                                       std::uint32_t cfa1, std::uint32_t pixelType,
+                                       std::uint32_t bufferType, std::uint32_t dataType,
+                                       int* result) noexcept;
 
 // Releases the samples, metadata and raw header. Null is accepted.
 void imageRelease(ImageBuffer* image) noexcept;
@@ -103,8 +105,8 @@ struct ImageRelease {
 using ImagePtr = std::unique_ptr<ImageBuffer, ImageRelease>;
 
 // Width and height of plane `plane`; -1 for a plane outside 0..samplesPerPixel-1.
-int imagePlaneSize(const ImageBuffer* image, int plane, std::int32_t* width,
-                   std::int32_t* height) noexcept;
+[[nodiscard]] int imagePlaneSize(const ImageBuffer* image, int plane, std::int32_t* width,
+                                 std::int32_t* height) noexcept;
 // Samples of one plane, or of all planes and images when plane is -1; 0 on a bad plane.
 std::uint64_t imageTotalSamples(const ImageBuffer* image, int plane) noexcept;
 // Bytes per sample of the data type (0 for NONE and OTHER).
@@ -115,13 +117,13 @@ const MetadataEntry* imageFindMetadata(const ImageBuffer* image, const char* key
 // Replaces the value of an entry with the same key, else appends. With `copy`
 // the strings are duplicated; without it the image takes ownership of them
 // (they must come from malloc). 0, or -1 when out of memory.
-int imageSetMetadata(ImageBuffer* image, char* key, char* value, bool copy) noexcept;
-int imageSetMetadata(ImageBuffer* image, const char* key, const char* value) noexcept;
+[[nodiscard]] int imageSetMetadata(ImageBuffer* image, char* key, char* value, bool copy) noexcept;
+[[nodiscard]] int imageSetMetadata(ImageBuffer* image, const char* key, const char* value) noexcept;
 // Clears the metadata list and releases the raw header.
 void imageClearMetadata(ImageBuffer* image) noexcept;
 // Clears the target's metadata, copies every entry, then a fixed KQRAW or
 // NKRAW header byte for byte (a KQRAW2 container is not copied). 0 or -1.
-int imageCopyMetadata(ImageBuffer* target, const ImageBuffer* source) noexcept;
+[[nodiscard]] int imageCopyMetadata(ImageBuffer* target, const ImageBuffer* source) noexcept;
 
 // True for 8-bit MONO or interleaved RGB with the plain 0..256 levels.
 bool imageIsEightBitDisplay(const ImageBuffer* image) noexcept;
@@ -140,9 +142,9 @@ int streamRead8(std::FILE* file, std::uint8_t* value) noexcept;
 int streamRead16(std::FILE* file, bool bigEndian, std::uint16_t* value) noexcept;
 int streamRead32(std::FILE* file, bool bigEndian, std::uint32_t* value) noexcept;
 int streamRead64(std::FILE* file, bool bigEndian, std::uint64_t* value) noexcept;
-int streamReadFloat(std::FILE* file, bool bigEndian, float* value) noexcept;
+[[nodiscard]] int streamReadFloat(std::FILE* file, bool bigEndian, float* value) noexcept;
 int streamWrite8(std::FILE* file, std::uint8_t value) noexcept;
 int streamWrite16(std::FILE* file, bool bigEndian, std::uint16_t value) noexcept;
 int streamWrite32(std::FILE* file, bool bigEndian, std::uint32_t value) noexcept;
 int streamWrite64(std::FILE* file, bool bigEndian, std::uint64_t value) noexcept;
-int streamWriteFloat(std::FILE* file, bool bigEndian, float value) noexcept;
+[[nodiscard]] int streamWriteFloat(std::FILE* file, bool bigEndian, float value) noexcept;

@@ -26,5 +26,5 @@ constexpr int kDefaultJpegQuality = 90;
 // is asked for an image that is not 8-bit MONO or interleaved RGB with plain
 // levels; -4 for an unknown format; otherwise the writer's code (-1 open,
 // -2 write error, -3 no memory).
-int imageSave(const char* path, const ImageBuffer* image, int format, const int* parameters,
-              int parameterCount) noexcept;
+[[nodiscard]] int imageSave(const char* path, const ImageBuffer* image, int format,
+                            const int* parameters, int parameterCount) noexcept;

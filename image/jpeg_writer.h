@@ -8,4 +8,4 @@
 // metadata entry, in list order. Returns 0; -1 the file cannot be opened;
 // -2 the library reported an error (also a failed write, flush or close);
 // -3 no memory; -5 no samples; -6 not one or three UINT8 samples a pixel.
-int jpegWrite(const char* path, const ImageBuffer* image, int quality) noexcept;
+[[nodiscard]] int jpegWrite(const char* path, const ImageBuffer* image, int quality) noexcept;

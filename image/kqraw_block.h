@@ -67,29 +67,32 @@ struct KqRawBlockRelease {
 };
 using KqRawBlockPtr = std::unique_ptr<KqRawBlock, KqRawBlockRelease>;
 bool kqrawBlockHasTag(const KqRawBlock* block, const char* tag) noexcept;
-KqRawBlock* kqrawBlockClone(const KqRawBlock* block) noexcept;
+[[nodiscard]] KqRawBlock* kqrawBlockClone(const KqRawBlock* block) noexcept;
 
 // Constructors; null when out of memory (or, for pixels, when the samples do
 // not fit a 32-bit size field).
-KqRawBlock* kqrawBlockCreateHeader() noexcept; // payload 36, creation time now
-KqRawBlock* kqrawBlockCreatePixels(const std::uint16_t* samples, std::uint64_t count) noexcept;
-KqRawBlock* kqrawBlockCreateCapture() noexcept;    // payload 56, +0 = 2
-KqRawBlock* kqrawBlockCreateSensorInfo() noexcept; // +0 = 1, three empty strings
-KqRawBlock* kqrawBlockCreateComment(const char* text) noexcept;
-KqRawBlock* kqrawBlockCreateMakerNote(const char* text) noexcept;
+[[nodiscard]] KqRawBlock* kqrawBlockCreateHeader() noexcept; // payload 36, creation time now
+[[nodiscard]] KqRawBlock* kqrawBlockCreatePixels(const std::uint16_t* samples,
+                                                 std::uint64_t count) noexcept;
+[[nodiscard]] KqRawBlock* kqrawBlockCreateCapture() noexcept;    // payload 56, +0 = 2
+[[nodiscard]] KqRawBlock* kqrawBlockCreateSensorInfo() noexcept; // +0 = 1, three empty strings
+[[nodiscard]] KqRawBlock* kqrawBlockCreateComment(const char* text) noexcept;
+[[nodiscard]] KqRawBlock* kqrawBlockCreateMakerNote(const char* text) noexcept;
 
 // Replaces string `index` of a text (0) or SENSORINFO (0-2) block; null
 // stores an empty string. Recomputes the size. False when out of memory or
 // the block has no such string.
-bool kqrawBlockSetString(KqRawBlock* block, int index, const char* text) noexcept;
+[[nodiscard]] bool kqrawBlockSetString(KqRawBlock* block, int index, const char* text) noexcept;
 // The module serial number: the second SENSORINFO string.
-bool kqrawBlockSetSerialNumber(KqRawBlock* block, const char* text) noexcept;
+[[nodiscard]] bool kqrawBlockSetSerialNumber(KqRawBlock* block, const char* text) noexcept;
 
 // Fields of an opaque payload. False when the field lies outside the payload.
 bool kqrawBlockGet32(const KqRawBlock* block, std::uint32_t offset, std::uint32_t* value) noexcept;
-bool kqrawBlockGetFloat(const KqRawBlock* block, std::uint32_t offset, float* value) noexcept;
+[[nodiscard]] bool kqrawBlockGetFloat(const KqRawBlock* block, std::uint32_t offset,
+                                      float* value) noexcept;
 bool kqrawBlockSet32(KqRawBlock* block, std::uint32_t offset, std::uint32_t value) noexcept;
-bool kqrawBlockSetFloat(KqRawBlock* block, std::uint32_t offset, float value) noexcept;
+[[nodiscard]] bool kqrawBlockSetFloat(KqRawBlock* block, std::uint32_t offset,
+                                      float value) noexcept;
 // Sets the creation time of a file header block from the system clock.
 void kqrawHeaderStamp(KqRawBlock* header) noexcept;
 
@@ -100,8 +103,8 @@ void kqrawHeaderStamp(KqRawBlock* header) noexcept;
 // are kept opaque, with a warning that names the source. With `samplesAt`, a
 // pixel block's samples are not read: their position is stored there and the
 // block holds none.
-int kqrawBlockRead(img::ByteSource& source, KqRawBlock** block,
-                   std::uint64_t* samplesAt = nullptr) noexcept;
+[[nodiscard]] int kqrawBlockRead(img::ByteSource& source, KqRawBlock** block,
+                                 std::uint64_t* samplesAt = nullptr) noexcept;
 
 // Writes the block; false when a write fails.
-bool kqrawBlockWrite(const KqRawBlock* block, std::FILE* file) noexcept;
+[[nodiscard]] bool kqrawBlockWrite(const KqRawBlock* block, std::FILE* file) noexcept;

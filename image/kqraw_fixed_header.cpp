@@ -102,11 +102,18 @@ KqRawBlock* captureBlockOf(const KqRawFixedHeader* header) {
     KqRawBlock* capture = kqrawBlockCreateCapture();
     if (!capture)
         return nullptr;
-    kqrawBlockSetFloat(capture, kqcap::kExposureTime,
-                       static_cast<float>(kqrawFixedGet32(header, kqfix::kExposureFixed)) /
-                           65536.0f);
-    kqrawBlockSetFloat(capture, kqcap::kSecondValue,
-                       static_cast<float>(kqrawFixedGet32(header, kqfix::kSecondValue)) / 65536.0f);
+    // A new capture block holds both fields.
+    const bool set =
+        kqrawBlockSetFloat(capture, kqcap::kExposureTime,
+                           static_cast<float>(kqrawFixedGet32(header, kqfix::kExposureFixed)) /
+                               65536.0f) &&
+        kqrawBlockSetFloat(capture, kqcap::kSecondValue,
+                           static_cast<float>(kqrawFixedGet32(header, kqfix::kSecondValue)) /
+                               65536.0f);
+    if (!set) {
+        kqrawBlockRelease(capture);
+        return nullptr;
+    }
     kqrawBlockSet32(capture, kqcap::kCarried1, kqrawFixedGet32(header, kqfix::kExposureFloat));
     kqrawBlockSet32(capture, kqcap::kCarried2, kqrawFixedGet32(header, kqfix::kWord48));
     for (std::uint32_t c = 0; c < 4; ++c)

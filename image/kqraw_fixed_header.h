@@ -43,12 +43,13 @@ void kqrawFixedSetFloat(KqRawFixedHeader* header, std::uint32_t offset, float va
 // image of file type KQRAW that carries the header; -4 not such a file; -5
 // too short for its pixels, or a width or height of 0 or beyond 2^31 - 1;
 // -3; -2. With `samplesAt`, the samples are left unread (see readRawImage).
-int kqrawFixedRead(img::ByteSource& source, ImageBuffer** image,
-                   std::uint64_t* samplesAt = nullptr) noexcept;
+[[nodiscard]] int kqrawFixedRead(img::ByteSource& source, ImageBuffer** image,
+                                 std::uint64_t* samplesAt = nullptr) noexcept;
 
 // Converts a fixed-header file into a container: header block, pixel block
 // (the pixels start behind the first end marker found from +108 on) and a
 // capture block. Result: 0; -4 not a fixed-header file (version, revision,
 // magic or end marker wrong, or shorter than a header); -21 a width or height
 // of 0, or pixels that run past the end of the data; -3; -2.
-int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** container) noexcept;
+[[nodiscard]] int kqrawFixedToContainer(img::ByteSource& source,
+                                        KqRawContainer** container) noexcept;

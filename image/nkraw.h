@@ -31,7 +31,7 @@ constexpr std::uint32_t kMagicSize = 8, kWidth = 8, kHeight = 12, kBayerCode = 1
 // header (bit depth from the largest sample, as for the other raw files); -4
 // not an NKRAW file; -5 a file whose size is not header plus pixels, or a
 // width or height of 0 or beyond 2^31 - 1; -3; -2.
-int nkrawRead(img::ByteSource& source, ImageBuffer** image) noexcept;
+[[nodiscard]] int nkrawRead(img::ByteSource& source, ImageBuffer** image) noexcept;
 
 // Puts the capture data of an NKRAW header into a fixed KQRAW header: the
 // exposure time as 16.16 fixed point at +32, (g - 8) * 16384 at +40 and the

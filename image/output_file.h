@@ -22,13 +22,13 @@ public:
     OutputFile& operator=(const OutputFile&) = delete;
 
     // Opens the file for writing. False when it cannot be created.
-    bool open(const std::string& path);
+    [[nodiscard]] bool open(const std::string& path);
     std::FILE* stream() const { return stream_; }
 
     // Flushes, closes and moves the file into place. False when any write,
     // the flush, the close or the rename failed; the target is then left as
     // it was (for a direct write, as far as it got).
-    bool commit();
+    [[nodiscard]] bool commit();
 
     // Drops what was written (removes the temporary).
     void abort();
@@ -53,4 +53,4 @@ constexpr int kMaxOpenOutputs = 8;
 int standardStreamDescriptor(const std::string& path);
 
 // Writes a whole byte block to `path` through OutputFile. False on any failure.
-bool writeWholeFile(const std::string& path, const void* data, std::size_t size);
+[[nodiscard]] bool writeWholeFile(const std::string& path, const void* data, std::size_t size);

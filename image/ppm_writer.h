@@ -11,4 +11,4 @@
 // be opened; -2 a write, the flush or the close failed; -3 no memory; -5 no
 // samples; -6 any other sample count, sub-sampled YUV planes or an unknown
 // data type.
-int ppmWrite(const char* path, const ImageBuffer* image) noexcept;
+[[nodiscard]] int ppmWrite(const char* path, const ImageBuffer* image) noexcept;

@@ -11,6 +11,6 @@ namespace img {
 enum class MetadataCopy { kCopied, kTargetHasFileType, kCopyFailed, kOutOfMemory };
 
 // The target must not have a file type yet; it takes the source's.
-MetadataCopy copyRawMetadata(ImageBuffer* target, const ImageBuffer* source) noexcept;
+[[nodiscard]] MetadataCopy copyRawMetadata(ImageBuffer* target, const ImageBuffer* source) noexcept;
 
 } // namespace img

@@ -22,6 +22,7 @@ struct RawLayout {
 // any other answer that is not a number is asked again as it is. Returns 0,
 // or -2 when `in` ends (or fails) before every answer is in: then
 // "ERROR: No answer on standard input." goes to `err`.
-int askRawLayout(std::FILE* in, std::FILE* out, std::FILE* err, RawLayout* layout) noexcept;
+[[nodiscard]] int askRawLayout(std::FILE* in, std::FILE* out, std::FILE* err,
+                               RawLayout* layout) noexcept;
 
 } // namespace img

@@ -33,7 +33,8 @@ using RawLayoutQuery = int (*)(void* context, RawLayout* layout);
 // is set once the samples have been read (they lie at *samplesAt, little-
 // endian, width x height of them). Results as rawReadSource; -4 for every
 // other format, which the full reader then takes.
-int rawReadHeaderOnly(ByteSource& source, ImageBuffer** image, std::uint64_t* samplesAt) noexcept;
+[[nodiscard]] int rawReadHeaderOnly(ByteSource& source, ImageBuffer** image,
+                                    std::uint64_t* samplesAt) noexcept;
 // The console prompt for files of no known type (the query of rawRead).
 int askOnConsole(void* context, RawLayout* layout);
 
@@ -44,6 +45,7 @@ int askOnConsole(void* context, RawLayout* layout);
 // Reads a dump of the given layout. Result as for rawRead; -23 when the file
 // size is not the header plus width x height x images pixels of 1, 2, 3 or 6
 // bytes, or the bit depth does not fit the samples.
-int readWithLayout(ByteSource& source, const RawLayout& layout, ImageBuffer** image) noexcept;
+[[nodiscard]] int readWithLayout(ByteSource& source, const RawLayout& layout,
+                                 ImageBuffer** image) noexcept;
 
 } // namespace img

@@ -12,12 +12,14 @@ namespace img {
 
 // Reads `count` little-endian samples at the source's position into host order.
 // False when they are not all there (count * 2 is checked before the read).
-bool readSamplesLE(ByteSource& source, std::uint16_t* samples, std::uint64_t count) noexcept;
+[[nodiscard]] bool readSamplesLE(ByteSource& source, std::uint16_t* samples,
+                                 std::uint64_t count) noexcept;
 // The same for samples stored in either byte order.
 bool readSamples16(ByteSource& source, std::uint16_t* samples, std::uint64_t count,
                    bool littleEndianFile) noexcept;
 // Writes samples in host order as little-endian. False when a write fails.
-bool writeSamplesLE(std::FILE* file, const std::uint16_t* samples, std::uint64_t count) noexcept;
+[[nodiscard]] bool writeSamplesLE(std::FILE* file, const std::uint16_t* samples,
+                                  std::uint64_t count) noexcept;
 
 std::uint16_t largestSample(const std::uint16_t* samples, std::uint64_t count) noexcept;
 // Bit length of the largest sample, and 10 when that is below 10.
@@ -38,13 +40,14 @@ namespace img {
 // beyond 32-bit signed range, or the samples run past the end of the data;
 // -3; -2. With `samplesAt`, the samples are left unread (the image has no
 // sample block yet) and their position is stored there.
-int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
-                 std::uint32_t height, std::uint32_t cfa, ImageBuffer** image,
-                 std::uint64_t* samplesAt = nullptr) noexcept;
+[[nodiscard]] int readRawImage(ByteSource& source, std::uint64_t offset, std::uint32_t width,
+                               std::uint32_t height, std::uint32_t cfa, ImageBuffer** image,
+                               std::uint64_t* samplesAt = nullptr) noexcept;
 
 // Reads the samples that a header-only read left at `samplesAt` into a new
 // block of the UINT16 image, and takes the depth from the largest. 0, -3, -2.
-int readDeferredSamples(ByteSource& source, std::uint64_t samplesAt, ImageBuffer* image) noexcept;
+[[nodiscard]] int readDeferredSamples(ByteSource& source, std::uint64_t samplesAt,
+                                      ImageBuffer* image) noexcept;
 
 // True when width x height 16-bit samples fit between `offset` and the end of
 // a source of `size` bytes, computed in 64 bits.

@@ -18,8 +18,9 @@ constexpr std::uint64_t kMaxImageSamples = kMaxSampleMemory / sizeof(float);
 // (and `images` images) stays within kMaxSampleMemory, else kImageTooLarge
 // (image_result.h), whose text is msg::kImageTooLarge. Every loader asks
 // this before it allocates samples.
-int checkSampleMemory(std::uint64_t width, std::uint64_t height, std::uint64_t samplesPerPixel = 1,
-                      std::uint64_t images = 1) noexcept;
+[[nodiscard]] int checkSampleMemory(std::uint64_t width, std::uint64_t height,
+                                    std::uint64_t samplesPerPixel = 1,
+                                    std::uint64_t images = 1) noexcept;
 
 // malloc for small blocks. A block of several megabytes is aligned to 2 MiB
 // and, where the system offers it, advised for transparent huge pages: a

@@ -74,7 +74,10 @@ int widenSamplesToFloat(ImageBuffer* raw) noexcept {
         auto* floats = static_cast<float*>(allocateSamples(static_cast<std::size_t>(bytes)));
         if (!floats)
             return kNoMemory;
-        normaliseSamples(raw, floats);
+        if (!normaliseSamples(raw, floats)) {
+            std::free(floats);
+            return kUnsupported;
+        }
         std::free(raw->data);
         raw->data = floats;
     } else if (raw->dataType == kDataUint16) {

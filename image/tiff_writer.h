@@ -9,4 +9,4 @@
 // signed integers and floats marked as such). Returns 0; -1 the file cannot be
 // opened; -2 libtiff or a write, flush or close failed; -3 no memory; -5 no
 // samples; -6 sub-sampled YUV planes or a data type without a sample width.
-int tiffWrite(const char* path, const ImageBuffer* image) noexcept;
+[[nodiscard]] int tiffWrite(const char* path, const ImageBuffer* image) noexcept;

@@ -30,10 +30,10 @@ enum class CaptureLoad {
 // sampleStatistics would measure the whole image (the samples are then read
 // twice: the depth that converts them is known after the last one).
 // `rows`, if given, also receives every row of a prepared capture.
-CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
-                         BayerImage& input, BayerImage& prepared,
-                         SampleStatistics* inputStatistics = nullptr,
-                         img::MosaicRowSink* rows = nullptr);
+[[nodiscard]] CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
+                                       BayerImage& input, BayerImage& prepared,
+                                       SampleStatistics* inputStatistics = nullptr,
+                                       img::MosaicRowSink* rows = nullptr);
 
 // The same for several frames of one flat field, averaged band by band as
 // they are read (one band of each frame in memory, prep::averageSample per
@@ -43,8 +43,9 @@ CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& setti
 // for a frame that differs from the first in size, Bayer order or bit depth
 // (the depth that each frame's largest sample sets), and as loadPrepared for
 // a frame that cannot be read.
-CaptureLoad loadAveragedPrepared(const std::vector<std::string>& paths,
-                                 const MosaicPreparation& settings, BayerImage& input,
-                                 BayerImage& prepared, img::MosaicRowSink* rows = nullptr);
+[[nodiscard]] CaptureLoad loadAveragedPrepared(const std::vector<std::string>& paths,
+                                               const MosaicPreparation& settings, BayerImage& input,
+                                               BayerImage& prepared,
+                                               img::MosaicRowSink* rows = nullptr);
 
 } // namespace prep

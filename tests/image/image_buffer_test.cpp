@@ -130,8 +130,8 @@ TEST(ImageMetadata, CopyTakesEntriesAndAFixedHeaderByteForByte) {
     int rc = 0;
     ImagePtr source = create(1, 1, 8, 1, kPixelRaw, kDataUint8, &rc);
     ImagePtr target = create(1, 1, 8, 1, kPixelRaw, kDataUint8, &rc);
-    imageSetMetadata(target.get(), "old", "gone");
-    imageSetMetadata(source.get(), "a", "1");
+    ASSERT_EQ(imageSetMetadata(target.get(), "old", "gone"), img::kOk);
+    ASSERT_EQ(imageSetMetadata(source.get(), "a", "1"), img::kOk);
     auto* header = static_cast<unsigned char*>(std::malloc(kKqRawFixedHeaderSize));
     for (std::size_t i = 0; i < kKqRawFixedHeaderSize; ++i)
         header[i] = static_cast<unsigned char>(i * 7);
@@ -150,7 +150,7 @@ TEST(ImageMetadata, CopyTakesEntriesAndAFixedHeaderByteForByte) {
 TEST(ImageMetadata, ClearReleasesEntriesAndTheRawHeader) {
     int rc = 0;
     ImagePtr image = create(1, 1, 8, 1, kPixelRaw, kDataUint8, &rc);
-    imageSetMetadata(image.get(), "k", "v");
+    ASSERT_EQ(imageSetMetadata(image.get(), "k", "v"), img::kOk);
     image->rawHeader = std::malloc(kNkRawHeaderSize);
     image->fileType = kFileNkRaw;
     imageClearMetadata(image.get());

@@ -190,15 +190,15 @@ TEST(KqRawContainerParse, ConvertsAFixedHeaderFileWhoseMarkerIsEarly) {
     ASSERT_GE(capture, 0);
     float value = 0;
     std::uint32_t word = 0;
-    kqrawBlockGetFloat(c->blocks[capture], kqcap::kExposureTime, &value);
+    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], kqcap::kExposureTime, &value));
     EXPECT_EQ(value, 33.0f);
-    kqrawBlockGetFloat(c->blocks[capture], kqcap::kSecondValue, &value);
+    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], kqcap::kSecondValue, &value));
     EXPECT_EQ(value, 0.5f);
     kqrawBlockGet32(c->blocks[capture], kqcap::kCarried1, &word);
     EXPECT_EQ(word, 0x11223344u);
     kqrawBlockGet32(c->blocks[capture], kqcap::kCarried2, &word);
     EXPECT_EQ(word, 0x55667788u);
-    kqrawBlockGetFloat(c->blocks[capture], kqcap::kGain0 + 8, &value);
+    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], kqcap::kGain0 + 8, &value));
     EXPECT_EQ(value, 2.5f);
     kqrawBlockGet32(c->blocks[c->headerIndex], kqhdr::kBayerCode, &word);
     EXPECT_EQ(word, 0x52474742u);
@@ -276,7 +276,7 @@ TEST(KqRawContainerWrite, RefusesAContainerWithoutHeaderOrPixels) {
     ContainerPtr c(kqrawContainerCreate());
     TempDir dir;
     EXPECT_FALSE(kqrawContainerWrite(c.get(), dir.file("a").c_str()));
-    kqrawContainerSetHeader(c.get(), kqrawBlockCreateHeader());
+    ASSERT_TRUE(kqrawContainerSetHeader(c.get(), kqrawBlockCreateHeader()));
     EXPECT_FALSE(kqrawContainerWrite(c.get(), dir.file("a").c_str()));
     EXPECT_FALSE(testing_support::fileExists(dir.file("a")));
     EXPECT_EQ(kqrawContainerRead(dir.file("missing").c_str()), nullptr);
