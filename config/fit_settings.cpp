@@ -15,25 +15,25 @@ const config_node& setting(const config_node& config, const char* section, const
 }
 
 void loadPatchFractions(const config_node& config, double width, double height,
-                        ProcessingContext& context) {
+                        PatchLayout& layout) {
     const config_node& lsc = config.find("lsc");
     if (!lsc.find("left_patch_width").is_default() && lsc.find("leftPatchFactor").is_default()) {
-        context.leftFraction = lsc.find("left_patch_width").as_int() / width;
-        context.centerFraction = lsc.find("center_patch_width").as_int() / width;
-        context.topFraction = lsc.find("top_patch_height").as_int() / height;
-        context.middleFraction = lsc.find("middle_patch_height").as_int() / height;
+        layout.left = lsc.find("left_patch_width").as_int() / width;
+        layout.center = lsc.find("center_patch_width").as_int() / width;
+        layout.top = lsc.find("top_patch_height").as_int() / height;
+        layout.middle = lsc.find("middle_patch_height").as_int() / height;
     } else {
-        context.leftFraction = lsc.find("leftPatchFactor").as_float();
-        context.centerFraction = lsc.find("centerPatchFactor").as_float();
-        context.topFraction = lsc.find("topPatchFactor").as_float();
-        context.middleFraction = lsc.find("middlePatchFactor").as_float();
+        layout.left = lsc.find("leftPatchFactor").as_float();
+        layout.center = lsc.find("centerPatchFactor").as_float();
+        layout.top = lsc.find("topPatchFactor").as_float();
+        layout.middle = lsc.find("middlePatchFactor").as_float();
     }
 }
 
 // Every block must hold at least one pixel: a count of 0 would divide by
 // zero in the evaluation, and a count above the image size leaves blocks empty.
 void loadDeltaAbBlocks(const config_node& config, std::int32_t width, std::int32_t height,
-                       ProcessingContext& context) {
+                       ShadingSettings& settings) {
     const config_node& blocks = setting(config, "apply_lsc", "delta_ab_blocks");
     // Columns and rows: a third value would be ignored without a word.
     if (blocks.size() != 2)
@@ -43,59 +43,59 @@ void loadDeltaAbBlocks(const config_node& config, std::int32_t width, std::int32
     if (horizontal != 0 || vertical != 0) {
         check_int_range(config, blocks.find(0), 1, width);
         check_int_range(config, blocks.find(1), 1, height);
-        context.deltaAbBlocks[0] = horizontal;
-        context.deltaAbBlocks[1] = vertical;
+        settings.deltaAbBlocks[0] = horizontal;
+        settings.deltaAbBlocks[1] = vertical;
         return;
     }
     const float ratio = static_cast<float>(width) / static_cast<float>(height);
     if (std::fabs(ratio - 4.0f / 3.0f) < 0.01f) {
-        context.deltaAbBlocks[0] = 20, context.deltaAbBlocks[1] = 15;
+        settings.deltaAbBlocks[0] = 20, settings.deltaAbBlocks[1] = 15;
     } else if (std::fabs(ratio - 1.5f) < 0.01f) {
-        context.deltaAbBlocks[0] = 24, context.deltaAbBlocks[1] = 16;
+        settings.deltaAbBlocks[0] = 24, settings.deltaAbBlocks[1] = 16;
     } else if (std::fabs(ratio - 16.0f / 9.0f) < 0.01f) {
-        context.deltaAbBlocks[0] = 32, context.deltaAbBlocks[1] = 18;
+        settings.deltaAbBlocks[0] = 32, settings.deltaAbBlocks[1] = 18;
     } else {
-        context.deltaAbBlocks[0] = static_cast<int>(std::floor(ratio * 15.0f));
-        context.deltaAbBlocks[1] = 15;
+        settings.deltaAbBlocks[0] = static_cast<int>(std::floor(ratio * 15.0f));
+        settings.deltaAbBlocks[1] = 15;
     }
-    if (context.deltaAbBlocks[0] < 1 || context.deltaAbBlocks[0] > width ||
-        context.deltaAbBlocks[1] > height)
+    if (settings.deltaAbBlocks[0] < 1 || settings.deltaAbBlocks[0] > width ||
+        settings.deltaAbBlocks[1] > height)
         throw std::range_error(config::msg::kNoDeltaAbBlocksPrefix + integerText(width) + "x" +
                                integerText(height) + config::msg::kNoDeltaAbBlocksSuffix);
 }
 
 } // namespace
 
-void load_fit_settings(const config_node& config, const BayerImage& image,
-                       ProcessingContext& context) {
+ShadingSettings load_fit_settings(const config_node& config, const BayerImage& image) {
+    ShadingSettings settings;
     const std::int32_t width = image.width();
     const std::int32_t height = image.height();
 
-    context.procSamplingFactor = setting(config, "shared", "proc_sampling_factor").as_int();
-    loadPatchFractions(config, width, height, context);
-    context.sampleAngleStep = setting(config, "lsc", "sampling_factor").as_int();
-    context.sampleMargin = setting(config, "lsc", "sampling_margin").as_int();
-    context.falloff =
+    settings.procSamplingFactor = setting(config, "shared", "proc_sampling_factor").as_int();
+    loadPatchFractions(config, width, height, settings.layout);
+    settings.sampleAngleStep = setting(config, "lsc", "sampling_factor").as_int();
+    settings.sampleMargin = setting(config, "lsc", "sampling_margin").as_int();
+    settings.falloff =
         static_cast<float>(setting(config, "lsc", "falloff_factor").as_int()) / 100.0f;
-    context.greenBalance = setting(config, "lsc", "green_balance").as_int() != 0;
-    context.applyStep =
+    settings.greenBalance = setting(config, "lsc", "green_balance").as_int() != 0;
+    settings.applyStep =
         static_cast<unsigned>(setting(config, "apply_lsc", "sampling_factor").as_int());
-    context.maxGain = setting(config, "lsc", "max_gain").as_float();
-    context.maxRmsError = setting(config, "lsc", "max_rms_err").as_float();
-    context.maxError = setting(config, "lsc", "max_err").as_float();
-    context.logFitError = setting(config, "lsc", "log_err_flag").as_int() != 0;
-    context.sampleWindow = setting(config, "lsc", "sample_window").as_int();
-    context.maxDeltaAb = setting(config, "apply_lsc", "max_delta_ab").as_float();
-    context.maxLumaResidual = setting(config, "apply_lsc", "max_luma_residual").as_float();
-    context.autoPatchLayout = setting(config, "lsc", "patch_layout").as_string() == "auto";
-    context.awbFilterSize = setting(config, "lsc", "awb_avg_filter_size").as_int();
-    context.lumaNormalizeFactor = setting(config, "apply_lsc", "luma_normalize_factor").as_float();
-    loadDeltaAbBlocks(config, width, height, context);
+    settings.maxGain = setting(config, "lsc", "max_gain").as_float();
+    settings.maxRmsError = setting(config, "lsc", "max_rms_err").as_float();
+    settings.maxError = setting(config, "lsc", "max_err").as_float();
+    settings.logFitError = setting(config, "lsc", "log_err_flag").as_int() != 0;
+    settings.sampleWindow = setting(config, "lsc", "sample_window").as_int();
+    settings.maxDeltaAb = setting(config, "apply_lsc", "max_delta_ab").as_float();
+    settings.maxLumaResidual = setting(config, "apply_lsc", "max_luma_residual").as_float();
+    settings.autoPatchLayout = setting(config, "lsc", "patch_layout").as_string() == "auto";
+    settings.awbFilterSize = setting(config, "lsc", "awb_avg_filter_size").as_int();
+    settings.lumaNormalizeFactor = setting(config, "apply_lsc", "luma_normalize_factor").as_float();
+    loadDeltaAbBlocks(config, width, height, settings);
     const config_node& ccm = setting(config, "apply_lsc", "ccm");
     for (std::size_t r = 0; r < 3; ++r)
         for (std::size_t c = 0; c < 3; ++c)
-            context.ccm[r][c] = ccm.find(r).find(c).as_float();
-    context.averageChannels = setting(config, "lsc", "avg_luma").as_int() != 0;
+            settings.ccm[r][c] = ccm.find(r).find(c).as_float();
+    settings.averageChannels = setting(config, "lsc", "avg_luma").as_int() != 0;
 
     int bits = setting(config, "shared", "bit_res").as_int();
     if (bits == 0)
@@ -103,6 +103,7 @@ void load_fit_settings(const config_node& config, const BayerImage& image,
     if (bits <= 0)
         throw std::runtime_error(config::msg::kZeroBitDepth);
     const std::uint32_t fullScale = bits >= 32 ? 0xFFFFFFFFu : (1u << bits) - 1u;
-    context.blackLevel =
+    settings.blackLevel =
         setting(config, "proc", "black_level").as_float() / static_cast<float>(fullScale);
+    return settings;
 }

@@ -5,11 +5,10 @@
 
 #include "config/config_node.h"
 #include "image/bayer_image.h"
-#include "lsc/processing_context.h"
+#include "lsc/shading_settings.h"
 
 // Reads below the "config" node; `image` gives width, height and bit depth.
 // Throws the getters' errors, std::range_error for delta-ab block counts that
 // leave a block empty, std::runtime_error for an image without bit depth.
-// The quiet flag is not touched (it comes from the command line).
-void load_fit_settings(const config_node& config, const BayerImage& image,
-                       ProcessingContext& context);
+// The quiet flag stays false (it comes from the command line).
+ShadingSettings load_fit_settings(const config_node& config, const BayerImage& image);

@@ -41,21 +41,21 @@ bool allInitialized(const config_node& data, const char* const (&keys)[N]) {
                              config::msg::kMismatchSuffix);
 }
 
-void setFractions(ProcessingContext& context, const double (&fractions)[4]) {
-    context.leftFraction = fractions[0];
-    context.centerFraction = fractions[1];
-    context.topFraction = fractions[2];
-    context.middleFraction = fractions[3];
+void setFractions(PatchLayout& layout, const double (&fractions)[4]) {
+    layout.left = fractions[0];
+    layout.center = fractions[1];
+    layout.top = fractions[2];
+    layout.middle = fractions[3];
 }
 
 void readLegacyGeometry(const config_node& lsc, const config_node& data, float width, float height,
-                        ProcessingContext& context) {
+                        PatchLayout& layout) {
     if (!allInitialized(data, kLegacyKeys))
         throw std::runtime_error(config::msg::kMissingPatchSizes);
     int sizes[4];
     for (int i = 0; i < 4; ++i)
         sizes[i] = data.find(kLegacyKeys[i]).as_int();
-    setFractions(context,
+    setFractions(layout,
                  {static_cast<float>(sizes[0]) / width, static_cast<float>(sizes[1]) / width,
                   static_cast<float>(sizes[2]) / height, static_cast<float>(sizes[3]) / height});
     if (lsc.find("left_patch_width").is_default()) {
@@ -69,14 +69,14 @@ void readLegacyGeometry(const config_node& lsc, const config_node& data, float w
 }
 
 void readFactorGeometry(const config_node& lsc, const config_node& data, std::int32_t width,
-                        std::int32_t height, ProcessingContext& context) {
+                        std::int32_t height, PatchLayout& layout) {
     if (!allInitialized(data, kFactorKeys) || !data.find("imageWidth").initialized() ||
         !data.find("imageHeight").initialized())
         throw std::runtime_error(config::msg::kMissingPatchSizes);
     float factors[4];
     for (int i = 0; i < 4; ++i)
         factors[i] = data.find(kFactorKeys[i]).as_float();
-    setFractions(context, {factors[0], factors[1], factors[2], factors[3]});
+    setFractions(layout, {factors[0], factors[1], factors[2], factors[3]});
     const int dataWidth = data.find("imageWidth").as_int();
     const int dataHeight = data.find("imageHeight").as_int();
     if (dataWidth != width || dataHeight != height)
@@ -100,29 +100,35 @@ void readFactorGeometry(const config_node& lsc, const config_node& data, std::in
 
 } // namespace
 
-void readConfigParam(const config_node& root, const config_node& data, ProcessingContext& context) {
-    if (context.image.empty())
+StoredCalibration readConfigParam(const config_node& root, const config_node& data,
+                                  const BayerImage& image, const ShadingCorrection& fitted) {
+    if (image.empty())
         throw std::runtime_error(config::msg::kImageNotSet);
-    const std::int32_t width = context.image.width();
-    const std::int32_t height = context.image.height();
+    const std::int32_t width = image.width();
+    const std::int32_t height = image.height();
     const config_node& lsc = root.find("config").find("lsc");
 
+    StoredCalibration stored;
+    stored.correction = fitted;
+    PatchLayout& layout = stored.correction.layout;
     if (anyInitialized(data, kLegacyKeys))
         readLegacyGeometry(lsc, data, static_cast<float>(width), static_cast<float>(height),
-                           context);
+                           layout);
     else if (anyInitialized(data, kFactorKeys) || data.find("imageWidth").initialized() ||
              data.find("imageHeight").initialized())
-        readFactorGeometry(lsc, data, width, height, context);
+        readFactorGeometry(lsc, data, width, height, layout);
 
     if (data.find("controlPointR").valid()) {
         for (int channel = 0; channel < kChannels; ++channel) {
             const config_node& grid = data.find(kControlPointKeys[channel]);
             for (std::size_t n = 0; n < kGridPoints; ++n)
-                context.controlGrids[channel][n] = grid.find(n / 10).find(n % 10).as_float();
+                stored.correction.controlGrids[channel][n] =
+                    grid.find(n / 10).find(n % 10).as_float();
         }
     }
     if (data.find("R").valid())
         for (int channel = 0; channel < kChannels; ++channel)
-            context.whiteBalance[channel] =
+            stored.whiteBalance[channel] =
                 static_cast<float>(data.find(kWhiteBalanceKeys[channel]).as_int());
+    return stored;
 }

@@ -5,12 +5,21 @@
 // size as the input image.
 
 #include "config/config_node.h"
-#include "lsc/processing_context.h"
+#include "image/bayer_image.h"
+#include "lsc/fit_result.h"
+
+// What stored calibration data hold: the correction (patch layout and
+// control points) and the white-balance levels.
+struct StoredCalibration {
+    ShadingCorrection correction;
+    float whiteBalance[kChannels] = {0, 0, 0, 0};
+};
 
 // `root` is the configuration tree's root (read as config.lsc.*); `data`
 // holds the register names without their block prefix (leftPatchWidth,
-// leftPatchFactor, imageWidth, controlPointR, R, ...); `context.image` must
-// hold the input image. Throws std::range_error when the sensor size does
-// not match, std::runtime_error for the other mismatches; values stored
-// before a failure stay in `context`.
-void readConfigParam(const config_node& root, const config_node& data, ProcessingContext& context);
+// leftPatchFactor, imageWidth, controlPointR, R, ...); `image` is the image
+// the correction is for. What the data leave out stays as in `fitted`.
+// Throws std::range_error when the sensor size does not match,
+// std::runtime_error for the other mismatches.
+StoredCalibration readConfigParam(const config_node& root, const config_node& data,
+                                  const BayerImage& image, const ShadingCorrection& fitted);

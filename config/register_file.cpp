@@ -59,7 +59,7 @@ void checkExportedSizes(const ExportedPatchSizes& s, std::int32_t width, std::in
 }
 
 void writeGeometry(RegisterText& out, const config_node& lsc, const ExportedPatchSizes& sizes,
-                   const ProcessingContext& fit, std::int32_t width, std::int32_t height) {
+                   const FitResult& fit, std::int32_t width, std::int32_t height) {
     if (!lsc.find("left_patch_width").is_default() && lsc.find("leftPatchFactor").is_default()) {
         out.assign("leftPatchWidth       ", integerText(sizes.left));
         out.assign("centerPatchWidth     ", integerText(sizes.center));
@@ -69,10 +69,10 @@ void writeGeometry(RegisterText& out, const config_node& lsc, const ExportedPatc
     }
     out.assign("imageWidth           ", integerText(width));
     out.assign("imageHeight          ", integerText(height));
-    out.assign("leftPatchFactor      ", generalText(fit.leftFraction, 6));
-    out.assign("centerPatchFactor    ", generalText(fit.centerFraction, 6));
-    out.assign("topPatchFactor       ", generalText(fit.topFraction, 6));
-    out.assign("middlePatchFactor    ", generalText(fit.middleFraction, 6));
+    out.assign("leftPatchFactor      ", generalText(fit.correction.layout.left, 6));
+    out.assign("centerPatchFactor    ", generalText(fit.correction.layout.center, 6));
+    out.assign("topPatchFactor       ", generalText(fit.correction.layout.top, 6));
+    out.assign("middlePatchFactor    ", generalText(fit.correction.layout.middle, 6));
 }
 
 // A level is clamped to the full scale before it is cut to the 16-bit register,
@@ -90,7 +90,7 @@ std::uint32_t whiteBalanceLevel(float target, std::uint32_t fullScale, int chann
     return level >= static_cast<float>(limit) ? limit : static_cast<std::uint32_t>(level);
 }
 
-void writeWhiteBalance(RegisterText& out, const config_node& config, const ProcessingContext& fit,
+void writeWhiteBalance(RegisterText& out, const config_node& config, const FitResult& fit,
                        const BayerImage& image) {
     int bits = config.find("shared").find("bit_res").as_int() & 0xFFFF;
     if (bits == 0)
@@ -142,12 +142,12 @@ void writeDeltas(RegisterText& out, const ExportedPatchSizes& sizes) {
     }
 }
 
-void writeControlPoints(RegisterText& out, const std::string& infix, const ProcessingContext& fit) {
+void writeControlPoints(RegisterText& out, const std::string& infix, const FitResult& fit) {
     for (int channel = 0; channel < kChannels; ++channel) {
         for (int n = 0; n < kGridPoints; ++n) {
             const std::string name = infix + ".controlPoint" + kChannelRegisters[channel] + "[" +
                                      integerText(n / 10) + "][" + integerText(n % 10) + "]";
-            const double value = fit.controlGrids[channel][n];
+            const double value = fit.correction.controlGrids[channel][n];
             const std::string text = generalText(value, 12);
             if (!std::isfinite(value))
                 throw std::runtime_error(config::msg::kNonFiniteControlPointPrefix +
@@ -171,13 +171,14 @@ std::string singleLine(std::string text) {
 
 std::string register_file_text(const config_node& config, const std::string& blockName,
                                const std::string& controlPointInfix,
-                               const std::string& commandLineText, const ProcessingContext& fit,
+                               const std::string& commandLineText, const FitResult& fit,
                                const BayerImage& image) {
     const std::int32_t width = image.width();
     const std::int32_t height = image.height();
-    const ExportedPatchSizes sizes = exportedPatchSizes(
-        static_cast<std::uint32_t>(width), static_cast<std::uint32_t>(height), fit.leftFraction,
-        fit.centerFraction, fit.topFraction, fit.middleFraction);
+    const ExportedPatchSizes sizes =
+        exportedPatchSizes(static_cast<std::uint32_t>(width), static_cast<std::uint32_t>(height),
+                           fit.correction.layout.left, fit.correction.layout.center,
+                           fit.correction.layout.top, fit.correction.layout.middle);
     checkExportedSizes(sizes, width, height);
     const config_node& shared = config.find("shared");
 
@@ -203,7 +204,7 @@ std::string register_file_text(const config_node& config, const std::string& blo
 
 std::string write_register_file(const std::string& path, const config_node& config,
                                 const std::string& blockName, const std::string& controlPointInfix,
-                                const std::string& commandLineText, const ProcessingContext& fit,
+                                const std::string& commandLineText, const FitResult& fit,
                                 const BayerImage& image) {
     const std::string text =
         register_file_text(config, blockName, controlPointInfix, commandLineText, fit, image);

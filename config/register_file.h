@@ -7,7 +7,7 @@
 
 #include "config/config_node.h"
 #include "image/bayer_image.h"
-#include "lsc/processing_context.h"
+#include "lsc/fit_result.h"
 
 // Builds the whole text first, so that a geometry or value the file cannot
 // hold is refused before anything is written, then writes it through a
@@ -22,11 +22,11 @@
 // device (/dev/null, a pipe) may answer differently.
 std::string write_register_file(const std::string& path, const config_node& config,
                                 const std::string& blockName, const std::string& controlPointInfix,
-                                const std::string& commandLineText, const ProcessingContext& fit,
+                                const std::string& commandLineText, const FitResult& fit,
                                 const BayerImage& image);
 
 // The text alone (same checks, nothing written).
 std::string register_file_text(const config_node& config, const std::string& blockName,
                                const std::string& controlPointInfix,
-                               const std::string& commandLineText, const ProcessingContext& fit,
+                               const std::string& commandLineText, const FitResult& fit,
                                const BayerImage& image);

@@ -11,25 +11,16 @@
 #include "image/tiff_writer.h"
 #include "lsc/lens_shading_correction.h"
 
-void writeCheckImage(const std::string& path, BayerImage capture, const ProcessingContext& fit) {
-    ProcessingContext correction;
-    correction.image = std::move(capture);
-    correction.blackLevel = fit.blackLevel;
-    correction.applyStep = 1;
-    correction.leftFraction = fit.leftFraction;
-    correction.centerFraction = fit.centerFraction;
-    correction.topFraction = fit.topFraction;
-    correction.middleFraction = fit.middleFraction;
-    std::copy(&fit.controlGrids[0][0], &fit.controlGrids[0][0] + kChannels * kGridPoints,
-              &correction.controlGrids[0][0]);
-    applyLensShading(correction);
-    correction.image.reset();
+void writeCheckImage(const std::string& path, BayerImage capture,
+                     const ShadingCorrection& correction, float blackLevel,
+                     const float (&targetLevels)[kChannels]) {
+    BayerImage corrected = applyLensShading(capture, correction, blackLevel, 1);
+    capture.reset();
 
-    const BayerImage& corrected = correction.corrected;
-    const float green = std::max(fit.targetLevels[1], fit.targetLevels[2]);
+    const float green = std::max(targetLevels[1], targetLevels[2]);
     float balance[kChannels];
     for (int c = 0; c < kChannels; ++c)
-        balance[c] = fit.targetLevels[c] > 0.0f ? green / fit.targetLevels[c] : 1.0f;
+        balance[c] = targetLevels[c] > 0.0f ? green / targetLevels[c] : 1.0f;
 
     int rc = 0;
     ImagePtr out(imageCreate(corrected.width(), corrected.height(), 16, 1, 1, 0, corrected.cfa(),

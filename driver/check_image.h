@@ -6,9 +6,9 @@
 #include <string>
 
 #include "image/bayer_image.h"
-#include "lsc/processing_context.h"
+#include "lsc/fit_result.h"
 
-// Applies the fit's correction (control grids, patch fractions, black level)
+// Applies the correction (control grids, patch layout) and the black level
 // to every pixel of `capture`, balances the four channels to the larger
 // green's target level, so a good flat field shows as an even grey mosaic,
 // and writes the result as an uncompressed 16-bit grey TIFF of the capture's
@@ -16,4 +16,6 @@
 // and renamed into place. The capture's samples are released on the way (only
 // its size and Bayer order are needed afterwards). Throws std::runtime_error
 // "Cannot store check image: <path>" when it cannot be written.
-void writeCheckImage(const std::string& path, BayerImage capture, const ProcessingContext& fit);
+void writeCheckImage(const std::string& path, BayerImage capture,
+                     const ShadingCorrection& correction, float blackLevel,
+                     const float (&targetLevels)[kChannels]);

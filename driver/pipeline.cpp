@@ -165,35 +165,42 @@ void Pipeline::runStages() {
     checkPreparedImage();
     lookForSetUpMistakes();
     writePreparedImage();
-    buildSampleSet();
-    if (context_.autoPatchLayout) {
+    shading_ = readShadingSettings();
+    if (shading_.autoPatchLayout) {
         beginStage("Choosing the patch layout");
-        choosePatchLayout();
+        shading_.layout = choosePatchLayout();
     }
-    beginStage("Obtaining the samples");
-    obtainSamples();
-    beginStage("Fitting the lens shading surface");
-    fitSurface();
+    FitResult fit;
+    {
+        beginStage("Obtaining the samples");
+        const SamplesTaken samples = obtainSamples();
+        beginStage("Fitting the lens shading surface");
+        fit = fitSurface(samples);
+    } // the levelled image the samples were measured on is released here
     beginStage("Writing the calibration register file");
-    writeRegisterFile();
+    writeRegisterFile(fit);
+    // The correction as stored in the binary data, when they are written.
+    ShadingCorrection correction = fit.correction;
     if (!settings_.binary.empty()) {
         beginStage("Binary calibration data");
-        writeBinaryData();
+        correction = writeBinaryData(fit);
     }
     beginStage("Correcting the lens shading");
-    correct();
+    BayerImage flattened = correct(correction);
     beginStage("White balance");
-    balanceWhite();
-    measureLuminance();
+    balanceWhite(flattened, fit);
+    // Before delta ab, which turns the flattened image into display values.
+    const std::optional<float> lumaResidual = measureLuminance(flattened);
     beginStage("Delta ab");
-    measureColourError();
+    measureColourError(flattened);
+    // After delta ab, so that its files are written for a failed run too.
     beginStage("Luminance residual");
-    checkLuminance();
+    prep::checkLuminanceResidual(lumaResidual, shading_.maxLumaResidual);
     beginStage("Writing the flattened images");
-    writeFlattenedImages();
+    writeFlattenedImages(std::move(flattened));
     if (!checkPath_.empty()) {
         beginStage("Writing the check image");
-        writeCheck();
+        writeCheck(correction, fit);
     }
 }
 
@@ -502,84 +509,94 @@ void Pipeline::writePreparedImage() {
     }
 }
 
-void Pipeline::buildSampleSet() {
-    context_.image.copy(prepared_);
-    load_fit_settings(*config_, input_, context_);
-    context_.quiet = settings_.quiet;
+ShadingSettings Pipeline::readShadingSettings() {
+    ShadingSettings shading = load_fit_settings(*config_, input_);
+    shading.quiet = settings_.quiet;
     report_.havePrepared = true;
     report_.preparedWidth = prepared_.width();
     report_.preparedHeight = prepared_.height();
     if (!reportPath_.empty()) {
         report_.shadingBefore = reportBlockMeans(prepared_);
-        scaleToPeak(report_.shadingBefore, context_.blackLevel);
+        scaleToPeak(report_.shadingBefore, shading.blackLevel);
     }
     timerLine(timer_, "Image checking time: ", out());
+    return shading;
 }
 
-void Pipeline::obtainSamples() {
-    const std::uint32_t sampleScale = prep::sampleFullScale(depth_);
+Pipeline::SamplesTaken Pipeline::obtainSamples() {
+    const prep::SampleFileScale scale{prep::sampleFullScale(depth_), shading_.procSamplingFactor};
+    SamplesTaken taken;
     if (settings_.samples.empty()) {
         out() << "Create samples from image." << std::endl;
-        collectSamples(context_, out());
+        taken.measuredOn = levelledImage(prepared_, shading_.blackLevel);
+        taken.set = collectSamples(taken.measuredOn, shading_, out());
+        taken.fromImage = true;
         if (!settings_.outSamples.empty()) {
-            prep::writeSampleFile(settings_.outSamples, context_, sampleScale);
+            prep::writeSampleFile(settings_.outSamples, taken.set, taken.measuredOn, scale);
             noteOutput("outsamples", settings_.outSamples);
         }
     } else {
         out() << "Loading sample points from file." << std::endl;
-        prep::readSampleFile(settings_.samples, context_, sampleScale);
+        taken.set = prep::readSampleFile(settings_.samples, prepared_, scale);
     }
+    return taken;
 }
 
-void Pipeline::fitSurface() {
+FitResult Pipeline::fitSurface(const SamplesTaken& samples) {
     out() << "Computing lens shading surface." << std::endl;
-    fitLensShading(context_, out());
-    const auto ratios = printColourRatios("Measured ", context_.targetLevels);
+    const SampleOrigin origin{samples.fromImage ? samples.measuredOn : prepared_,
+                              samples.fromImage};
+    FitResult fit = fitLensShading(samples.set, origin, shading_, out(), deviations_);
+    const auto ratios = printColourRatios("Measured ", fit.targetLevels);
     report_.measuredRatios[0] = ratios.first;
     report_.measuredRatios[1] = ratios.second;
     if (settings_.xtest) {
         out() << "X test mode specified." << std::endl;
         out() << "Forcing lens shading surface to produce an X shaped color distortion."
               << std::endl;
-        applyXTestSurface(context_);
+        applyXTestSurface(fit.correction);
         report_.xtest = true;
         warn("X-test run: the register file holds a test surface that distorts the colours on "
              "purpose, not a calibration of this module.");
     }
-    recordFit();
+    report_.samplePoints.clear();
+    for (const shadingSample& sample : samples.set.samples)
+        report_.samplePoints.emplace_back(sample.x, sample.y);
+    recordFit(fit.correction, fit.targetLevels);
+    return fit;
 }
 
-void Pipeline::recordFit() {
+void Pipeline::recordFit(const ShadingCorrection& correction,
+                         const float (&targetLevels)[kChannels]) {
     report_.haveFit = true;
-    report_.fractions[0] = context_.leftFraction;
-    report_.fractions[1] = context_.centerFraction;
-    report_.fractions[2] = context_.topFraction;
-    report_.fractions[3] = context_.middleFraction;
-    std::copy(&context_.controlGrids[0][0], &context_.controlGrids[0][0] + kChannels * kGridPoints,
+    const PatchLayout& layout = correction.layout;
+    report_.fractions[0] = layout.left;
+    report_.fractions[1] = layout.center;
+    report_.fractions[2] = layout.top;
+    report_.fractions[3] = layout.middle;
+    std::copy(&correction.controlGrids[0][0],
+              &correction.controlGrids[0][0] + kChannels * kGridPoints,
               &report_.controlGrids[0][0]);
-    std::copy(context_.targetLevels, context_.targetLevels + kChannels, report_.targetLevels);
-    report_.samplePoints.clear();
-    for (const shadingSample& sample : context_.samples)
-        report_.samplePoints.emplace_back(sample.x, sample.y);
+    std::copy(targetLevels, targetLevels + kChannels, report_.targetLevels);
     recordFitError();
 }
 
 // Also after a failed fit: the deviations show why a bound ended the run.
 void Pipeline::recordFitError() {
-    report_.maxRmsBound = context_.maxRmsError;
-    report_.maxErrorBound = context_.maxError;
-    report_.maxGain = context_.maxGain;
-    report_.haveFitError = context_.fitDeviationMeasured;
-    std::copy(context_.fitDeviationMax, context_.fitDeviationMax + kChannels, report_.deviationMax);
-    std::copy(context_.fitDeviationRms, context_.fitDeviationRms + kChannels, report_.deviationRms);
+    report_.maxRmsBound = shading_.maxRmsError;
+    report_.maxErrorBound = shading_.maxError;
+    report_.maxGain = shading_.maxGain;
+    report_.haveFitError = deviations_.measured;
+    std::copy(deviations_.max, deviations_.max + kChannels, report_.deviationMax);
+    std::copy(deviations_.rms, deviations_.rms + kChannels, report_.deviationRms);
 }
 
-void Pipeline::writeRegisterFile() {
+void Pipeline::writeRegisterFile(const FitResult& fit) {
     if (!settings_.calibrate.empty()) {
         out() << "Generating configuration file." << std::endl;
         registerText_ = write_register_file(settings_.calibrate, *config_, settings_.blockName,
                                             settings_.controlPointInfix,
-                                            commandLine_.argumentsText(), context_, input_);
+                                            commandLine_.argumentsText(), fit, input_);
         noteOutput("calibrate", settings_.calibrate);
     }
     timerLine(timer_, "Lens shading calculation time: ", out());
@@ -589,7 +606,7 @@ void Pipeline::writeRegisterFile() {
 // stored bytes are checked as this run wrote them: read back through their
 // paths they could be another run's files written over ours in the meantime,
 // or a device or pipe that gives nothing back (/dev/null, /dev/stdout).
-void Pipeline::writeBinaryData() {
+ShadingCorrection Pipeline::writeBinaryData(const FitResult& fit) {
     out() << "Reading calibration data." << std::endl;
     parse_config_text(registerText_, *config_);
     if (!settings_.autofocus.empty()) {
@@ -626,80 +643,78 @@ void Pipeline::writeBinaryData() {
     blob::parseBlob(stored.data(), stored.size(), data, storedRoot.child("config"));
     timerLine(timer_, "Binary data parsing time: ", out());
     // From here on the correction uses the control points as stored.
-    readConfigParam(*root_, data, context_);
-    recordFit();
+    const StoredCalibration calibration = readConfigParam(*root_, data, prepared_, fit.correction);
+    recordFit(calibration.correction, fit.targetLevels);
     timerLine(timer_, "Binary data transfer time: ", out());
+    return calibration.correction;
 }
 
-void Pipeline::correct() {
-    // The fit took the black level out of its copy; the correction starts
-    // again from the prepared image.
-    context_.image = std::move(prepared_);
+BayerImage Pipeline::correct(const ShadingCorrection& correction) {
     out() << "Start correcting lens shading." << std::endl;
-    applyLensShading(context_);
+    BayerImage corrected =
+        applyLensShading(prepared_, correction, shading_.blackLevel, shading_.applyStep);
     timerLine(timer_, "Apply lens shading time: ", out());
+    return corrected;
 }
 
-void Pipeline::balanceWhite() {
+void Pipeline::balanceWhite(BayerImage& flattened, const FitResult& fit) {
     out() << "Performing white balancing." << std::endl;
-    prep::whiteBalance(context_);
+    float balance[kChannels];
+    prep::balanceLevels(fit.targetLevels, flattened, balance);
+    prep::whiteBalance(flattened, balance);
     float levels[kChannels];
-    prep::measureLevels(levels, context_);
+    prep::measureLevels(levels, flattened, shading_.awbFilterSize, shading_.procSamplingFactor);
     const auto ratios = printColourRatios("Flattened image measured ", levels);
     report_.haveWhiteBalance = true;
     report_.flattenedRatios[0] = ratios.first;
     report_.flattenedRatios[1] = ratios.second;
     if (!reportPath_.empty()) {
         report_.haveResidual = true;
-        report_.residualAfter = reportBlockMeans(context_.corrected);
+        report_.residualAfter = reportBlockMeans(flattened);
         deviationFromMean(report_.residualAfter);
     }
     timerLine(timer_, "White balance time: ", out());
 }
 
-void Pipeline::measureColourError() {
+void Pipeline::measureColourError(BayerImage& flattened) {
     if (settings_.avgLuma == 1 || settings_.noDelta || settings_.xtest)
         return;
     out() << "Calculating deltaAB." << std::endl;
-    out() << "Delta ab blocks: " << context_.deltaAbBlocks[0] << " x " << context_.deltaAbBlocks[1]
+    out() << "Delta ab blocks: " << shading_.deltaAbBlocks[0] << " x " << shading_.deltaAbBlocks[1]
           << std::endl;
-    prep::evaluateDeltaAb(context_);
+    const prep::DeltaAbResult delta = prep::evaluateDeltaAb(flattened, shading_);
     report_.haveDelta = true;
-    report_.deltaColumns = context_.deltaAbBlocks[0];
-    report_.deltaRows = context_.deltaAbBlocks[1];
-    report_.delta = context_.deltaImage;
-    report_.threshold = context_.maxDeltaAb;
-    report_.maxDelta = context_.maxDelta;
-    report_.meanChroma = context_.meanChroma;
-    report_.deltaStdDev = context_.deltaStdDev;
+    report_.deltaColumns = delta.columns;
+    report_.deltaRows = delta.rows;
+    report_.delta = delta.deltaImage;
+    report_.threshold = shading_.maxDeltaAb;
+    report_.maxDelta = delta.maxDelta;
+    report_.meanChroma = delta.meanChroma;
+    report_.deltaStdDev = delta.deltaStdDev;
     if (!settings_.delta.empty()) {
         out() << "Writing delta ab data." << std::endl;
-        prep::writeDeltaFile(settings_.delta, context_);
+        prep::writeDeltaFile(settings_.delta, delta);
         noteOutput("delta", settings_.delta);
     }
     out().precision(6);
-    out() << "Maximum delta ab: " << context_.maxDelta << std::endl;
+    out() << "Maximum delta ab: " << delta.maxDelta << std::endl;
     if (!settings_.stats.empty()) {
-        prep::writeStatsFile(settings_.stats, context_);
+        prep::writeStatsFile(settings_.stats, delta);
         noteOutput("stats", settings_.stats);
     }
-    prep::checkDeltaThreshold(context_.maxDelta, context_.maxDeltaAb);
+    prep::checkDeltaThreshold(delta.maxDelta, shading_.maxDeltaAb);
     timerLine(timer_, "Calculate delta ab time: ", out());
 }
 
 // The samples, the fit, the register file and the binary data then use the
 // chosen factors. Configured factors are replaced in the configuration too,
 // so that the binary data's geometry check compares with what was used.
-void Pipeline::choosePatchLayout() {
+PatchLayout Pipeline::choosePatchLayout() {
     config_node& lsc = config_->child("lsc");
     if (!lsc.find("left_patch_width").is_default() && lsc.find("leftPatchFactor").is_default())
         throw std::runtime_error(msg::kAutoLayoutNeedsFactors);
-    const LayoutChoice choice = chooseLayout(prepared_, context_);
+    const LayoutChoice choice = chooseLayout(prepared_, shading_);
     const PatchLayout& layout = choice.layout;
-    context_.leftFraction = layout.left;
-    context_.centerFraction = layout.center;
-    context_.topFraction = layout.top;
-    context_.middleFraction = layout.middle;
     const std::pair<const char*, double> factors[] = {{"leftPatchFactor", layout.left},
                                                       {"centerPatchFactor", layout.center},
                                                       {"topPatchFactor", layout.top},
@@ -715,31 +730,26 @@ void Pipeline::choosePatchLayout() {
     out() << "Patch layout: " << text << " (the flattest of " << choice.candidates << ")"
           << std::endl;
     timerLine(timer_, "Patch layout time: ", out());
+    return layout;
 }
 
-// Before delta ab, which turns the corrected image into display values.
-void Pipeline::measureLuminance() {
-    context_.lumaResidual = prep::luminanceResidual(context_);
-    report_.haveLuma = context_.lumaResidual >= 0.0f;
-    report_.lumaResidual = context_.lumaResidual;
-    report_.lumaBound = context_.maxLumaResidual;
+std::optional<float> Pipeline::measureLuminance(const BayerImage& balanced) {
+    const std::optional<float> residual = prep::luminanceResidual(balanced, shading_);
+    report_.haveLuma = residual.has_value();
+    report_.lumaResidual = residual.value_or(-1.0f);
+    report_.lumaBound = shading_.maxLumaResidual;
     // Only runs that set the bound print the figure, so that every other
     // run's output stays as it was.
-    if (context_.maxLumaResidual > 0.0f && report_.haveLuma)
-        out() << "Maximum luminance residual: " << fixedText(100.0 * context_.lumaResidual, 2)
-              << " %" << std::endl;
+    if (shading_.maxLumaResidual > 0.0f && residual)
+        out() << "Maximum luminance residual: " << fixedText(100.0 * *residual, 2) << " %"
+              << std::endl;
+    return residual;
 }
 
-// After delta ab, so that its files are written for a failed run too.
-void Pipeline::checkLuminance() {
-    prep::checkLuminanceResidual(context_.lumaResidual, context_.maxLumaResidual);
-}
-
-void Pipeline::writeFlattenedImages() {
+void Pipeline::writeFlattenedImages(BayerImage flattened) {
     // Built for --bmp as well: a BMP alone must still be written.
     if (settings_.flat.empty() && settings_.jpeg.empty() && settings_.bmp.empty())
         return;
-    BayerImage flattened = std::move(context_.corrected);
     flattened.copyMetadata(input_);
     saveIfAsked("flat", settings_.flat, "Writing flattened image.",
                 "Flattened raw image save time: ", [&](const std::string& path) {
@@ -756,9 +766,10 @@ void Pipeline::writeFlattenedImages() {
 }
 
 // Last: it takes the capture's samples, which nothing needs after it.
-void Pipeline::writeCheck() {
+void Pipeline::writeCheck(const ShadingCorrection& correction, const FitResult& fit) {
     out() << "Writing full-resolution check image." << std::endl;
-    writeCheckImage(checkPath_, std::move(input_), context_);
+    writeCheckImage(checkPath_, std::move(input_), correction, shading_.blackLevel,
+                    fit.targetLevels);
     noteOutput("check", checkPath_);
     timerLine(timer_, "Check image save time: ", out());
 }

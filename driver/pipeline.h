@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -17,7 +18,9 @@
 #include "driver/run_settings.h"
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
-#include "lsc/processing_context.h"
+#include "lsc/fit_result.h"
+#include "lsc/shading_sample.h"
+#include "lsc/shading_settings.h"
 #include "prep/capture_evidence.h"
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
@@ -49,21 +52,29 @@ private:
     // Prints "WARNING: <text>" and keeps the text for the report and the result.
     void warn(const std::string& text);
     void writePreparedImage();
-    void buildSampleSet();
-    void obtainSamples();
-    void fitSurface();
-    void recordFit();
+    ShadingSettings readShadingSettings();
+    PatchLayout choosePatchLayout();
+    // The samples and the image they were measured on: the levelled image
+    // they were taken from, or (empty) the prepared image for a sample file.
+    struct SamplesTaken {
+        SampleSet set;
+        BayerImage measuredOn;
+        bool fromImage = false;
+    };
+    SamplesTaken obtainSamples();
+    FitResult fitSurface(const SamplesTaken& samples);
+    void recordFit(const ShadingCorrection& correction, const float (&targetLevels)[kChannels]);
     void recordFitError();
-    void writeRegisterFile();
-    void writeBinaryData();
-    void correct();
-    void balanceWhite();
-    void measureColourError();
-    void measureLuminance();
-    void choosePatchLayout();
-    void checkLuminance();
-    void writeFlattenedImages();
-    void writeCheck();
+    void writeRegisterFile(const FitResult& fit);
+    // Returns the correction as the binary data store it.
+    ShadingCorrection writeBinaryData(const FitResult& fit);
+    BayerImage correct(const ShadingCorrection& correction);
+    void balanceWhite(BayerImage& flattened, const FitResult& fit);
+    std::optional<float> measureLuminance(const BayerImage& balanced);
+    // Turns the flattened image into display values (see evaluateDeltaAb).
+    void measureColourError(BayerImage& flattened);
+    void writeFlattenedImages(BayerImage flattened);
+    void writeCheck(const ShadingCorrection& correction, const FitResult& fit);
     void finish();
     // When `path` is set: the message line, store(path), the timer line.
     void saveIfAsked(const char* option, const std::string& path, const char* message,
@@ -88,7 +99,8 @@ private:
     // its header and capture data only.
     bool preparedWhileLoading_ = false;
     prep::SampleStatistics inputStatistics_; // of such a capture, in debug mode
-    ProcessingContext context_;
+    ShadingSettings shading_;                // from the configuration, with the layout the run uses
+    FitDeviations deviations_;               // set by the fit, also when a bound then ends the run
     // The register file as this run wrote it; the binary data are built from it.
     std::string registerText_;
 

@@ -8,7 +8,7 @@
 #include <utility>
 #include <vector>
 
-#include "lsc/processing_context.h"
+#include "lsc/shading_sample.h"
 
 // Per-channel block means of a Bayer image, row-major, blocks x blocks.
 struct ChannelBlockMeans {

@@ -15,7 +15,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     constexpr std::int32_t kWidth = 648, kHeight = 486;
     const prep::SampleFileScale scale{1023, 4};
     const std::string_view text(reinterpret_cast<const char*>(data), size);
-    prep::SampleSet set;
+    SampleSet set;
     try {
         set = prep::parseSampleFile(text, kWidth, kHeight, scale);
     } catch (const std::runtime_error&) {
@@ -28,7 +28,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     try {
         const std::string first =
             prep::formatSampleFile(set.targetLevels, set.samples, kWidth, kHeight, scale);
-        const prep::SampleSet again = prep::parseSampleFile(first, kWidth, kHeight, scale);
+        const SampleSet again = prep::parseSampleFile(first, kWidth, kHeight, scale);
         if (again.samples.size() != set.samples.size() ||
             prep::formatSampleFile(again.targetLevels, again.samples, kWidth, kHeight, scale) !=
                 first)

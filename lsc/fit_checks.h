@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "lsc/processing_context.h"
+#include "lsc/shading_sample.h"
 
 // The largest and the RMS deviation of one channel (see sample_deviation.h).
 struct FitDeviation {

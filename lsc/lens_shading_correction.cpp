@@ -10,30 +10,31 @@
 #include "lsc/patch_geometry.h"
 #include "lsc/working_image.h"
 
-void applyLensShading(ProcessingContext& context) {
-    const WorkingImage in = workingImage(context.image);
-    const std::uint64_t step = context.applyStep;
+BayerImage applyLensShading(const BayerImage& image, const ShadingCorrection& correction,
+                            float blackLevel, unsigned applyStep) {
+    const WorkingImage in = workingImage(image);
+    const std::uint64_t step = applyStep;
     if (step < 1)
         throw std::runtime_error(lsc::msg::kBadApplyStep);
     // Smaller inputs have no complete output block.
     if (in.width < 2 * step || in.height < 2 * step)
         throw std::runtime_error(lsc::msg::kImageTooSmallToCorrect);
-    const PatchBreakpoints breaks =
-        usablePatchBreakpoints(in.width, in.height, context.leftFraction, context.centerFraction,
-                               context.topFraction, context.middleFraction);
+    const PatchLayout& layout = correction.layout;
+    const PatchBreakpoints breaks = usablePatchBreakpoints(
+        in.width, in.height, layout.left, layout.center, layout.top, layout.middle);
 
     const std::uint32_t outWidth = static_cast<std::uint32_t>(in.width / step) & ~1u;
     const std::uint32_t outHeight = static_cast<std::uint32_t>(in.height / step) & ~1u;
-    context.corrected.reset();
     int rc = 0;
-    const ImageBuffer* source = context.image.buffer();
+    const ImageBuffer* source = image.buffer();
     ImageBuffer* out =
         imageCreate(static_cast<std::int32_t>(outWidth), static_cast<std::int32_t>(outHeight),
                     source->bitsPerSample, 1, 1, source->cfa[0], source->cfa[1], kPixelRaw,
                     kBufferRawCfa, kDataReal32, &rc);
     if (!out)
         throw std::runtime_error(lsc::msg::kImageAllocation);
-    context.corrected.reset(out);
+    BayerImage corrected;
+    corrected.reset(out);
 
     const int phase = img::bayerPhase(in.cfa);
     int channelAt[2][2];
@@ -48,9 +49,9 @@ void applyLensShading(ProcessingContext& context) {
     for (int k = 0; k < kChannels; ++k)
         for (std::uint32_t patch = 0; patch < 9; ++patch)
             cubics[k][patch] =
-                patchCubics(context.controlGrids[k], patchStart(patch / 3, patch % 3));
+                patchCubics(correction.controlGrids[k], patchStart(patch / 3, patch % 3));
 
-    const float black = context.blackLevel;
+    const float black = blackLevel;
     const float* const src = in.pixels;
     float* const dst = static_cast<float*>(out->data);
     const std::size_t inStride = in.width;
@@ -80,4 +81,5 @@ void applyLensShading(ProcessingContext& context) {
             }
         }
     }
+    return corrected;
 }

@@ -5,6 +5,7 @@
 #include <cmath>
 #include <cstdint>
 #include <exception>
+#include <optional>
 #include <ostream>
 #include <sstream>
 #include <stdexcept>
@@ -132,17 +133,27 @@ void turnSamplesIntoGains(std::vector<shadingSample>& samples,
 
 } // namespace
 
-void fitLensShading(ProcessingContext& context, std::ostream& messages) {
-    context.fitDeviationMeasured = false;
-    const WorkingImage image = workingImage(context.image);
+namespace {
+
+// The run's fit (every channel, the deviation check) or, with `trialChannel`,
+// the automatic layout's trial: that channel alone, its grid copied to the
+// others, without the deviation check, which does not depend on the layout.
+FitResult fitChannels(const SampleSet& set, const SampleOrigin& origin,
+                      const ShadingSettings& settings, std::ostream& messages,
+                      FitDeviations& deviationsOut, std::optional<int> trialChannel) {
+    deviationsOut.measured = false;
+    const WorkingImage image = workingImage(origin.image);
     const std::uint32_t w = image.width, h = image.height;
     // A patch without pixels would make the local coordinates infinite.
+    const PatchLayout& layout = settings.layout;
     const PatchBreakpoints breaks =
-        usablePatchBreakpoints(w, h, context.leftFraction, context.centerFraction,
-                               context.topFraction, context.middleFraction);
+        usablePatchBreakpoints(w, h, layout.left, layout.center, layout.top, layout.middle);
 
-    float* levels = context.targetLevels;
-    if (context.greenBalance) {
+    FitResult result;
+    result.correction.layout = layout;
+    float* levels = result.targetLevels;
+    std::copy(set.targetLevels, set.targetLevels + kChannels, levels);
+    if (settings.greenBalance) {
         if (levels[1] > levels[2])
             levels[2] = levels[1];
         else
@@ -151,7 +162,7 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
 
     const double halfW = w / 2, halfH = h / 2;
     const double diagonal = std::sqrt(halfW * halfW + halfH * halfH);
-    const float f = context.falloff;
+    const float f = settings.falloff;
     const double fx = f > 0.0f ? f * halfW / diagonal : f;
     const double fy = f > 0.0f ? f * halfH / diagonal : f;
 
@@ -159,17 +170,17 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
     targets.reserve(kChannels);
     for (int k = 0; k < kChannels; ++k)
         targets.push_back(
-            targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], context.quiet, messages));
+            targetSurface(w, h, levels[k], f, fx, fy, kChannelNames[k], settings.quiet, messages));
 
     // Judged on the measured values, before they become gains.
-    const bool trial = context.trialChannel >= 0 && context.trialChannel < kChannels;
+    const bool trial = trialChannel.has_value();
     FitDeviation deviations[kChannels];
     if (!trial)
-        measureSampleDeviations(image, context.samples, context.sampleWindow,
-                                context.samplesFromImage,
-                                context.samplesFromImage ? 0.0f : context.blackLevel, deviations);
-    turnSamplesIntoGains(context.samples, targets, context.greenBalance);
-    checkGainSamples(context.samples, w, h, context.maxGain);
+        measureSampleDeviations(image, set.samples, settings.sampleWindow, origin.fromImage,
+                                origin.fromImage ? 0.0f : settings.blackLevel, deviations);
+    std::vector<shadingSample> gains = set.samples;
+    turnSamplesIntoGains(gains, targets, settings.greenBalance);
+    checkGainSamples(gains, w, h, settings.maxGain);
 
     const std::vector<double> xBreaks(breaks.x, breaks.x + 4);
     const std::vector<double> yBreaks(breaks.y, breaks.y + 4);
@@ -179,14 +190,14 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
     // after the other.
     ChannelFit fits[kChannels];
     forEachChannel([&](int k) {
-        if (trial && k != context.trialChannel)
+        if (trial && k != *trialChannel)
             return;
         ChannelFit& fit = fits[k];
         std::ostringstream text;
         text.copyfmt(messages);
         try {
             patchSurface surface(3, 3, xBreaks, yBreaks);
-            for (const shadingSample& s : context.samples)
+            for (const shadingSample& s : gains)
                 if (s.x < w && s.y < h)
                     surface.addValueConstraint(s.x, s.y, s.value[k]);
             surface.fit(kPatchTolerance, text);
@@ -196,42 +207,61 @@ void fitLensShading(ProcessingContext& context, std::ostream& messages) {
         }
         fit.messages = text.str();
     });
+    FitDeviations measured;
     float grids[kChannels][kGridPoints];
     for (int k = 0; k < kChannels; ++k) {
-        if (trial && k != context.trialChannel)
+        if (trial && k != *trialChannel)
             continue;
         const ChannelFit& fit = fits[k];
-        if (!context.quiet)
+        if (!settings.quiet)
             messages << lsc::msg::kFittingSurface << kChannelNames[k] << std::endl;
         messages << fit.messages;
         if (fit.error)
             std::rethrow_exception(fit.error);
         std::copy(fit.grid, fit.grid + kGridPoints, grids[k]);
-        context.fitDeviationMax[k] = static_cast<float>(deviations[k].max);
-        context.fitDeviationRms[k] = static_cast<float>(deviations[k].rms);
-        if (context.logFitError && !context.quiet)
-            messages << deviationLine(k, context.fitDeviationMax[k], context.fitDeviationRms[k])
-                     << std::endl;
+        measured.max[k] = static_cast<float>(deviations[k].max);
+        measured.rms[k] = static_cast<float>(deviations[k].rms);
+        if (settings.logFitError && !settings.quiet)
+            messages << deviationLine(k, measured.max[k], measured.rms[k]) << std::endl;
     }
     if (trial)
         for (int k = 0; k < kChannels; ++k)
-            std::copy(grids[context.trialChannel], grids[context.trialChannel] + kGridPoints,
-                      grids[k]);
-    context.fitDeviationMeasured = true;
-    checkDeviationBounds(context.fitDeviationRms, context.fitDeviationMax, context.maxRmsError,
-                         context.maxError);
-    checkControlPoints(grids, context.maxGain);
+            std::copy(grids[*trialChannel], grids[*trialChannel] + kGridPoints, grids[k]);
+    measured.measured = true;
+    deviationsOut = measured;
+    checkDeviationBounds(measured.rms, measured.max, settings.maxRmsError, settings.maxError);
+    checkControlPoints(grids, settings.maxGain);
 
+    float(&controlGrids)[kChannels][kGridPoints] = result.correction.controlGrids;
     for (int k = 0; k < kChannels; ++k)
         for (int i = 0; i < kGridPoints; ++i)
-            context.controlGrids[k][i] = grids[k][i];
-    if (context.averageChannels)
+            controlGrids[k][i] = grids[k][i];
+    if (settings.averageChannels)
         for (int i = 0; i < kGridPoints; ++i) {
             float sum = 0.0f;
             for (int k = 0; k < kChannels; ++k)
-                sum += context.controlGrids[k][i];
+                sum += controlGrids[k][i];
             const float mean = sum * 0.25f;
             for (int k = 0; k < kChannels; ++k)
-                context.controlGrids[k][i] = mean;
+                controlGrids[k][i] = mean;
         }
+    return result;
+}
+
+} // namespace
+
+FitResult fitLensShading(const SampleSet& samples, const SampleOrigin& origin,
+                         const ShadingSettings& settings, std::ostream& messages,
+                         FitDeviations& deviations) {
+    return fitChannels(samples, origin, settings, messages, deviations, std::nullopt);
+}
+
+FitResult fitTrialChannel(const SampleSet& samples, const BayerImage& levelled,
+                          const ShadingSettings& settings, int channel) {
+    ShadingSettings quiet = settings;
+    quiet.quiet = true;
+    quiet.logFitError = false;
+    std::ostringstream ignored;
+    FitDeviations unused;
+    return fitChannels(samples, {levelled, true}, quiet, ignored, unused, channel);
 }

@@ -4,21 +4,40 @@
 
 #include <iosfwd>
 
-#include "lsc/processing_context.h"
+#include "image/bayer_image.h"
+#include "lsc/fit_result.h"
+#include "lsc/shading_sample.h"
+#include "lsc/shading_settings.h"
 
-// Needs the samples and target levels of collectSamples (or samples read
-// from a file). Turns the samples into gains (in place), fits one patch
-// surface per channel and writes the result to context.controlGrids only when
-// all four channels succeeded and passed the checks. Progress lines go to
-// `messages` unless quiet; with context.logFitError each channel's fit
-// deviation follows its "Fitting surface" line (see deviationLine).
+// The image the samples were measured on, which the deviation check
+// (sample_deviation.h) reads again: the levelled image they were taken from,
+// or, for samples read from a file (they may come from another capture), the
+// prepared image with the black level still in.
+struct SampleOrigin {
+    const BayerImage& image;
+    bool fromImage;
+};
+
+// Turns the samples into gains, fits one patch surface per channel and
+// returns the correction (with settings.layout) only when all four channels
+// succeeded and passed the checks. Progress lines go to `messages` unless
+// quiet; with settings.logFitError each channel's fit deviation follows its
+// "Fitting surface" line (see deviationLine).
 // Checks, in this order (std::runtime_error, see fit_checks.h): a gain the fit
-// uses above context.maxGain (before fitting); after all four fits, an RMS
-// deviation above context.maxRmsError, then a largest deviation above
-// context.maxError (the deviations stay in the context); a fitted control
-// point above context.maxGain.
+// uses above settings.maxGain (before fitting); after all four fits, an RMS
+// deviation above settings.maxRmsError, then a largest deviation above
+// settings.maxError (`deviations` is set before these, so it holds them also
+// when a bound ends the run); a fitted control point above settings.maxGain.
 // Also throws std::runtime_error for a patch geometry that leaves a patch
 // without pixels and for zero, negative or non-finite gains; apan::exception
 // 220 when there are fewer samples than control points, 230/231 from the
 // solvers.
-void fitLensShading(ProcessingContext& context, std::ostream& messages);
+FitResult fitLensShading(const SampleSet& samples, const SampleOrigin& origin,
+                         const ShadingSettings& settings, std::ostream& messages,
+                         FitDeviations& deviations);
+
+// The automatic layout's trial fit: `channel` alone, quietly, without the
+// deviation check (which does not depend on the layout); every grid of the
+// result is that channel's. Throws as fitLensShading.
+FitResult fitTrialChannel(const SampleSet& samples, const BayerImage& levelled,
+                          const ShadingSettings& settings, int channel);

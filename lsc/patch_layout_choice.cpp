@@ -22,34 +22,10 @@ bool sameLayout(const PatchLayout& a, const PatchLayout& b) {
     return a.left == b.left && a.center == b.center && a.top == b.top && a.middle == b.middle;
 }
 
-// A context that fits and corrects as the run would, without messages.
-void copyFitSettings(const ProcessingContext& from, ProcessingContext& to) {
-    to.greenBalance = from.greenBalance;
-    to.blackLevel = from.blackLevel;
-    // Half the sample grid's density along each axis: a quarter of the fit's
-    // cost, and enough to rank the layouts (the run's own fit then uses all).
-    to.sampleAngleStep = 2 * from.sampleAngleStep;
-    to.sampleMargin = from.sampleMargin;
-    to.falloff = from.falloff;
-    to.averageChannels = from.averageChannels;
-    to.awbFilterSize = from.awbFilterSize;
-    to.sampleWindow = from.sampleWindow;
-    to.maxGain = from.maxGain;
-    to.maxRmsError = from.maxRmsError;
-    to.maxError = from.maxError;
-    to.procSamplingFactor = from.procSamplingFactor;
-    to.quiet = true;
-    to.logFitError = false;
-    to.trialChannel = kTrialChannel;
-    to.applyStep = 1;
-}
-
 } // namespace
 
-std::vector<PatchLayout> candidateLayouts(const ProcessingContext& settings, std::uint32_t width,
+std::vector<PatchLayout> candidateLayouts(const PatchLayout& configured, std::uint32_t width,
                                           std::uint32_t height) {
-    const PatchLayout configured = {settings.leftFraction, settings.centerFraction,
-                                    settings.topFraction, settings.middleFraction};
     std::vector<PatchLayout> layouts = {configured};
     for (double outer : kOuterFactors) {
         const PatchLayout layout = {outer, 1.0 - 2.0 * outer, outer, 1.0 - 2.0 * outer};
@@ -97,32 +73,32 @@ double correctedFlatness(const BayerImage& corrected, int channel) {
     return worst;
 }
 
-LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& settings) {
+LayoutChoice chooseLayout(const BayerImage& prepared, const ShadingSettings& settings) {
     const std::uint32_t width = static_cast<std::uint32_t>(prepared.width());
     const std::uint32_t height = static_cast<std::uint32_t>(prepared.height());
-    const std::vector<PatchLayout> layouts = candidateLayouts(settings, width, height);
+    const std::vector<PatchLayout> layouts = candidateLayouts(settings.layout, width, height);
     LayoutChoice choice;
     choice.layout = layouts.front();
     choice.candidates = layouts.size();
     double best = 0.0;
     bool found = false;
     std::ostringstream quiet;
+    ShadingSettings trial = settings;
+    // Half the sample grid's density along each axis: a quarter of the fit's
+    // cost, and enough to rank the layouts (the run's own fit then uses all).
+    trial.sampleAngleStep = 2 * settings.sampleAngleStep;
+    trial.quiet = true;
     for (std::size_t i = 0; i < layouts.size(); ++i) {
         const PatchLayout& layout = layouts[i];
-        ProcessingContext trial;
-        copyFitSettings(settings, trial);
-        trial.leftFraction = layout.left;
-        trial.centerFraction = layout.center;
-        trial.topFraction = layout.top;
-        trial.middleFraction = layout.middle;
+        trial.layout = layout;
         double flatness = -1.0;
         try {
-            trial.image.copy(prepared);
-            collectSamples(trial, quiet);
-            fitLensShading(trial, quiet);
-            trial.image.copy(prepared); // the fit took the black level out of its copy
-            applyLensShading(trial);
-            flatness = correctedFlatness(trial.corrected, kTrialChannel);
+            const BayerImage levelled = levelledImage(prepared, trial.blackLevel);
+            const SampleSet samples = collectSamples(levelled, trial, quiet);
+            const FitResult fit = fitTrialChannel(samples, levelled, trial, kTrialChannel);
+            const BayerImage corrected =
+                applyLensShading(prepared, fit.correction, trial.blackLevel, 1);
+            flatness = correctedFlatness(corrected, kTrialChannel);
         } catch (const std::bad_alloc&) {
             throw;
         } catch (...) {

@@ -8,17 +8,13 @@
 #include <vector>
 
 #include "image/bayer_image.h"
-#include "lsc/processing_context.h"
+#include "lsc/shading_settings.h"
 
-struct PatchLayout {
-    double left, center, top, middle; // fractions of width and height
-};
-
-// The configured layout (from `settings`) first, then the symmetric layouts
+// The configured layout first, then the symmetric layouts
 // whose outer patches take 0.2, 0.3, 0.35 and 0.4 of each side, leaving out
 // repeats of the configured one and any that leaves a patch without pixels on
 // a width x height image.
-std::vector<PatchLayout> candidateLayouts(const ProcessingContext& settings, std::uint32_t width,
+std::vector<PatchLayout> candidateLayouts(const PatchLayout& configured, std::uint32_t width,
                                           std::uint32_t height);
 
 // How far the corrected image is from flat: the largest |16 x 16-pixel block
@@ -40,4 +36,4 @@ struct LayoutChoice {
 // for green/red alone, and picks the one that leaves green/red flattest; a candidate whose fit
 // fails is skipped, and when all fail the configured layout stays (the run's own fit then reports
 // why). The first of equally flat candidates wins.
-LayoutChoice chooseLayout(const BayerImage& prepared, const ProcessingContext& settings);
+LayoutChoice chooseLayout(const BayerImage& prepared, const ShadingSettings& settings);

@@ -119,40 +119,46 @@ void takeBorderLines(SampleTaker& taker, const WorkingImage& image,
 
 } // namespace
 
-void collectSamples(ProcessingContext& context, std::ostream& messages) {
-    const WorkingImage image = workingImage(context.image);
-    // The angle step is lsc.sampling_factor: 0 would never reach 90 degrees.
-    if (context.sampleAngleStep < 1)
-        throw std::runtime_error(lsc::msg::kBadAngleStep);
-    if (context.sampleMargin < 0)
-        throw std::runtime_error(lsc::msg::kBadSampleMargin);
-    if (context.procSamplingFactor < 1)
-        throw std::runtime_error(lsc::msg::kBadProcSamplingFactor);
-    if (!sampleWindowUsable(context.sampleWindow))
-        throw std::runtime_error(lsc::msg::kBadSampleWindow);
+BayerImage levelledImage(const BayerImage& prepared, float blackLevel) {
+    workingImage(prepared);
+    BayerImage levelled;
+    levelled.copy(prepared);
+    removeBlackLevel(workingImage(levelled), blackLevel);
+    return levelled;
+}
 
-    removeBlackLevel(image, context.blackLevel);
+SampleSet collectSamples(const BayerImage& levelled, const ShadingSettings& settings,
+                         std::ostream& messages) {
+    const WorkingImage image = workingImage(levelled);
+    // The angle step is lsc.sampling_factor: 0 would never reach 90 degrees.
+    if (settings.sampleAngleStep < 1)
+        throw std::runtime_error(lsc::msg::kBadAngleStep);
+    if (settings.sampleMargin < 0)
+        throw std::runtime_error(lsc::msg::kBadSampleMargin);
+    if (settings.procSamplingFactor < 1)
+        throw std::runtime_error(lsc::msg::kBadProcSamplingFactor);
+    if (!sampleWindowUsable(settings.sampleWindow))
+        throw std::runtime_error(lsc::msg::kBadSampleWindow);
 
     // A per-mille of the width, used on both axes: on a wide image it can
     // pass half the height, and then the rows simply yield no samples.
     const std::int64_t margin = static_cast<std::int64_t>(
-        static_cast<std::uint64_t>(context.sampleMargin) * image.width / 1000);
-    const PatchBreakpoints breaks =
-        patchBreakpoints(image.width, image.height, context.leftFraction, context.centerFraction,
-                         context.topFraction, context.middleFraction);
+        static_cast<std::uint64_t>(settings.sampleMargin) * image.width / 1000);
+    const PatchLayout& layout = settings.layout;
+    const PatchBreakpoints breaks = patchBreakpoints(image.width, image.height, layout.left,
+                                                     layout.center, layout.top, layout.middle);
 
-    std::vector<shadingSample> samples;
-    SampleTaker taker(image, margin, context.sampleWindow, samples);
-    takeSineGrid(taker, image, context.sampleAngleStep);
+    SampleSet set;
+    SampleTaker taker(image, margin, settings.sampleWindow, set.samples);
+    takeSineGrid(taker, image, settings.sampleAngleStep);
     takeBorderLines(taker, image, breaks);
-    lsc::checkSampleCount(samples.size());
-    context.samples = std::move(samples);
-    context.samplesFromImage = true;
+    lsc::checkSampleCount(set.samples.size());
 
-    const int filter = context.awbFilterSize / (2 * context.procSamplingFactor);
+    const int filter = settings.awbFilterSize / (2 * settings.procSamplingFactor);
     const int windowSize = filter > 0 ? (filter & ~1) | 1 : 1;
-    targetLevelsOf(image, windowSize, context.targetLevels);
+    targetLevelsOf(image, windowSize, set.targetLevels);
 
-    if (!context.quiet)
-        messages << lsc::msg::kSampleCount << context.samples.size() << std::endl;
+    if (!settings.quiet)
+        messages << lsc::msg::kSampleCount << set.samples.size() << std::endl;
+    return set;
 }

@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "lsc/fit_checks.h"
-#include "lsc/processing_context.h"
+#include "lsc/shading_sample.h"
 #include "lsc/working_image.h"
 
 // Side, in Bayer blocks, of the median window of the robust gains: at least

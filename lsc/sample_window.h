@@ -4,7 +4,7 @@
 
 #include <cstdint>
 
-#include "lsc/processing_context.h"
+#include "lsc/shading_sample.h"
 #include "lsc/working_image.h"
 
 // Window sizes collectSamples accepts: odd, 1 to 15 blocks per side.

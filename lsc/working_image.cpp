@@ -4,7 +4,7 @@
 
 #include "lsc/lsc_messages.h"
 
-WorkingImage workingImage(BayerImage& image) {
+WorkingImage workingImage(const BayerImage& image) {
     if (image.empty())
         throw std::runtime_error(lsc::msg::kNoWorkingImage);
     const ImageBuffer* buffer = image.buffer();

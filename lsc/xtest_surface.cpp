@@ -26,13 +26,13 @@ constexpr int kUnitsPerOne = 4096;
 
 } // namespace
 
-void applyXTestSurface(ProcessingContext& context) {
+void applyXTestSurface(ShadingCorrection& correction) {
     for (int i = 0; i < kGridPoints; ++i) {
         const float red = static_cast<float>(kRedUnits[i]) / kUnitsPerOne;
         const float green = static_cast<float>(kUnitsPerOne - kRedUnits[i]) / kUnitsPerOne;
-        context.controlGrids[0][i] = red;
-        context.controlGrids[1][i] = green;
-        context.controlGrids[2][i] = green;
-        context.controlGrids[3][i] = red;
+        correction.controlGrids[0][i] = red;
+        correction.controlGrids[1][i] = green;
+        correction.controlGrids[2][i] = green;
+        correction.controlGrids[3][i] = red;
     }
 }

@@ -49,13 +49,12 @@ float encode(float linear) {
 
 } // namespace
 
-void evaluateDeltaAb(ProcessingContext& context) {
-    BayerImage& image = context.corrected;
+DeltaAbResult evaluateDeltaAb(BayerImage& image, const ShadingSettings& settings) {
     requireFloatImage(image);
     if (image.channels() != 1)
         throw std::invalid_argument(msg::kNotBayerImage);
-    const int columns = context.deltaAbBlocks[0];
-    const int rows = context.deltaAbBlocks[1];
+    const int columns = settings.deltaAbBlocks[0];
+    const int rows = settings.deltaAbBlocks[1];
     if (columns < 1 || rows < 1)
         throw std::runtime_error(msg::kNoDeltaBlocks);
     const std::size_t width = static_cast<std::size_t>(image.width());
@@ -80,7 +79,7 @@ void evaluateDeltaAb(ProcessingContext& context) {
         offsetX[k] = offset.x;
         offsetY[k] = offset.y;
     }
-    const auto& m = context.ccm;
+    const auto& m = settings.ccm;
     float* pixels = image.pixels();
     float greenMax = 0.0f;
     for (std::size_t py = 0; py < rgbHeight; ++py) {
@@ -115,7 +114,7 @@ void evaluateDeltaAb(ProcessingContext& context) {
     if (!(greenMax > 0.0f))
         throw std::runtime_error(msg::kNoGreenSignal);
 
-    const float scale = context.lumaNormalizeFactor / greenMax;
+    const float scale = settings.lumaNormalizeFactor / greenMax;
     const std::size_t count = sampleCount(image);
     for (std::size_t i = 0; i < count; ++i)
         pixels[i] *= scale;
@@ -134,14 +133,17 @@ void evaluateDeltaAb(ProcessingContext& context) {
     const float meanA = aSum / n;
     const float meanB = bSum / n;
 
-    context.deltaImage.assign(blockCount, 0.0f);
+    DeltaAbResult result;
+    result.columns = columns;
+    result.rows = rows;
+    result.deltaImage.assign(blockCount, 0.0f);
     float maxDelta = 0.0f;
     float deltaSum = 0.0f;
     for (std::size_t i = 0; i < blockCount; ++i) {
         const float da = lab[i].a - meanA;
         const float db = lab[i].b - meanB;
         const float delta = std::sqrt(da * da + db * db);
-        context.deltaImage[i] = delta;
+        result.deltaImage[i] = delta;
         // A block that is not a number must not pass as a small error.
         if (!std::isnan(maxDelta) && (std::isnan(delta) || delta > maxDelta))
             maxDelta = delta;
@@ -149,12 +151,13 @@ void evaluateDeltaAb(ProcessingContext& context) {
     }
     const float meanDelta = deltaSum / n;
     float squares = 0.0f;
-    for (float delta : context.deltaImage)
+    for (float delta : result.deltaImage)
         squares += (delta - meanDelta) * (delta - meanDelta);
 
-    context.meanChroma = chromaSum / n;
-    context.maxDelta = maxDelta;
-    context.deltaStdDev = std::sqrt(squares / n);
+    result.meanChroma = chromaSum / n;
+    result.maxDelta = maxDelta;
+    result.deltaStdDev = std::sqrt(squares / n);
+    return result;
 }
 
 } // namespace prep

@@ -29,36 +29,34 @@ void writeReport(const std::string& path, const std::string& text) {
 
 } // namespace
 
-std::string formatDeltaFile(const ProcessingContext& context) {
-    const std::size_t columns =
-        static_cast<std::size_t>(context.deltaAbBlocks[0] > 0 ? context.deltaAbBlocks[0] : 0);
-    const std::size_t rows =
-        static_cast<std::size_t>(context.deltaAbBlocks[1] > 0 ? context.deltaAbBlocks[1] : 0);
-    if (context.deltaImage.size() != columns * rows)
+std::string formatDeltaFile(const DeltaAbResult& result) {
+    const std::size_t columns = static_cast<std::size_t>(result.columns > 0 ? result.columns : 0);
+    const std::size_t rows = static_cast<std::size_t>(result.rows > 0 ? result.rows : 0);
+    if (result.deltaImage.size() != columns * rows)
         throw std::invalid_argument(msg::kDeltaGridMismatch);
     std::ostringstream text = reportText();
     text << std::fixed << std::setprecision(5);
     for (std::size_t row = 0; row < rows; ++row) {
         for (std::size_t column = 0; column < columns; ++column)
-            text << context.deltaImage[row * columns + column] << ',';
+            text << result.deltaImage[row * columns + column] << ',';
         text << '\n';
     }
     text << '\n';
     return text.str();
 }
 
-std::string formatStatsFile(const ProcessingContext& context) {
+std::string formatStatsFile(const DeltaAbResult& result) {
     std::ostringstream text = reportText();
-    text << context.meanChroma << ", " << context.maxDelta << ", " << context.deltaStdDev << '\n';
+    text << result.meanChroma << ", " << result.maxDelta << ", " << result.deltaStdDev << '\n';
     return text.str();
 }
 
-void writeDeltaFile(const std::string& path, const ProcessingContext& context) {
-    writeReport(path, formatDeltaFile(context));
+void writeDeltaFile(const std::string& path, const DeltaAbResult& result) {
+    writeReport(path, formatDeltaFile(result));
 }
 
-void writeStatsFile(const std::string& path, const ProcessingContext& context) {
-    writeReport(path, formatStatsFile(context));
+void writeStatsFile(const std::string& path, const DeltaAbResult& result) {
+    writeReport(path, formatStatsFile(result));
 }
 
 void checkDeltaThreshold(float maxDelta, float threshold) {

@@ -19,24 +19,23 @@ constexpr double kLumaWeights[3] = {0.2126, 0.7152, 0.0722};
 
 } // namespace
 
-float luminanceResidual(const ProcessingContext& context) {
-    const BayerImage& image = context.corrected;
+std::optional<float> luminanceResidual(const BayerImage& image, const ShadingSettings& settings) {
     if (image.empty() || image.channels() != 1)
-        return -1.0f;
-    const int columns = context.deltaAbBlocks[0];
-    const int rows = context.deltaAbBlocks[1];
+        return std::nullopt;
+    const int columns = settings.deltaAbBlocks[0];
+    const int rows = settings.deltaAbBlocks[1];
     if (columns < 1 || rows < 1)
-        return -1.0f;
+        return std::nullopt;
     const std::size_t width = static_cast<std::size_t>(image.width());
     const std::size_t blockWidth = width / 2 / static_cast<std::size_t>(columns);
     const std::size_t blockHeight =
         static_cast<std::size_t>(image.height()) / 2 / static_cast<std::size_t>(rows);
     if (blockWidth == 0 || blockHeight == 0)
-        return -1.0f;
+        return std::nullopt;
 
     // One luminance weight per channel of the 2 x 2 block, through the colour
     // matrix: Y = sum over i of w_i * (R m[0][i] + G m[1][i] + B m[2][i]).
-    const auto& m = context.ccm;
+    const auto& m = settings.ccm;
     double weightOf[3];
     for (int input = 0; input < 3; ++input)
         weightOf[input] = kLumaWeights[0] * m[input][0] + kLumaWeights[1] * m[input][1] +
@@ -65,18 +64,19 @@ float luminanceResidual(const ProcessingContext& context) {
         mean += sum;
     mean /= static_cast<double>(sums.size());
     if (!(mean > 0.0) || !std::isfinite(mean))
-        return -1.0f;
+        return std::nullopt;
     double largest = 0.0;
     for (double sum : sums)
         largest = std::fmax(largest, std::fabs(sum / mean - 1.0));
     return static_cast<float>(largest);
 }
 
-void checkLuminanceResidual(float residual, float boundPercent) {
+void checkLuminanceResidual(std::optional<float> measured, float boundPercent) {
     if (boundPercent <= 0.0f)
         return;
-    if (residual < 0.0f)
+    if (!measured)
         throw std::runtime_error(msg::kLumaNotMeasured);
+    const float residual = *measured;
     if (residual * 100.0f <= boundPercent)
         return;
     std::ostringstream text;

@@ -165,12 +165,11 @@ SampleSet parseSampleFile(std::string_view text, std::int32_t width, std::int32_
     return set;
 }
 
-void writeSampleFile(const std::string& path, const ProcessingContext& context,
-                     std::uint32_t fullScale) {
-    requireFloatImage(context.image);
+void writeSampleFile(const std::string& path, const SampleSet& set, const BayerImage& image,
+                     const SampleFileScale& scale) {
+    requireFloatImage(image);
     const std::string text =
-        formatSampleFile(context.targetLevels, context.samples, context.image.width(),
-                         context.image.height(), {fullScale, context.procSamplingFactor});
+        formatSampleFile(set.targetLevels, set.samples, image.width(), image.height(), scale);
     OutputFile file;
     if (!file.open(path))
         throw std::runtime_error(msg::kCannotOpenSampleOutput + path);
@@ -178,19 +177,16 @@ void writeSampleFile(const std::string& path, const ProcessingContext& context,
         throw std::runtime_error(msg::kCannotWriteSampleOutput + path);
 }
 
-void readSampleFile(const std::string& path, ProcessingContext& context, std::uint32_t fullScale) {
-    requireFloatImage(context.image);
+SampleSet readSampleFile(const std::string& path, const BayerImage& image,
+                         const SampleFileScale& scale) {
+    requireFloatImage(image);
     std::string text;
     const ReadResult read = readWholeFile(path, text);
     if (read == ReadResult::kTooLarge)
         throw std::runtime_error(msg::kSampleInputTooLarge + path);
     if (read != ReadResult::kOk)
         throw std::runtime_error(msg::kCannotOpenSampleInput + path);
-    SampleSet set = parseSampleFile(text, context.image.width(), context.image.height(),
-                                    {fullScale, context.procSamplingFactor});
-    std::copy(std::begin(set.targetLevels), std::end(set.targetLevels), context.targetLevels);
-    context.samples = std::move(set.samples);
-    context.samplesFromImage = false;
+    return parseSampleFile(text, image.width(), image.height(), scale);
 }
 
 } // namespace prep

@@ -19,7 +19,8 @@
 #include <string_view>
 #include <vector>
 
-#include "lsc/processing_context.h"
+#include "image/bayer_image.h"
+#include "lsc/shading_sample.h"
 
 namespace prep {
 
@@ -29,11 +30,6 @@ std::uint16_t sampleFullScale(int bits);
 struct SampleFileScale {
     std::uint32_t fullScale = 0; // S; at least 1
     int samplingFactor = 1;      // f; at least 1
-};
-
-struct SampleSet {
-    float targetLevels[kChannels] = {0, 0, 0, 0};
-    std::vector<shadingSample> samples;
 };
 
 // The text of a sample file for a prepared image of width x height pixels.
@@ -47,16 +43,17 @@ std::string formatSampleFile(const float (&targetLevels)[kChannels],
 SampleSet parseSampleFile(std::string_view text, std::int32_t width, std::int32_t height,
                           const SampleFileScale& scale);
 
-// The context's target levels and samples for its working image, with the
-// context's preparation sampling factor. Written through OutputFile; throws
+// The target levels and samples of `set` for `image` (the image they were
+// taken from; its size is written). Written through OutputFile; throws
 // std::runtime_error "Cannot open sample output file: " + path, or a write
 // error naming the path.
-void writeSampleFile(const std::string& path, const ProcessingContext& context,
-                     std::uint32_t fullScale);
+void writeSampleFile(const std::string& path, const SampleSet& set, const BayerImage& image,
+                     const SampleFileScale& scale);
 
-// Replaces the context's target levels and samples with those of the file,
-// only when the whole file is valid. Throws std::runtime_error
-// "Cannot open input sample file: " + path, or the parser's message.
-void readSampleFile(const std::string& path, ProcessingContext& context, std::uint32_t fullScale);
+// The target levels and samples of the file, for the prepared `image`.
+// Throws std::runtime_error "Cannot open input sample file: " + path, or the
+// parser's message.
+SampleSet readSampleFile(const std::string& path, const BayerImage& image,
+                         const SampleFileScale& scale);
 
 } // namespace prep

@@ -18,6 +18,15 @@ void requireBayerImage(const BayerImage& image) {
         throw std::invalid_argument(msg::kNotBayerImage);
 }
 
+} // namespace
+
+CentreWindow centreWindow(std::int32_t width, std::int32_t height) {
+    const std::int32_t cx = width / 2;
+    const std::int32_t cy = height / 2;
+    return {cx > 100 ? cx - 100 : 0, cx < width - 100 ? cx + 100 : width - 1,
+            cy > 100 ? cy - 100 : 0, cy < height - 100 ? cy + 100 : height - 1};
+}
+
 // Mean of each channel over the centre window. The window of an image of at
 // least 2 x 2 pixels holds every channel; a smaller one is refused.
 void centreLevels(const BayerImage& image, float (&levels)[kChannels]) {
@@ -42,23 +51,17 @@ void centreLevels(const BayerImage& image, float (&levels)[kChannels]) {
     }
 }
 
-} // namespace
-
-CentreWindow centreWindow(std::int32_t width, std::int32_t height) {
-    const std::int32_t cx = width / 2;
-    const std::int32_t cy = height / 2;
-    return {cx > 100 ? cx - 100 : 0, cx < width - 100 ? cx + 100 : width - 1,
-            cy > 100 ? cy - 100 : 0, cy < height - 100 ? cy + 100 : height - 1};
-}
-
-void whiteBalance(ProcessingContext& context) {
-    BayerImage& image = context.corrected;
+void balanceLevels(const float (&targetLevels)[kChannels], const BayerImage& image,
+                   float (&levels)[kChannels]) {
     requireBayerImage(image);
-    float levels[kChannels];
-    if (context.targetLevels[0] != 0.0f)
-        std::copy(context.targetLevels, context.targetLevels + kChannels, levels);
+    if (targetLevels[0] != 0.0f)
+        std::copy(targetLevels, targetLevels + kChannels, levels);
     else
         centreLevels(image, levels);
+}
+
+void whiteBalance(BayerImage& image, const float (&levels)[kChannels]) {
+    requireBayerImage(image);
 
     float largest = levels[0];
     for (float level : levels) {
@@ -91,8 +94,8 @@ int boxSide(int filterSize, int samplingFactor) {
     return k < 1 ? 1 : (k & ~1) | 1;
 }
 
-void measureLevels(float (&levels)[kChannels], const ProcessingContext& context) {
-    const BayerImage& image = context.corrected;
+void measureLevels(float (&levels)[kChannels], const BayerImage& image, int awbFilterSize,
+                   int samplingFactor) {
     requireBayerImage(image);
     // Planes without a pixel would give levels of 0, and the R/G and B/G
     // ratios reported from them would divide by zero.
@@ -102,7 +105,7 @@ void measureLevels(float (&levels)[kChannels], const ProcessingContext& context)
     const WorkingImage view{static_cast<std::uint32_t>(image.width()),
                             static_cast<std::uint32_t>(image.height()), image.cfa(),
                             const_cast<float*>(image.pixels())};
-    targetLevelsOf(view, boxSide(context.awbFilterSize, context.procSamplingFactor), levels);
+    targetLevelsOf(view, boxSide(awbFilterSize, samplingFactor), levels);
 }
 
 } // namespace prep

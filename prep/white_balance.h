@@ -4,7 +4,8 @@
 
 #include <cstdint>
 
-#include "lsc/processing_context.h"
+#include "image/bayer_image.h"
+#include "lsc/shading_sample.h"
 
 namespace prep {
 
@@ -16,23 +17,33 @@ struct CentreWindow {
 };
 CentreWindow centreWindow(std::int32_t width, std::int32_t height);
 
-// Scales the channels of context.corrected to a common level: the levels are
-// context.targetLevels, or, when targetLevels[0] is 0, the channel means over
-// the centre window; each channel is multiplied by (largest level / its level).
-// Throws std::runtime_error when the window misses a channel or a level is
-// not positive, leaving the image as it was.
-void whiteBalance(ProcessingContext& context);
+// Mean of each channel over the centre window. Throws std::runtime_error
+// when the window misses a channel.
+void centreLevels(const BayerImage& image, float (&levels)[kChannels]);
+
+// The levels the flattened image is balanced to: the fit's target levels, or,
+// when the red one is 0 (a sample file may hold that), the channel means
+// over the image's centre window.
+void balanceLevels(const float (&targetLevels)[kChannels], const BayerImage& image,
+                   float (&levels)[kChannels]);
+
+// Scales the channels of the flattened Bayer image to a common level: each
+// channel is multiplied by (largest level / its level). Throws
+// std::runtime_error when a level is not positive, leaving the image as it
+// was.
+void whiteBalance(BayerImage& image, const float (&levels)[kChannels]);
 
 // Odd box side for a filter size given in full-resolution pixels, on planes of
 // an image prepared with `samplingFactor`: k = filterSize / (2 * factor), made
 // odd by setting its lowest bit; at least 1.
 int boxSide(int filterSize, int samplingFactor);
 
-// The four channel levels of context.corrected: each channel's half-resolution
-// plane smoothed by a box mean (odd side from lsc.awb_avg_filter_size and the
+// The four channel levels of an image: each channel's half-resolution plane
+// smoothed by a box mean (odd side from lsc.awb_avg_filter_size and the
 // preparation sampling factor, shrinking at the borders), its largest value;
 // the rule of the fit's target levels. Throws std::runtime_error for an image
 // smaller than 2 x 2.
-void measureLevels(float (&levels)[kChannels], const ProcessingContext& context);
+void measureLevels(float (&levels)[kChannels], const BayerImage& image, int awbFilterSize,
+                   int samplingFactor);
 
 } // namespace prep

@@ -23,13 +23,11 @@ class FitSettingsTest : public ::testing::Test {
 protected:
     FitSettingsTest() { set_defaults(config); }
 
-    ProcessingContext load(const std::string& settings, std::int32_t width = 640,
-                           std::int32_t height = 480, std::uint16_t bits = 10) {
+    ShadingSettings load(const std::string& settings, std::int32_t width = 640,
+                         std::int32_t height = 480, std::uint16_t bits = 10) {
         parse_config_text(settings, config);
         const BayerImage image = imageOf(width, height, bits);
-        ProcessingContext context;
-        load_fit_settings(config, image, context);
-        return context;
+        return load_fit_settings(config, image);
     }
 
     std::string loadError(const std::string& settings, std::int32_t width = 640,
@@ -47,7 +45,7 @@ protected:
 };
 
 TEST_F(FitSettingsTest, DefaultsConvertOnce) {
-    const ProcessingContext c = load("");
+    const ShadingSettings c = load("");
     EXPECT_EQ(c.procSamplingFactor, 4);
     EXPECT_EQ(c.sampleAngleStep, 8);
     EXPECT_EQ(c.sampleMargin, 0);
@@ -64,12 +62,12 @@ TEST_F(FitSettingsTest, DefaultsConvertOnce) {
     EXPECT_EQ(c.lumaNormalizeFactor, 0.75f);
     EXPECT_FALSE(c.averageChannels);
     EXPECT_EQ(c.blackLevel, 0.0f);
-    EXPECT_EQ(c.leftFraction, 0.25);
-    EXPECT_EQ(c.centerFraction, 0.5);
+    EXPECT_EQ(c.layout.left, 0.25);
+    EXPECT_EQ(c.layout.center, 0.5);
 }
 
 TEST_F(FitSettingsTest, ConfiguredValuesArrive) {
-    const ProcessingContext c = load(
+    const ShadingSettings c = load(
         "lsc.falloff_factor = 50; lsc.green_balance = 1; lsc.avg_luma = 1;\n"
         "lsc.sampling_margin = 20; apply_lsc.max_delta_ab = 4.5; lsc.awb_avg_filter_size = 7;\n"
         "apply_lsc.ccm = {2, 0.5};\napply_lsc.ccm[2] = {0, -1, 3};\n"
@@ -100,9 +98,8 @@ TEST_F(FitSettingsTest, BlackLevelIsAFractionOfFullScale) {
 
 TEST_F(FitSettingsTest, ImageWithoutBitDepthIsRefused) {
     parse_config_text("proc.black_level = 64;", config);
-    ProcessingContext context;
     try {
-        load_fit_settings(config, imageOf(640, 480, 0), context);
+        (void)load_fit_settings(config, imageOf(640, 480, 0));
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_STREQ(e.what(),
@@ -111,25 +108,24 @@ TEST_F(FitSettingsTest, ImageWithoutBitDepthIsRefused) {
 }
 
 TEST_F(FitSettingsTest, LegacyPatchWidthsBecomeFractions) {
-    const ProcessingContext c = load("lsc.left_patch_width = 16; lsc.center_patch_width = 32;\n"
-                                     "lsc.top_patch_height = 12; lsc.middle_patch_height = 24;",
-                                     64, 48);
-    EXPECT_EQ(c.leftFraction, 0.25);
-    EXPECT_EQ(c.centerFraction, 0.5);
-    EXPECT_EQ(c.topFraction, 0.25);
-    EXPECT_EQ(c.middleFraction, 0.5);
+    const ShadingSettings c = load("lsc.left_patch_width = 16; lsc.center_patch_width = 32;\n"
+                                   "lsc.top_patch_height = 12; lsc.middle_patch_height = 24;",
+                                   64, 48);
+    EXPECT_EQ(c.layout.left, 0.25);
+    EXPECT_EQ(c.layout.center, 0.5);
+    EXPECT_EQ(c.layout.top, 0.25);
+    EXPECT_EQ(c.layout.middle, 0.5);
 }
 
 TEST_F(FitSettingsTest, ExplicitFactorsWinOverPatchWidths) {
-    const ProcessingContext c =
-        load("lsc.left_patch_width = 16; lsc.leftPatchFactor = 0.3;", 64, 48);
-    EXPECT_EQ(c.leftFraction, static_cast<double>(0.3f));
-    EXPECT_EQ(c.centerFraction, 0.5);
+    const ShadingSettings c = load("lsc.left_patch_width = 16; lsc.leftPatchFactor = 0.3;", 64, 48);
+    EXPECT_EQ(c.layout.left, static_cast<double>(0.3f));
+    EXPECT_EQ(c.layout.center, 0.5);
 }
 
 TEST_F(FitSettingsTest, DeltaAbBlocksFollowTheAspectRatio) {
     auto blocks = [this](std::int32_t w, std::int32_t h) {
-        const ProcessingContext c = load("", w, h);
+        const ShadingSettings c = load("", w, h);
         return std::to_string(c.deltaAbBlocks[0]) + "x" + std::to_string(c.deltaAbBlocks[1]);
     };
     EXPECT_EQ(blocks(640, 480), "20x15");
@@ -139,7 +135,7 @@ TEST_F(FitSettingsTest, DeltaAbBlocksFollowTheAspectRatio) {
 }
 
 TEST_F(FitSettingsTest, ConfiguredDeltaAbBlocksAreUsedAsGiven) {
-    const ProcessingContext c = load("apply_lsc.delta_ab_blocks = {10, 7};");
+    const ShadingSettings c = load("apply_lsc.delta_ab_blocks = {10, 7};");
     EXPECT_EQ(c.deltaAbBlocks[0], 10);
     EXPECT_EQ(c.deltaAbBlocks[1], 7);
 }
@@ -168,8 +164,7 @@ TEST_F(FitSettingsTest, VeryTallOrTinyImagesNeedConfiguredBlocks) {
 
 TEST_F(FitSettingsTest, ConversionErrorsPassThrough) {
     parse_config_text("lsc.max_gain = big;", config);
-    ProcessingContext context;
-    EXPECT_THROW(load_fit_settings(config, imageOf(640, 480), context), boost::bad_lexical_cast);
+    EXPECT_THROW(load_fit_settings(config, imageOf(640, 480)), boost::bad_lexical_cast);
 }
 
 } // namespace

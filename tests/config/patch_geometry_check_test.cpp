@@ -19,8 +19,8 @@ protected:
 
     void useImage(std::int32_t width, std::int32_t height) {
         int result = 0;
-        context.image.reset(imageCreate(width, height, 10, 1, 1, 0, kCfaRggb, kPixelRaw,
-                                        kBufferRawCfa, kDataNone, &result));
+        image.reset(imageCreate(width, height, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
+                                kDataNone, &result));
     }
 
     // Applies configuration and calibration-data settings, then checks.
@@ -28,7 +28,7 @@ protected:
         parse_config_text(configuration, config);
         parse_config_text(calibration, data);
         try {
-            readConfigParam(root, data, context);
+            stored = readConfigParam(root, data, image, fitted);
         } catch (const std::exception& e) {
             return e.what();
         }
@@ -39,7 +39,9 @@ protected:
     config_node& config = root.child("config");
     config_node_impl calibrationRoot{"calibration"};
     config_node& data = calibrationRoot.child("module").child("lsc");
-    ProcessingContext context;
+    BayerImage image;
+    ShadingCorrection fitted; // what the run had before reading the data
+    StoredCalibration stored;
 };
 
 const char kLegacyData[] = "leftPatchWidth = 160; centerPatchWidth = 320;"
@@ -48,14 +50,14 @@ const char kFactorData[] = "leftPatchFactor = 0.25; centerPatchFactor = 0.5; top
                            "middlePatchFactor = 0.6; imageWidth = 640; imageHeight = 480;";
 
 TEST_F(PatchGeometryCheckTest, NeedsTheInputImage) {
-    context.image.reset();
+    image.reset();
     EXPECT_EQ(check("", kLegacyData), "Input image not set before call to readConfigParam");
 }
 
 TEST_F(PatchGeometryCheckTest, DataWithoutGeometryLeavesTheFactors) {
-    context.leftFraction = 0.125;
+    fitted.layout.left = 0.125;
     EXPECT_EQ(check("", ""), "(accepted)");
-    EXPECT_EQ(context.leftFraction, 0.125);
+    EXPECT_EQ(stored.correction.layout.left, 0.125);
 }
 
 // ---- legacy data --------------------------------------------------------------
@@ -70,10 +72,10 @@ TEST_F(PatchGeometryCheckTest, LegacyDataBecomesFractionsOfTheImage) {
     EXPECT_EQ(check("", "leftPatchWidth = 16; centerPatchWidth = 32;"
                         "topPatchHeight = 12; middlePatchHeight = 7;"),
               "(accepted)");
-    EXPECT_EQ(context.leftFraction, 0.25);
-    EXPECT_EQ(context.centerFraction, 0.5);
-    EXPECT_EQ(context.topFraction, 0.25);
-    EXPECT_EQ(context.middleFraction, static_cast<double>(7.0f / 48.0f));
+    EXPECT_EQ(stored.correction.layout.left, 0.25);
+    EXPECT_EQ(stored.correction.layout.center, 0.5);
+    EXPECT_EQ(stored.correction.layout.top, 0.25);
+    EXPECT_EQ(stored.correction.layout.middle, static_cast<double>(7.0f / 48.0f));
 }
 
 TEST_F(PatchGeometryCheckTest, LegacyDataAgainstFactorConfigurationIsRefused) {
@@ -115,15 +117,15 @@ TEST_F(PatchGeometryCheckTest, SensorSizeAloneMakesFactorData) {
 
 TEST_F(PatchGeometryCheckTest, FactorDataWithoutFactorConfigurationIsAccepted) {
     EXPECT_EQ(check("", kFactorData), "(accepted)");
-    EXPECT_EQ(context.topFraction, static_cast<double>(0.2f));
-    EXPECT_EQ(context.middleFraction, static_cast<double>(0.6f));
+    EXPECT_EQ(stored.correction.layout.top, static_cast<double>(0.2f));
+    EXPECT_EQ(stored.correction.layout.middle, static_cast<double>(0.6f));
 }
 
 TEST_F(PatchGeometryCheckTest, SensorSizeMustMatchTheImage) {
     useImage(640, 482);
     parse_config_text(kFactorData, data);
     try {
-        readConfigParam(root, data, context);
+        stored = readConfigParam(root, data, image, fitted);
         FAIL();
     } catch (const std::range_error& e) {
         EXPECT_STREQ(e.what(), "Input image dimensions (640x482) do not match expected dimensions "
@@ -169,26 +171,25 @@ TEST_F(PatchGeometryCheckTest, ControlPointsAndLevelsAreLoaded) {
             points += std::string(name) + "[" + std::to_string(i) +
                       "] = {1, 2, 3, 4, 5, 6, 7, 8, 9, " + std::to_string(i) + ".5};\n";
     EXPECT_EQ(check("", points + "R = 512; GR = 1023; GB = 1000; B = 700;"), "(accepted)");
-    EXPECT_EQ(context.controlGrids[0][0], 1.0f);
-    EXPECT_EQ(context.controlGrids[3][99], 9.5f);
-    EXPECT_EQ(context.controlGrids[2][39], 3.5f);
-    EXPECT_EQ(context.whiteBalance[0], 512.0f);
-    EXPECT_EQ(context.whiteBalance[1], 1023.0f);
-    EXPECT_EQ(context.whiteBalance[2], 1000.0f);
-    EXPECT_EQ(context.whiteBalance[3], 700.0f);
+    EXPECT_EQ(stored.correction.controlGrids[0][0], 1.0f);
+    EXPECT_EQ(stored.correction.controlGrids[3][99], 9.5f);
+    EXPECT_EQ(stored.correction.controlGrids[2][39], 3.5f);
+    EXPECT_EQ(stored.whiteBalance[0], 512.0f);
+    EXPECT_EQ(stored.whiteBalance[1], 1023.0f);
+    EXPECT_EQ(stored.whiteBalance[2], 1000.0f);
+    EXPECT_EQ(stored.whiteBalance[3], 700.0f);
 }
 
 TEST_F(PatchGeometryCheckTest, DataWithoutControlPointsLeavesThem) {
-    context.controlGrids[1][5] = 4.0f;
-    context.whiteBalance[2] = 3.0f;
+    fitted.controlGrids[1][5] = 4.0f;
     EXPECT_EQ(check("", "GR = 7;"), "(accepted)");
-    EXPECT_EQ(context.controlGrids[1][5], 4.0f);
-    EXPECT_EQ(context.whiteBalance[2], 3.0f);
+    EXPECT_EQ(stored.correction.controlGrids[1][5], 4.0f);
+    EXPECT_EQ(stored.whiteBalance[2], 0.0f);
 }
 
 TEST_F(PatchGeometryCheckTest, ControlPointThatIsNoNumberGivesTheConversionError) {
     parse_config_text("controlPointR[0][0] = x;", data);
-    EXPECT_THROW(readConfigParam(root, data, context), boost::bad_lexical_cast);
+    EXPECT_THROW((void)readConfigParam(root, data, image, fitted), boost::bad_lexical_cast);
 }
 
 } // namespace

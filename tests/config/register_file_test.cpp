@@ -25,8 +25,8 @@ protected:
         fit.targetLevels[3] = 0.75f; // B
         for (int channel = 0; channel < kChannels; ++channel)
             for (int n = 0; n < kGridPoints; ++n)
-                fit.controlGrids[channel][n] = 1.0f + 0.5f * static_cast<float>(channel);
-        fit.controlGrids[1][37] = 1.1f;
+                fit.correction.controlGrids[channel][n] = 1.0f + 0.5f * static_cast<float>(channel);
+        fit.correction.controlGrids[1][37] = 1.1f;
     }
 
     void useImage(std::int32_t width, std::int32_t height, const std::string& serial,
@@ -64,7 +64,7 @@ protected:
     config_node_impl root{"root"};
     config_node& config = root.child("config");
     config_node_impl readBack{"root"};
-    ProcessingContext fit;
+    FitResult fit;
     BayerImage image;
 };
 
@@ -141,8 +141,8 @@ TEST_F(RegisterFileTest, LegacyFormWhenOnlyPatchWidthsWereConfigured) {
 }
 
 TEST_F(RegisterFileTest, FactorsPrintWithSixSignificantDigits) {
-    fit.leftFraction = 0.2;
-    fit.centerFraction = 0.5333333333;
+    fit.correction.layout.left = 0.2;
+    fit.correction.layout.center = 0.5333333333;
     const std::vector<std::string> l = lines();
     EXPECT_EQ(l[6], "reference.leftPatchFactor      = 0.2;");
     EXPECT_EQ(l[7], "reference.centerPatchFactor    = 0.533333;");
@@ -175,28 +175,28 @@ TEST_F(RegisterFileTest, NonFiniteValuesAreRefused) {
     fit.targetLevels[2] = std::numeric_limits<float>::quiet_NaN();
     EXPECT_EQ(error(), "Target level of the green/blue channel is not a finite number.");
     fit.targetLevels[2] = 0.5f;
-    fit.controlGrids[3][42] = -std::numeric_limits<float>::infinity();
+    fit.correction.controlGrids[3][42] = -std::numeric_limits<float>::infinity();
     EXPECT_EQ(error(), "Control point controlPointB[4][2] is not a finite number: -inf");
-    fit.controlGrids[3][42] = 1.0f;
-    fit.controlGrids[0][0] = std::numeric_limits<float>::quiet_NaN();
+    fit.correction.controlGrids[3][42] = 1.0f;
+    fit.correction.controlGrids[0][0] = std::numeric_limits<float>::quiet_NaN();
     EXPECT_EQ(error(), "Control point controlPointR[0][0] is not a finite number: nan");
 }
 
 TEST_F(RegisterFileTest, GeometryWithoutRoomForEveryPatchIsRefused) {
-    fit.leftFraction = 0.0;
+    fit.correction.layout.left = 0.0;
     EXPECT_EQ(error(),
               "Patch geometry of the 64x48 image gives patch sizes 0, 32, 32 x 12, 24, 12; "
               "every patch must be at least 2 pixels wide and high.");
-    fit.leftFraction = 0.5;
+    fit.correction.layout.left = 0.5;
     EXPECT_EQ(error(),
               "Patch geometry of the 64x48 image gives patch sizes 32, 32, 0 x 12, 24, 12; "
               "every patch must be at least 2 pixels wide and high.");
-    fit.leftFraction = 0.25;
-    fit.middleFraction = std::numeric_limits<double>::quiet_NaN();
+    fit.correction.layout.left = 0.25;
+    fit.correction.layout.middle = std::numeric_limits<double>::quiet_NaN();
     EXPECT_EQ(error(),
               "Patch geometry of the 64x48 image gives patch sizes 16, 32, 16 x 12, 0, 36; "
               "every patch must be at least 2 pixels wide and high.");
-    fit.middleFraction = 0.5;
+    fit.correction.layout.middle = 0.5;
     useImage(6, 48, "01"); // 1-pixel outer patches: a step of 8 does not fit 3 bits
     EXPECT_EQ(error(), "Patch geometry of the 6x48 image gives patch sizes 2, 3, 1 x 12, 24, 12; "
                        "every patch must be at least 2 pixels wide and high.");
@@ -279,7 +279,7 @@ TEST_F(RegisterFileTest, RefusedValuesLeaveAnExistingFileAlone) {
     testing_support::TempDir dir;
     const std::string path = dir.file("calibration.cfg");
     testing_support::writeFile(path, "old contents");
-    fit.controlGrids[2][5] = std::numeric_limits<float>::infinity();
+    fit.correction.controlGrids[2][5] = std::numeric_limits<float>::infinity();
     EXPECT_THROW(write_register_file(path, config, "reference", "", "", fit, image),
                  std::runtime_error);
     EXPECT_EQ(testing_support::readFile(path), "old contents");

@@ -194,20 +194,21 @@ TEST_F(ModuleRun, AutomaticLayoutIsRepeatableAndPassesTheBinaryDataCheck) {
 // Calibration error of a fit with the given layout: the largest |8 x 8-block
 // mean / channel mean - 1| of the gain times the exact shading.
 double calibrationError(const FlatField& field, const BayerImage& capture,
-                        const ProcessingContext& settings, const PatchLayout& layout) {
-    ProcessingContext context;
-    context.blackLevel = settings.blackLevel;
-    context.sampleAngleStep = settings.sampleAngleStep;
-    context.quiet = true;
-    context.leftFraction = layout.left, context.centerFraction = layout.center;
-    context.topFraction = layout.top, context.middleFraction = layout.middle;
+                        const ShadingSettings& runSettings, const PatchLayout& layout) {
+    ShadingSettings settings;
+    settings.blackLevel = runSettings.blackLevel;
+    settings.sampleAngleStep = runSettings.sampleAngleStep;
+    settings.quiet = true;
+    settings.layout = layout;
     std::ostringstream messages;
-    context.image.copy(capture);
-    collectSamples(context, messages);
-    fitLensShading(context, messages);
-    context.blackLevel = 0.0f;
-    std::copy(field.exact.begin(), field.exact.end(), context.image.pixels());
-    applyLensShading(context);
+    const BayerImage levelled = levelledImage(capture, settings.blackLevel);
+    const SampleSet samples = collectSamples(levelled, settings, messages);
+    FitDeviations deviations;
+    const FitResult fit = fitLensShading(samples, {levelled, true}, settings, messages, deviations);
+    BayerImage exact;
+    exact.copy(capture);
+    std::copy(field.exact.begin(), field.exact.end(), exact.pixels());
+    const BayerImage corrected = applyLensShading(exact, fit.correction, 0.0f, 1);
     const int width = field.shape.width, height = field.shape.height;
     double worst = 0.0;
     for (int k = 0; k < 4; ++k) {
@@ -218,7 +219,7 @@ double calibrationError(const FlatField& field, const BayerImage& capture,
                 for (int y = by; y < by + 8; ++y)
                     for (int x = bx; x < bx + 8; ++x)
                         if (field.channelAt(x, y) == k)
-                            sum += context.corrected.pixels()[std::size_t(y) * width + x];
+                            sum += corrected.pixels()[std::size_t(y) * width + x];
                 means.push_back(sum);
             }
         double mean = 0.0;
@@ -237,7 +238,7 @@ TEST_F(ModuleRun, AutomaticLayoutIsNoWorseThanTheConfiguredOne) {
     prepare("", shape);
     BayerImage capture;
     capture.read(path("flat.kqraw"));
-    ProcessingContext settings;
+    ShadingSettings settings;
     settings.blackLevel = static_cast<float>(kImx219.blackLevel) / 1023.0f;
     settings.sampleAngleStep = 8;
     const LayoutChoice choice = chooseLayout(capture, settings);
@@ -246,7 +247,7 @@ TEST_F(ModuleRun, AutomaticLayoutIsNoWorseThanTheConfiguredOne) {
     EXPECT_EQ(again.flatness, choice.flatness);
     ASSERT_EQ(choice.candidates, 5u);
     EXPECT_LE(choice.flatness[choice.index], choice.flatness[0]);
-    const std::vector<PatchLayout> layouts = candidateLayouts(settings, 820, 616);
+    const std::vector<PatchLayout> layouts = candidateLayouts(settings.layout, 820, 616);
     const double configured = calibrationError(field_, capture, settings, layouts[0]);
     const double chosen = calibrationError(field_, capture, settings, choice.layout);
     EXPECT_LE(chosen, configured + 0.003) << configured << " " << chosen;

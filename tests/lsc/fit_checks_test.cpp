@@ -1,4 +1,7 @@
+#include <algorithm>
 #include <cmath>
+#include <functional>
+#include <optional>
 #include <sstream>
 #include <stdexcept>
 #include <string>
@@ -97,31 +100,34 @@ float vignetted(int x, int y) {
 class FitChecks : public ::testing::Test {
 protected:
     void collect(const std::function<float(int, int)>& value) {
-        makeImage(context, 160, 120, kCfaRggb, value);
-        context.sampleAngleStep = 8;
-        context.quiet = true;
-        collectSamples(context, messages);
-        context.quiet = false;
-        measured = context.samples;
-        for (auto& grid : context.controlGrids)
-            for (float& g : grid)
-                g = 7.0f;
+        makeImage(image, 160, 120, kCfaRggb, value);
+        settings.sampleAngleStep = 8;
+        settings.quiet = true;
+        levelled = levelledImage(image, settings.blackLevel);
+        samples = collectSamples(levelled, settings, messages);
+        settings.quiet = false;
     }
     std::string fitError() {
-        context.samples = measured;
         messages.str("");
-        return runtimeError([&] { fitLensShading(context, messages); });
+        fit.reset();
+        return runtimeError([&] {
+            fit = fitLensShading(samples, {levelled, true}, settings, messages, deviations);
+        });
     }
-    bool gridsUntouched() const { return context.controlGrids[1][45] == 7.0f; }
+    // A fit a check ends gives no correction.
+    bool gridsUntouched() const { return !fit; }
 
-    ProcessingContext context;
+    BayerImage image, levelled;
+    ShadingSettings settings;
+    SampleSet samples;
+    FitDeviations deviations;
+    std::optional<FitResult> fit;
     std::ostringstream messages;
-    std::vector<shadingSample> measured;
 };
 
 TEST_F(FitChecks, LogFlagAddsEachChannelsDeviationAfterItsFit) {
     collect(vignetted);
-    context.logFitError = true;
+    settings.logFitError = true;
     ASSERT_EQ(fitError(), "(passed)");
     std::istringstream lines(messages.str());
     std::vector<std::string> text;
@@ -130,15 +136,14 @@ TEST_F(FitChecks, LogFlagAddsEachChannelsDeviationAfterItsFit) {
     ASSERT_EQ(text.size(), 12u);
     for (int k = 0; k < 4; ++k) {
         EXPECT_EQ(text[4 + 2 * k], std::string("Fitting surface : ") + kChannelNames[k]);
-        EXPECT_EQ(text[5 + 2 * k],
-                  deviationLine(k, context.fitDeviationMax[k], context.fitDeviationRms[k]));
+        EXPECT_EQ(text[5 + 2 * k], deviationLine(k, deviations.max[k], deviations.rms[k]));
     }
-    EXPECT_TRUE(context.fitDeviationMeasured);
+    EXPECT_TRUE(deviations.measured);
     // A smooth shading bends little between neighbouring points, even one
     // this steep for its size (the corners at 60 %).
     for (int k = 0; k < 4; ++k) {
-        EXPECT_LT(context.fitDeviationMax[k], 0.05f) << k;
-        EXPECT_LE(context.fitDeviationRms[k], context.fitDeviationMax[k]) << k;
+        EXPECT_LT(deviations.max[k], 0.05f) << k;
+        EXPECT_LE(deviations.rms[k], deviations.max[k]) << k;
     }
 }
 
@@ -146,11 +151,11 @@ TEST_F(FitChecks, QuietOrNoFlagPrintsNoDeviation) {
     collect(vignetted);
     ASSERT_EQ(fitError(), "(passed)");
     EXPECT_EQ(messages.str().find("deviation"), std::string::npos);
-    context.logFitError = true;
-    context.quiet = true;
+    settings.logFitError = true;
+    settings.quiet = true;
     ASSERT_EQ(fitError(), "(passed)");
     EXPECT_EQ(messages.str(), "");
-    EXPECT_TRUE(context.fitDeviationMeasured);
+    EXPECT_TRUE(deviations.measured);
 }
 
 TEST_F(FitChecks, ABlotchOnTheSamplesEndsTheFitBeforeTheGridsChange) {
@@ -160,55 +165,57 @@ TEST_F(FitChecks, ABlotchOnTheSamplesEndsTheFitBeforeTheGridsChange) {
     });
     EXPECT_EQ(fitError(), "MAX error bound exceeded.");
     EXPECT_TRUE(gridsUntouched());
-    EXPECT_TRUE(context.fitDeviationMeasured);
-    EXPECT_GT(context.fitDeviationMax[0], 0.2f);
-    context.maxRmsError = 0.01f;
+    EXPECT_TRUE(deviations.measured);
+    EXPECT_GT(deviations.max[0], 0.2f);
+    settings.maxRmsError = 0.01f;
     EXPECT_EQ(fitError(), "RMS error bound exceeded.");
-    context.maxRmsError = 1.0f;
-    context.maxError = 1.0f;
+    settings.maxRmsError = 1.0f;
+    settings.maxError = 1.0f;
     EXPECT_EQ(fitError(), "(passed)");
     EXPECT_FALSE(gridsUntouched());
 }
 
 TEST_F(FitChecks, GainsAboveTheCeilingEndTheFitBeforeTheGridsChange) {
     collect(vignetted);
-    context.maxGain = 1.2f; // the corners need about 1.67 (normalised to the centre)
+    settings.maxGain = 1.2f; // the corners need about 1.67 (normalised to the centre)
     const std::string error = fitError();
     EXPECT_EQ(error.rfind("Gain 1.66", 0), 0u) << error;
     EXPECT_NE(error.find(" of the red channel is above lsc.max_gain (1.2). Likely"),
               std::string::npos)
         << error;
     EXPECT_TRUE(gridsUntouched());
-    EXPECT_FALSE(context.fitDeviationMeasured);
+    EXPECT_FALSE(deviations.measured);
 }
 
 TEST_F(FitChecks, WithGreenBalanceTheCeilingSeesAbsoluteGains) {
     const float* levels = kLevels;
     collect(channelLevels(kCfaRggb, levels));
-    context.maxGain = 1.2f;
+    settings.maxGain = 1.2f;
     EXPECT_EQ(fitError(), "(passed)"); // every normalised gain is 1
-    context.greenBalance = true;       // green/red: 0.5 / 0.4
+    settings.greenBalance = true;      // green/red: 0.5 / 0.4
     EXPECT_EQ(fitError(),
               "Gain 1.25 of the green/red channel is above lsc.max_gain (1.2). Likely a dark "
               "corner, a missing diffuser or a configuration that does not match the sensor.");
 }
 
 TEST_F(FitChecks, ControlPointsThatOvershootTheSampledGainsMeetTheCeilingToo) {
-    context.sampleMargin = 60; // the surface reaches the corners beyond the samples
+    settings.sampleMargin = 60; // the surface reaches the corners beyond the samples
     collect(vignetted);
-    context.maxGain = 100.0f;
+    settings.maxGain = 100.0f;
     ASSERT_EQ(fitError(), "(passed)");
-    float largestGain = 0.0f, largestPoint = 0.0f;
-    for (const shadingSample& s : context.samples)
-        largestGain = std::max(largestGain, s.value[0]);
-    for (float point : context.controlGrids[0])
+    // The target is flat: the largest red gain is the brightest red sample
+    // over the darkest.
+    float brightest = 0.0f, darkest = 1.0f, largestPoint = 0.0f;
+    for (const shadingSample& s : samples.samples) {
+        brightest = std::max(brightest, s.value[0]);
+        darkest = std::min(darkest, s.value[0]);
+    }
+    const float largestGain = brightest / darkest;
+    for (float point : fit->correction.controlGrids[0])
         largestPoint = std::max(largestPoint, point);
     ASSERT_GT(largestPoint, largestGain + 0.01f);
 
-    for (auto& grid : context.controlGrids)
-        for (float& g : grid)
-            g = 7.0f;
-    context.maxGain = (largestGain + largestPoint) / 2;
+    settings.maxGain = (largestGain + largestPoint) / 2;
     const std::string error = fitError();
     EXPECT_NE(error.find(" of the red channel is above lsc.max_gain ("), std::string::npos)
         << error;

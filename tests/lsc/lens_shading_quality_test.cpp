@@ -88,26 +88,28 @@ TEST_P(CorrectedFlatField, EveryChannelIsFlatWithinOnePercent) {
     const std::vector<float> prepared =
         sameColourMedian(field.normalized(), shape.width, shape.height);
 
-    ProcessingContext context;
-    context.blackLevel = static_cast<float>(blackLevel) / static_cast<float>(field.fullScale());
-    context.sampleAngleStep = 8;
-    context.procSamplingFactor = 4;
-    context.quiet = true;
+    ShadingSettings settings;
+    settings.blackLevel = static_cast<float>(blackLevel) / static_cast<float>(field.fullScale());
+    settings.sampleAngleStep = 8;
+    settings.procSamplingFactor = 4;
+    settings.quiet = true;
+    BayerImage image;
     lsc_test::makeImage(
-        context, shape.width, shape.height, cfa,
+        image, shape.width, shape.height, cfa,
         [&](int x, int y) { return prepared[static_cast<std::size_t>(y) * shape.width + x]; },
         static_cast<std::uint16_t>(bits));
     std::ostringstream messages;
-    collectSamples(context, messages);
-    fitLensShading(context, messages);
-
-    // The correction gets the prepared image again, black level included.
-    std::copy(prepared.begin(), prepared.end(), context.image.pixels());
-    applyLensShading(context);
+    const BayerImage levelled = levelledImage(image, settings.blackLevel);
+    const SampleSet samples = collectSamples(levelled, settings, messages);
+    FitDeviations deviations;
+    const FitResult fit = fitLensShading(samples, {levelled, true}, settings, messages, deviations);
+    // The correction gets the prepared image, black level included.
+    const BayerImage corrected =
+        applyLensShading(image, fit.correction, settings.blackLevel, settings.applyStep);
 
     const int phase = cfa == kCfaGrbg ? 1 : cfa == kCfaGbrg ? 2 : cfa == kCfaBggr ? 3 : 0;
     for (int k = 0; k < 4; ++k) {
-        const double worst = worstBlockDeviation(context.corrected, k, phase);
+        const double worst = worstBlockDeviation(corrected, k, phase);
         EXPECT_LT(worst, 0.01) << "channel " << k;
         RecordProperty("worstDeviationChannel" + std::to_string(k),
                        std::to_string(worst * 100) + "%");

@@ -7,20 +7,21 @@
 
 #include <gtest/gtest.h>
 
+#include "image/bayer_image.h"
 #include "image/image_buffer.h"
-#include "lsc/processing_context.h"
+#include "lsc/shading_sample.h"
 
 namespace lsc_test {
 
-// Gives context.image a width x height REAL32 Bayer image of pattern `cfa`
-// whose pixel (x, y) is value(x, y).
-inline void makeImage(ProcessingContext& context, int width, int height, std::uint32_t cfa,
+// Gives `image` a width x height REAL32 Bayer image of pattern `cfa` whose
+// pixel (x, y) is value(x, y).
+inline void makeImage(BayerImage& image, int width, int height, std::uint32_t cfa,
                       const std::function<float(int, int)>& value, std::uint16_t bits = 10) {
     int rc = 0;
-    context.image.reset(
+    image.reset(
         imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
-    ASSERT_NE(context.image.buffer(), nullptr) << rc;
-    float* p = context.image.pixels();
+    ASSERT_NE(image.buffer(), nullptr) << rc;
+    float* p = image.pixels();
     for (int y = 0; y < height; ++y)
         for (int x = 0; x < width; ++x)
             p[y * width + x] = value(x, y);

@@ -16,18 +16,19 @@ const float kLevels[4] = {0.2f, 0.4f, 0.5f, 0.7f};
 
 class SampleCollection : public ::testing::Test {
 protected:
-    ProcessingContext context;
+    BayerImage image;
+    ShadingSettings settings;
+    SampleSet set;
     std::ostringstream messages;
 };
 
-TEST_F(SampleCollection, RemovesTheBlackLevelAndClampsToOne) {
-    makeImage(context, 4, 4, kCfaRggb, [](int x, int) {
+TEST_F(SampleCollection, LevelledImageLosesTheBlackLevelAndIsClampedToOne) {
+    makeImage(image, 4, 4, kCfaRggb, [](int x, int) {
         return x == 0 ? 0.05f : x == 1 ? 0.5f : 1.0f;
     });
-    context.blackLevel = 0.1f;
-    context.image.pixels()[3] = 1.5f;
-    collectSamples(context, messages);
-    const float* p = context.image.pixels();
+    image.pixels()[3] = 1.5f;
+    const BayerImage levelled = levelledImage(image, 0.1f);
+    const float* p = levelled.pixels();
     EXPECT_EQ(p[0], 0.0f);
     EXPECT_FLOAT_EQ(p[1], 0.4f);
     EXPECT_FLOAT_EQ(p[2], 0.9f);
@@ -35,67 +36,69 @@ TEST_F(SampleCollection, RemovesTheBlackLevelAndClampsToOne) {
 }
 
 TEST_F(SampleCollection, SineGridAndBorderLinesOfASmallImage) {
-    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    context.sampleAngleStep = 90; // angles -90, 0, 90
-    collectSamples(context, messages);
+    makeImage(image, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    settings.sampleAngleStep = 90; // angles -90, 0, 90
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
     // Sine grid: x in {0, 32} (64 = W is dropped), y in {0, 24}; then 6 columns
     // of 24 samples (every T / 5 = 2 rows) and 6 rows of 22 (every L / 5 = 3 columns).
-    ASSERT_EQ(context.samples.size(), 4u + 6 * 24 + 6 * 22);
+    ASSERT_EQ(set.samples.size(), 4u + 6 * 24 + 6 * 22);
     const std::uint32_t grid[4][2] = {{0, 0}, {0, 24}, {32, 0}, {32, 24}};
     for (int i = 0; i < 4; ++i) {
-        EXPECT_EQ(context.samples[i].x, grid[i][0]);
-        EXPECT_EQ(context.samples[i].y, grid[i][1]);
+        EXPECT_EQ(set.samples[i].x, grid[i][0]);
+        EXPECT_EQ(set.samples[i].y, grid[i][1]);
     }
     // The first border column is x = 3, read as the block at x = 2.
-    EXPECT_EQ(context.samples[4].x, 2u);
-    EXPECT_EQ(context.samples[4].y, 0u);
-    EXPECT_EQ(context.samples[5].y, 2u);
+    EXPECT_EQ(set.samples[4].x, 2u);
+    EXPECT_EQ(set.samples[4].y, 0u);
+    EXPECT_EQ(set.samples[5].y, 2u);
     EXPECT_EQ(messages.str(), "Number of sample points = 280\n");
 }
 
 TEST_F(SampleCollection, QuietSuppressesTheCountLine) {
-    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    context.quiet = true;
-    collectSamples(context, messages);
-    EXPECT_FALSE(context.samples.empty());
+    makeImage(image, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    settings.quiet = true;
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    EXPECT_FALSE(set.samples.empty());
     EXPECT_EQ(messages.str(), "");
 }
 
 class SampleChannels : public ::testing::TestWithParam<std::uint32_t> {};
 
 TEST_P(SampleChannels, EachBlockPixelGoesToItsChannel) {
-    ProcessingContext context;
+    BayerImage image;
+    ShadingSettings settings;
+    SampleSet set;
     std::ostringstream messages;
-    makeImage(context, 64, 48, GetParam(), channelLevels(GetParam(), kLevels));
-    collectSamples(context, messages);
-    ASSERT_FALSE(context.samples.empty());
-    for (const shadingSample& s : context.samples) {
+    makeImage(image, 64, 48, GetParam(), channelLevels(GetParam(), kLevels));
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    ASSERT_FALSE(set.samples.empty());
+    for (const shadingSample& s : set.samples) {
         ASSERT_EQ(s.x % 2, 0u);
         ASSERT_EQ(s.y % 2, 0u);
         for (int k = 0; k < 4; ++k)
             ASSERT_EQ(s.value[k], kLevels[k]) << k;
     }
     for (int k = 0; k < 4; ++k)
-        EXPECT_FLOAT_EQ(context.targetLevels[k], kLevels[k]) << k;
+        EXPECT_FLOAT_EQ(set.targetLevels[k], kLevels[k]) << k;
 }
 
 INSTANTIATE_TEST_SUITE_P(BayerOrders, SampleChannels,
                          ::testing::Values(kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr));
 
 TEST_F(SampleCollection, MarginBeyondHalfTheHeightTakesNoSamples) {
-    makeImage(context, 400, 40, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    context.sampleMargin = 300; // 120 pixels on both axes; the image is 40 high
-    collectSamples(context, messages);
-    EXPECT_TRUE(context.samples.empty());
+    makeImage(image, 400, 40, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    settings.sampleMargin = 300; // 120 pixels on both axes; the image is 40 high
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    EXPECT_TRUE(set.samples.empty());
     EXPECT_EQ(messages.str(), "Number of sample points = 0\n");
 }
 
 TEST_F(SampleCollection, MarginKeepsSamplesAwayFromTheBorders) {
-    makeImage(context, 200, 100, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    context.sampleMargin = 100; // 20 pixels
-    collectSamples(context, messages);
-    ASSERT_FALSE(context.samples.empty());
-    for (const shadingSample& s : context.samples) {
+    makeImage(image, 200, 100, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    settings.sampleMargin = 100; // 20 pixels
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    ASSERT_FALSE(set.samples.empty());
+    for (const shadingSample& s : set.samples) {
         EXPECT_GE(s.x, 20u);
         EXPECT_LT(s.x, 180u);
         EXPECT_GE(s.y, 20u);
@@ -104,29 +107,29 @@ TEST_F(SampleCollection, MarginKeepsSamplesAwayFromTheBorders) {
 }
 
 TEST_F(SampleCollection, OddSizedImagesNeverSampleAHalfBlock) {
-    makeImage(context, 65, 49, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    collectSamples(context, messages);
-    ASSERT_FALSE(context.samples.empty());
-    for (const shadingSample& s : context.samples) {
+    makeImage(image, 65, 49, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    ASSERT_FALSE(set.samples.empty());
+    for (const shadingSample& s : set.samples) {
         EXPECT_LT(s.x + 1, 65u);
         EXPECT_LT(s.y + 1, 49u);
     }
 }
 
 TEST_F(SampleCollection, PatchesUnderFivePixelsStillEndTheBorderLines) {
-    makeImage(context, 16, 12, kCfaRggb, channelLevels(kCfaRggb, kLevels)); // L = 4, T = 3
-    context.sampleAngleStep = 180;
-    collectSamples(context, messages);
+    makeImage(image, 16, 12, kCfaRggb, channelLevels(kCfaRggb, kLevels)); // L = 4, T = 3
+    settings.sampleAngleStep = 180;
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
     // Steps of at least one pixel: the sine grid's (0, 0), six columns of 12 rows,
     // and five rows (y = 12 lies outside) of 16 columns.
-    EXPECT_EQ(context.samples.size(), 1u + 6 * 12 + 5 * 16);
+    EXPECT_EQ(set.samples.size(), 1u + 6 * 12 + 5 * 16);
 }
 
 TEST_F(SampleCollection, RefusesAnAngleStepBelowOne) {
-    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    context.sampleAngleStep = 0;
+    makeImage(image, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    settings.sampleAngleStep = 0;
     try {
-        collectSamples(context, messages);
+        (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
         FAIL() << "no exception";
     } catch (const std::runtime_error& e) {
         EXPECT_STREQ(e.what(), "lsc.sampling_factor must be at least 1.");
@@ -134,27 +137,27 @@ TEST_F(SampleCollection, RefusesAnAngleStepBelowOne) {
 }
 
 TEST_F(SampleCollection, SampleWindowKeepsABrightPixelOutOfItsSample) {
-    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
-    context.sampleAngleStep = 90;                // the sine grid holds the block at (32, 24)
-    context.image.pixels()[24 * 64 + 32] = 1.0f; // its red pixel
+    makeImage(image, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    settings.sampleAngleStep = 90;       // the sine grid holds the block at (32, 24)
+    image.pixels()[24 * 64 + 32] = 1.0f; // its red pixel
     auto redAtCentre = [&] {
-        collectSamples(context, messages);
-        for (const shadingSample& s : context.samples)
+        (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+        for (const shadingSample& s : set.samples)
             if (s.x == 32 && s.y == 24)
                 return s.value[0];
         return -1.0f;
     };
     EXPECT_EQ(redAtCentre(), 1.0f);
-    context.sampleWindow = 3;
+    settings.sampleWindow = 3;
     EXPECT_EQ(redAtCentre(), kLevels[0]);
 }
 
 TEST_F(SampleCollection, RefusesASampleWindowItCannotUse) {
-    makeImage(context, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
+    makeImage(image, 64, 48, kCfaRggb, channelLevels(kCfaRggb, kLevels));
     for (int window : {0, 4, 17}) {
-        context.sampleWindow = window;
+        settings.sampleWindow = window;
         try {
-            collectSamples(context, messages);
+            (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
             ADD_FAILURE() << "no exception for " << window;
         } catch (const std::runtime_error& e) {
             EXPECT_STREQ(e.what(), "lsc.sample_window must be an odd number from 1 to 15.");
@@ -163,39 +166,47 @@ TEST_F(SampleCollection, RefusesASampleWindowItCannotUse) {
 }
 
 TEST_F(SampleCollection, RefusesAMissingImage) {
-    EXPECT_THROW(collectSamples(context, messages), std::runtime_error);
+    EXPECT_THROW(
+        (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages)),
+        std::runtime_error);
 }
 
 TEST(TargetLevels, WindowShrinksAtThePlaneBorder) {
-    ProcessingContext context;
+    BayerImage image;
+    ShadingSettings settings;
+    SampleSet set;
     std::ostringstream messages;
     // Red plane: one bright pixel at its corner (0, 0); window 3 x 3.
-    makeImage(context, 20, 20, kCfaRggb,
-              [](int x, int y) { return x == 0 && y == 0 ? 1.0f : 0.0f; });
-    context.awbFilterSize = 6; // 6 / (2 * 1) = 3
-    collectSamples(context, messages);
-    EXPECT_FLOAT_EQ(context.targetLevels[0], 0.25f); // mean over the 2 x 2 inside
-    EXPECT_EQ(context.targetLevels[1], 0.0f);
+    makeImage(image, 20, 20, kCfaRggb, [](int x, int y) { return x == 0 && y == 0 ? 1.0f : 0.0f; });
+    settings.awbFilterSize = 6; // 6 / (2 * 1) = 3
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    EXPECT_FLOAT_EQ(set.targetLevels[0], 0.25f); // mean over the 2 x 2 inside
+    EXPECT_EQ(set.targetLevels[1], 0.0f);
 }
 
 TEST(TargetLevels, WindowSizeIsFilterSizeOverTwiceTheSamplingFactorMadeOdd) {
-    ProcessingContext context;
+    BayerImage image;
+    ShadingSettings settings;
+    SampleSet set;
     std::ostringstream messages;
     // Bright red pixel in the middle of a 16 x 16 red plane.
-    makeImage(context, 32, 32, kCfaRggb,
+    makeImage(image, 32, 32, kCfaRggb,
               [](int x, int y) { return x == 16 && y == 16 ? 1.0f : 0.0f; });
-    context.awbFilterSize = 16;
-    context.procSamplingFactor = 2; // 16 / 4 = 4, made odd: 5
-    collectSamples(context, messages);
-    EXPECT_FLOAT_EQ(context.targetLevels[0], 1.0f / 25);
+    settings.awbFilterSize = 16;
+    settings.procSamplingFactor = 2; // 16 / 4 = 4, made odd: 5
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages));
+    EXPECT_FLOAT_EQ(set.targetLevels[0], 1.0f / 25);
 }
 
 TEST(TargetLevels, WindowLargerThanThePlaneAveragesTheWholePlane) {
-    ProcessingContext context;
+    BayerImage image;
+    ShadingSettings settings;
+    SampleSet set;
     std::ostringstream messages;
-    makeImage(context, 8, 8, kCfaRggb, [](int x, int y) { return x == 0 && y == 0 ? 1.0f : 0.0f; });
-    collectSamples(context, messages); // window 51 over a 4 x 4 plane
-    EXPECT_FLOAT_EQ(context.targetLevels[0], 1.0f / 16);
+    makeImage(image, 8, 8, kCfaRggb, [](int x, int y) { return x == 0 && y == 0 ? 1.0f : 0.0f; });
+    (set = collectSamples(levelledImage(image, settings.blackLevel), settings,
+                          messages)); // window 51 over a 4 x 4 plane
+    EXPECT_FLOAT_EQ(set.targetLevels[0], 1.0f / 16);
 }
 
 } // namespace

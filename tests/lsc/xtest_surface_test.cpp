@@ -11,7 +11,7 @@ protected:
     void SetUp() override { applyXTestSurface(context); }
     const float* red() const { return context.controlGrids[0]; }
     const float* green() const { return context.controlGrids[1]; }
-    ProcessingContext context;
+    ShadingCorrection context;
 };
 
 TEST_F(XTestSurface, RedEqualsBlueAndTheGreensAreEqual) {

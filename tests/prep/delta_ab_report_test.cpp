@@ -16,10 +16,10 @@ const std::string kCauses =
     "poor quality flat field input image, damaged sensor, or invalid configuration for the "
     "sensor being used.";
 
-ProcessingContext results() {
-    ProcessingContext context;
-    context.deltaAbBlocks[0] = 3;
-    context.deltaAbBlocks[1] = 2;
+prep::DeltaAbResult results() {
+    prep::DeltaAbResult context;
+    context.columns = 3;
+    context.rows = 2;
     context.deltaImage = {0.5f, 1.25f, 2.0f, 0.000004f, 10.123456f, 0.0f};
     context.meanChroma = 1.5f;
     context.maxDelta = 2.25f;
@@ -43,9 +43,9 @@ TEST(DeltaFile, RowsOfFiveDecimalValuesEachFollowedByComma) {
 }
 
 TEST(DeltaFile, SingleRowGrid) {
-    ProcessingContext context;
-    context.deltaAbBlocks[0] = 3;
-    context.deltaAbBlocks[1] = 1;
+    prep::DeltaAbResult context;
+    context.columns = 3;
+    context.rows = 1;
     context.deltaImage = {1.0f, 2.0f, 3.0f};
     EXPECT_EQ(prep::formatDeltaFile(context), "1.00000,2.00000,3.00000,\n\n");
 }

@@ -1,3 +1,4 @@
+#include <optional>
 #include <stdexcept>
 #include <string>
 
@@ -10,14 +11,15 @@ namespace {
 
 // A 16 x 8 grey mosaic, 2 x 2 delta-ab blocks of 4 x 2 RGB pixels; the pixel
 // (x, y) of the mosaic scaled by `factor`.
+// Nothing measured gives -1.
 float residualWithPixel(int x, int y, float factor, int columns = 2, int rows = 2) {
-    ProcessingContext context;
-    context.corrected = prep_test::makeImage(16, 8);
-    prep_test::fill(context.corrected, 0.5f);
-    context.corrected.pixels()[y * 16 + x] *= factor;
-    context.deltaAbBlocks[0] = columns;
-    context.deltaAbBlocks[1] = rows;
-    return prep::luminanceResidual(context);
+    BayerImage balanced = prep_test::makeImage(16, 8);
+    prep_test::fill(balanced, 0.5f);
+    balanced.pixels()[y * 16 + x] *= factor;
+    ShadingSettings settings;
+    settings.deltaAbBlocks[0] = columns;
+    settings.deltaAbBlocks[1] = rows;
+    return prep::luminanceResidual(balanced, settings).value_or(-1.0f);
 }
 
 TEST(LuminanceResidual, WeighsEachChannelByItsShareOfTheLuminance) {
@@ -41,7 +43,7 @@ TEST(LuminanceResidual, GridThatDoesNotFitIsNotMeasured) {
 }
 
 TEST(LuminanceResidual, BoundInPerCentFailsPastItAndZeroIsOff) {
-    const auto error = [](float residual, float bound) -> std::string {
+    const auto error = [](std::optional<float> residual, float bound) -> std::string {
         try {
             prep::checkLuminanceResidual(residual, bound);
         } catch (const std::exception& e) {
@@ -51,13 +53,13 @@ TEST(LuminanceResidual, BoundInPerCentFailsPastItAndZeroIsOff) {
     };
     EXPECT_EQ(error(0.03f, 3.0f), "(passed)");
     EXPECT_EQ(error(0.5f, 0.0f), "(passed)");
-    EXPECT_EQ(error(-1.0f, 0.0f), "(passed)");
+    EXPECT_EQ(error(std::nullopt, 0.0f), "(passed)");
     EXPECT_EQ(error(0.031f, 3.0f),
               "Maximum luminance residual is greater than threshold of 3 %\nSome possible causes "
               "include light is not on, light in bad position, missing diffuser, poor quality flat "
               "field input image, damaged sensor, or invalid configuration for the sensor being "
               "used.");
-    EXPECT_EQ(error(-1.0f, 3.0f),
+    EXPECT_EQ(error(std::nullopt, 3.0f),
               "The luminance residual cannot be measured: the flattened image does not fill the "
               "delta ab block grid or holds no light.");
 }

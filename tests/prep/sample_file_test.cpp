@@ -21,10 +21,17 @@ std::string parseError(const std::string& text, std::int32_t width = 648, std::i
     return "(no error)";
 }
 
-ProcessingContext contextWithImage(std::int32_t width, std::int32_t height, int factor) {
-    ProcessingContext context;
+// A prepared image, its samples and the scale of their file.
+struct Samples {
+    BayerImage image;
+    SampleSet set;
+    prep::SampleFileScale scale;
+};
+
+Samples contextWithImage(std::int32_t width, std::int32_t height, int factor) {
+    Samples context;
     context.image = prep_test::makeImage(width, height);
-    context.procSamplingFactor = factor;
+    context.scale = {1023, factor};
     return context;
 }
 
@@ -51,10 +58,10 @@ TEST(SampleFileFormat, SizeAndCoordinatesInFullResolution) {
 }
 
 TEST(SampleFileParse, ScalesDownBySamplingFactor) {
-    const prep::SampleSet set = prep::parseSampleFile("1023,1023,1023,1023\n"
-                                                      "2592,1944,4\n"
-                                                      "100,50,1023,511.5,0,1023\n",
-                                                      648, 486, {1023, 4});
+    const SampleSet set = prep::parseSampleFile("1023,1023,1023,1023\n"
+                                                "2592,1944,4\n"
+                                                "100,50,1023,511.5,0,1023\n",
+                                                648, 486, {1023, 4});
     ASSERT_EQ(set.samples.size(), 1u);
     EXPECT_EQ(set.samples[0].x, 25u);
     EXPECT_EQ(set.samples[0].y, 12u);
@@ -64,9 +71,9 @@ TEST(SampleFileParse, ScalesDownBySamplingFactor) {
 }
 
 TEST(SampleFileParse, AcceptsCrLfAndBlankLines) {
-    const prep::SampleSet set = prep::parseSampleFile("\r\n1,2,3,4\r\n8,6,4\r\n\r\n0,0,1,2,3,4\r\n"
-                                                      "  \n2,4, 1.5,2,3,4 \n\n",
-                                                      8, 6, {1023, 1});
+    const SampleSet set = prep::parseSampleFile("\r\n1,2,3,4\r\n8,6,4\r\n\r\n0,0,1,2,3,4\r\n"
+                                                "  \n2,4, 1.5,2,3,4 \n\n",
+                                                8, 6, {1023, 1});
     EXPECT_EQ(set.samples.size(), 2u);
     EXPECT_FLOAT_EQ(set.targetLevels[1], 2.0f / 1023.0f);
 }
@@ -132,55 +139,51 @@ TEST(SampleFileParse, SampleCountIsCapped) {
 
 TEST(SampleFile, WrittenFileReadsBackWithSamplingFactor) {
     TempDir dir;
-    ProcessingContext written = contextWithImage(648, 486, 4);
+    Samples written = contextWithImage(648, 486, 4);
     const float levels[4] = {0.5f, 0.75f, 0.7f, 0.25f};
-    std::copy(levels, levels + 4, written.targetLevels);
-    written.samples = {{0, 0, {0.4f, 0.6f, 0.6f, 0.2f}}, {646, 484, {0.1f, 0.3f, 0.3f, 0.05f}}};
-    prep::writeSampleFile(dir.file("samples.txt"), written, 1023);
+    std::copy(levels, levels + 4, written.set.targetLevels);
+    written.set.samples = {{0, 0, {0.4f, 0.6f, 0.6f, 0.2f}}, {646, 484, {0.1f, 0.3f, 0.3f, 0.05f}}};
+    prep::writeSampleFile(dir.file("samples.txt"), written.set, written.image, written.scale);
 
-    ProcessingContext read = contextWithImage(648, 486, 4);
-    prep::readSampleFile(dir.file("samples.txt"), read, 1023);
-    ASSERT_EQ(read.samples.size(), 2u);
+    Samples read = contextWithImage(648, 486, 4);
+    read.set = prep::readSampleFile(dir.file("samples.txt"), read.image, read.scale);
+    ASSERT_EQ(read.set.samples.size(), 2u);
     for (int k = 0; k < 4; ++k)
-        EXPECT_NEAR(read.targetLevels[k], levels[k], 0.5 / 1023);
+        EXPECT_NEAR(read.set.targetLevels[k], levels[k], 0.5 / 1023);
     for (std::size_t i = 0; i < 2; ++i) {
-        EXPECT_EQ(read.samples[i].x, written.samples[i].x);
-        EXPECT_EQ(read.samples[i].y, written.samples[i].y);
+        EXPECT_EQ(read.set.samples[i].x, written.set.samples[i].x);
+        EXPECT_EQ(read.set.samples[i].y, written.set.samples[i].y);
         for (int k = 0; k < 4; ++k)
-            EXPECT_NEAR(read.samples[i].value[k], written.samples[i].value[k], 0.5 / 1023);
+            EXPECT_NEAR(read.set.samples[i].value[k], written.set.samples[i].value[k], 0.5 / 1023);
     }
 }
 
 TEST(SampleFile, MissingInputNamesThePath) {
     TempDir dir;
-    ProcessingContext context = contextWithImage(8, 8, 1);
+    Samples context = contextWithImage(8, 8, 1);
     const std::string path = dir.file("none.txt");
     try {
-        prep::readSampleFile(path, context, 1023);
+        context.set = prep::readSampleFile(path, context.image, context.scale);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_EQ(std::string(e.what()), "Cannot open input sample file: " + path);
     }
 }
 
-TEST(SampleFile, FailedFileLeavesContextUntouched) {
+TEST(SampleFile, AFileWithABadLineIsRefused) {
     TempDir dir;
     testing_support::writeFile(dir.file("bad.txt"), "1,2,3,4\n8,8,4\n0,0,1,2,3,4\n0,0,x\n");
-    ProcessingContext context = contextWithImage(8, 8, 1);
-    context.targetLevels[0] = 0.5f;
-    context.samples = {{2, 2, {1, 1, 1, 1}}};
-    EXPECT_THROW(prep::readSampleFile(dir.file("bad.txt"), context, 1023), std::runtime_error);
-    EXPECT_EQ(context.targetLevels[0], 0.5f);
-    ASSERT_EQ(context.samples.size(), 1u);
-    EXPECT_EQ(context.samples[0].x, 2u);
+    const Samples context = contextWithImage(8, 8, 1);
+    EXPECT_THROW((void)prep::readSampleFile(dir.file("bad.txt"), context.image, context.scale),
+                 std::runtime_error);
 }
 
 TEST(SampleFile, UnwritableOutputNamesThePath) {
     TempDir dir;
-    const ProcessingContext context = contextWithImage(8, 8, 1);
+    const Samples context = contextWithImage(8, 8, 1);
     const std::string path = dir.file("missing/samples.txt");
     try {
-        prep::writeSampleFile(path, context, 1023);
+        prep::writeSampleFile(path, context.set, context.image, context.scale);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_EQ(std::string(e.what()), "Cannot open sample output file: " + path);
@@ -188,9 +191,9 @@ TEST(SampleFile, UnwritableOutputNamesThePath) {
 }
 
 TEST(SampleFile, FullDeviceIsAWriteError) {
-    const ProcessingContext context = contextWithImage(8, 8, 1);
+    const Samples context = contextWithImage(8, 8, 1);
     try {
-        prep::writeSampleFile("/dev/full", context, 1023);
+        prep::writeSampleFile("/dev/full", context.set, context.image, context.scale);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_EQ(std::string(e.what()), "Cannot write sample output file: /dev/full");

@@ -9,6 +9,21 @@ using prep_test::makeImage;
 
 namespace {
 
+// The run's white balance: to the fit's target levels, or to the centre's
+// when the red one is 0.
+struct Balance {
+    BayerImage corrected;
+    float targetLevels[4] = {0, 0, 0, 0};
+    int awbFilterSize = 100;
+    int procSamplingFactor = 1;
+};
+
+void balance(Balance& run) {
+    float levels[4];
+    prep::balanceLevels(run.targetLevels, run.corrected, levels);
+    prep::whiteBalance(run.corrected, levels);
+}
+
 // Channel of (x, y) for RGGB.
 int rggbChannel(int x, int y) {
     return (x & 1) + (y & 1) * 2;
@@ -50,12 +65,12 @@ TEST(CentreWindow, MixedBounds) {
 class WhiteBalance : public ::testing::TestWithParam<std::uint32_t> {};
 
 TEST_P(WhiteBalance, TargetLevelsGiveGainsPerChannel) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = makeImage(4, 4, 1, GetParam());
     prep_test::fill(context.corrected, 1.0f);
     const float levels[4] = {1.0f, 2.0f, 2.0f, 0.5f};
     std::copy(levels, levels + 4, context.targetLevels);
-    prep::whiteBalance(context);
+    balance(context);
     const float gains[4] = {2.0f, 1.0f, 1.0f, 4.0f};
     // Channel k of (x, y) for the pattern under test.
     const int phase = GetParam() == kCfaGrbg   ? 1
@@ -73,30 +88,30 @@ INSTANTIATE_TEST_SUITE_P(BayerOrders, WhiteBalance,
                          ::testing::Values(kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr));
 
 TEST(WhiteBalanceCentre, MeasuredLevelsBalanceTheChannels) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = channelImage(150, 150, {0.5f, 0.25f, 0.25f, 0.125f});
-    prep::whiteBalance(context);
+    balance(context);
     for (float v : prep_test::samplesOf(context.corrected))
         ASSERT_EQ(v, 0.5f);
 }
 
 TEST(WhiteBalanceCentre, OnlyTheCentreWindowCounts) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = channelImage(640, 480, {0.5f, 0.5f, 0.5f, 0.5f});
     // Red outside the window (x < 220) is darker; the gains must ignore it.
     for (int y = 0; y < 480; y += 2)
         context.corrected.pixels()[y * 640] = 0.1f;
-    prep::whiteBalance(context);
+    balance(context);
     EXPECT_EQ(context.corrected.pixels()[2 * 640 + 2], 0.5f);
     EXPECT_EQ(context.corrected.pixels()[0], 0.1f);
 }
 
 TEST(WhiteBalanceCentre, RefusesWindowWithoutEveryChannel) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = makeImage(1, 8, 1, kCfaRggb);
     prep_test::fill(context.corrected, 0.5f);
     try {
-        prep::whiteBalance(context);
+        balance(context);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_STREQ(e.what(),
@@ -106,10 +121,10 @@ TEST(WhiteBalanceCentre, RefusesWindowWithoutEveryChannel) {
 }
 
 TEST(WhiteBalanceCentre, RefusesZeroLevelAndLeavesImage) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = channelImage(8, 8, {0.5f, 0.5f, 0.0f, 0.5f});
     try {
-        prep::whiteBalance(context);
+        balance(context);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_STREQ(e.what(), "A colour channel of the flattened image has no positive level; "
@@ -126,11 +141,12 @@ TEST(BoxSide, OddSideFromFilterSizeAndSamplingFactor) {
 }
 
 TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = channelImage(20, 16, {0.5f, 0.25f, 0.75f, 0.125f});
     context.awbFilterSize = 6;
     float levels[4];
-    prep::measureLevels(levels, context);
+    prep::measureLevels(levels, context.corrected, context.awbFilterSize,
+                        context.procSamplingFactor);
     EXPECT_FLOAT_EQ(levels[0], 0.5f);
     EXPECT_FLOAT_EQ(levels[1], 0.25f);
     EXPECT_FLOAT_EQ(levels[2], 0.75f);
@@ -138,26 +154,28 @@ TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
 }
 
 TEST(MeasureLevels, BoxMeanShrinksAtBorders) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = channelImage(10, 10, {0, 0, 0, 0}); // 5 x 5 planes
     context.awbFilterSize = 6;                              // side 3
     context.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;  // red plane (2, 2)
     context.corrected.pixels()[0 * 10 + 1] = 9.0f;          // green/red plane (0, 0)
     float levels[4];
-    prep::measureLevels(levels, context);
+    prep::measureLevels(levels, context.corrected, context.awbFilterSize,
+                        context.procSamplingFactor);
     EXPECT_FLOAT_EQ(levels[0], 1.0f);  // 9 over a full 3 x 3 window
     EXPECT_FLOAT_EQ(levels[1], 2.25f); // 9 over the 2 x 2 corner window
     EXPECT_FLOAT_EQ(levels[2], 0.0f);
 }
 
 TEST(MeasureLevels, RefusesImageBelowTwoByTwo) {
-    ProcessingContext context;
+    Balance context;
     context.corrected = makeImage(1, 5);
     prep_test::fill(context.corrected, 0.5f);
     EXPECT_THROW(
         {
             float levels[4];
-            prep::measureLevels(levels, context);
+            prep::measureLevels(levels, context.corrected, context.awbFilterSize,
+                                context.procSamplingFactor);
         },
         std::runtime_error);
 }

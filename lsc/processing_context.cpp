@@ -1,1 +1,0 @@
-#include "lsc/processing_context.h"
