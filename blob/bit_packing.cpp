@@ -11,7 +11,7 @@ void packCodes(const std::vector<std::uint32_t>& codes, unsigned bits,
     const std::uint64_t mask = (std::uint64_t{1} << bits) - 1;
     std::uint64_t pending = 0; // bits not yet written, right-aligned
     unsigned pendingBits = 0;
-    out.reserve(out.size() + packedSize(codes.size(), bits));
+    out.reserve(out.size() + static_cast<std::size_t>(packedSize(codes.size(), bits)));
     for (std::uint32_t code : codes) {
         pending = (pending << bits) | (code & mask);
         pendingBits += bits;
