@@ -92,6 +92,18 @@ inline void appendChannelLevels(std::string& text, const ImageBuffer& image, Lev
     }
 }
 
+// Appends the four level fields (black, white, lowest and highest clip),
+// each label followed by its channel levels.
+inline void appendLevelFields(std::string& text, const ImageBuffer& image,
+                              const char* const (&labels)[4], bool leadingSpace) {
+    const LevelField fields[4] = {LevelField::kBlackVal, LevelField::kWhiteVal,
+                                  LevelField::kMinClip, LevelField::kMaxClip};
+    for (int i = 0; i < 4; ++i) {
+        text += labels[i];
+        appendChannelLevels(text, image, fields[i], leadingSpace);
+    }
+}
+
 // Appends the metadata block of one entry.
 inline void appendMetadataBlock(std::string& text, const MetadataEntry& entry) {
     appendFormatted(text, kMetadataBlock, entry.key, static_cast<int>(std::strlen(entry.value)),

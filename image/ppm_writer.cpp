@@ -52,14 +52,9 @@ std::string buildHeader(const ImageBuffer& image, std::uint32_t maxValue) {
         text::appendFormatted(header, text::kPnmCfa, cfaPatternName(image.cfa[1]));
     text::appendFormatted(header, text::kPnmBufferType, bufferTypeName(image.bufferType));
     text::appendFormatted(header, text::kPnmDataType, dataTypeName(image.dataType));
-    header += text::kPnmBlackVal;
-    text::appendChannelLevels(header, image, text::LevelField::kBlackVal, true);
-    header += text::kPnmWhiteVal;
-    text::appendChannelLevels(header, image, text::LevelField::kWhiteVal, true);
-    header += text::kPnmMinClip;
-    text::appendChannelLevels(header, image, text::LevelField::kMinClip, true);
-    header += text::kPnmMaxClip;
-    text::appendChannelLevels(header, image, text::LevelField::kMaxClip, true);
+    text::appendLevelFields(
+        header, image,
+        {text::kPnmBlackVal, text::kPnmWhiteVal, text::kPnmMinClip, text::kPnmMaxClip}, true);
     header += '\n';
     for (const MetadataEntry* entry = image.metadata; entry; entry = entry->next)
         appendMetadataComment(header, *entry);

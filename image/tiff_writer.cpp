@@ -157,14 +157,9 @@ std::string tiffDescription(const ImageBuffer& image) {
     text::appendFormatted(description, text::kTiffProperties, image.numberOfImages,
                           pixelTypeName(image.pixelType), cfa.c_str(),
                           bufferTypeName(image.bufferType), dataTypeName(image.dataType));
-    description += text::kTiffBlackVal;
-    text::appendChannelLevels(description, image, text::LevelField::kBlackVal, false);
-    description += text::kTiffWhiteVal;
-    text::appendChannelLevels(description, image, text::LevelField::kWhiteVal, false);
-    description += text::kTiffMinClip;
-    text::appendChannelLevels(description, image, text::LevelField::kMinClip, false);
-    description += text::kTiffMaxClip;
-    text::appendChannelLevels(description, image, text::LevelField::kMaxClip, false);
+    text::appendLevelFields(
+        description, image,
+        {text::kTiffBlackVal, text::kTiffWhiteVal, text::kTiffMinClip, text::kTiffMaxClip}, false);
     for (const MetadataEntry* entry = image.metadata; entry; entry = entry->next) {
         text::appendFormatted(description, text::kTiffMetadataKey, entry->key,
                               static_cast<int>(std::strlen(entry->value)));
