@@ -10,11 +10,12 @@
 #include <benchmark/benchmark.h>
 
 #include "image/image_buffer.h"
+#include "lsc/fit_result.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
 #include "lsc/patch_surface.h"
-#include "lsc/processing_context.h"
 #include "lsc/sample_collection.h"
+#include "lsc/shading_settings.h"
 
 namespace {
 
@@ -27,44 +28,53 @@ float flatField(int x, int y, int width, int height) {
     return static_cast<float>(channel[(x & 1) + (y & 1) * 2] / ((1 + 0.41 * r2) * (1 + 0.41 * r2)));
 }
 
-void makeFlatImage(ProcessingContext& context, int width, int height) {
+BayerImage makeFlatImage(int width, int height) {
     int rc = 0;
-    context.image.reset(imageCreate(width, height, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
-                                    kDataReal32, &rc));
-    float* p = context.image.pixels();
+    BayerImage image;
+    image.reset(imageCreate(width, height, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
+                            kDataReal32, &rc));
+    float* p = image.pixels();
     for (int y = 0; y < height; ++y)
         for (int x = 0; x < width; ++x)
             p[static_cast<std::size_t>(y) * width + x] = flatField(x, y, width, height);
+    return image;
 }
 
 // The prepared image of a 4000 x 3000 sensor after down-sampling by 4 in
 // each plane, sampled with an angle step of 8 degrees (the default) or finer.
-ProcessingContext collectedContext(int angleStep) {
-    ProcessingContext context;
-    makeFlatImage(context, 1000, 750);
-    context.sampleAngleStep = angleStep;
-    context.procSamplingFactor = 4;
-    context.quiet = true;
+struct Collected {
+    BayerImage levelled;
+    ShadingSettings settings;
+    SampleSet samples;
+};
+Collected collected(int angleStep) {
+    Collected c;
+    c.levelled = makeFlatImage(1000, 750);
+    c.settings.sampleAngleStep = angleStep;
+    c.settings.procSamplingFactor = 4;
+    c.settings.quiet = true;
     std::ostringstream messages;
-    collectSamples(context, messages);
-    return context;
+    c.samples = collectSamples(c.levelled, c.settings, messages);
+    return c;
 }
 
 // The samples of a 4000 x 3000 sensor's full-resolution image (down-sampling
 // 1), with the median over window x window blocks per sample; angle step 8
 // (the default) or 1 (the densest grid).
 void BM_CollectSamples(benchmark::State& state) {
-    ProcessingContext context;
-    makeFlatImage(context, 4000, 3000);
-    context.sampleWindow = static_cast<int>(state.range(0));
-    context.sampleAngleStep = static_cast<int>(state.range(1));
-    context.quiet = true;
+    const BayerImage levelled = makeFlatImage(4000, 3000);
+    ShadingSettings settings;
+    settings.sampleWindow = static_cast<int>(state.range(0));
+    settings.sampleAngleStep = static_cast<int>(state.range(1));
+    settings.quiet = true;
     std::ostringstream messages;
+    std::size_t count = 0;
     for (auto _ : state) {
-        collectSamples(context, messages);
-        benchmark::DoNotOptimize(context.samples.data());
+        const SampleSet samples = collectSamples(levelled, settings, messages);
+        benchmark::DoNotOptimize(samples.samples.data());
+        count = samples.samples.size();
     }
-    state.counters["samples"] = static_cast<double>(context.samples.size());
+    state.counters["samples"] = static_cast<double>(count);
 }
 BENCHMARK(BM_CollectSamples)
     ->ArgsProduct({{1, 5, 15}, {8, 1}})
@@ -72,43 +82,43 @@ BENCHMARK(BM_CollectSamples)
     ->Unit(benchmark::kMillisecond);
 
 void BM_PatchFitOneChannel(benchmark::State& state) {
-    const ProcessingContext collected = collectedContext(8);
+    const Collected c = collected(8);
     const std::vector<double> xBreaks = {0, 250, 750, 1000}, yBreaks = {0, 187, 562, 750};
     std::ostringstream messages;
     for (auto _ : state) {
         patchSurface surface(3, 3, xBreaks, yBreaks);
-        for (const shadingSample& s : collected.samples)
+        for (const shadingSample& s : c.samples.samples)
             surface.addValueConstraint(s.x, s.y, 1.0 / s.value[0]);
         surface.fit(1e-10, messages);
         benchmark::DoNotOptimize(surface.global(5, 5));
     }
-    state.counters["samples"] = static_cast<double>(collected.samples.size());
+    state.counters["samples"] = static_cast<double>(c.samples.samples.size());
 }
 BENCHMARK(BM_PatchFitOneChannel)->Unit(benchmark::kMillisecond);
 
 void BM_FitLensShading(benchmark::State& state) {
-    ProcessingContext context = collectedContext(static_cast<int>(state.range(0)));
-    const std::vector<shadingSample> measured = context.samples;
+    const Collected c = collected(static_cast<int>(state.range(0)));
     std::ostringstream messages;
+    FitDeviations deviations;
     for (auto _ : state) {
-        context.samples = measured; // the fit turns them into gains
-        fitLensShading(context, messages);
-        benchmark::DoNotOptimize(context.controlGrids[0][0]);
+        const FitResult fit =
+            fitLensShading(c.samples, {c.levelled, true}, c.settings, messages, deviations);
+        benchmark::DoNotOptimize(fit.correction.controlGrids[0][0]);
     }
-    state.counters["samples"] = static_cast<double>(measured.size());
+    state.counters["samples"] = static_cast<double>(c.samples.samples.size());
 }
 BENCHMARK(BM_FitLensShading)->Arg(8)->Arg(2)->Unit(benchmark::kMillisecond);
 
 void BM_ApplyLensShading12MP(benchmark::State& state) {
-    ProcessingContext context;
-    makeFlatImage(context, 4000, 3000);
+    const BayerImage image = makeFlatImage(4000, 3000);
+    ShadingCorrection correction;
     for (int k = 0; k < kChannels; ++k)
         for (int i = 0; i < kGridPoints; ++i)
-            context.controlGrids[k][i] = 1.0f + 0.01f * static_cast<float>(i % 13);
-    context.applyStep = static_cast<unsigned>(state.range(0));
+            correction.controlGrids[k][i] = 1.0f + 0.01f * static_cast<float>(i % 13);
+    const auto step = static_cast<unsigned>(state.range(0));
     for (auto _ : state) {
-        applyLensShading(context);
-        benchmark::DoNotOptimize(context.corrected.pixels()[0]);
+        const BayerImage corrected = applyLensShading(image, correction, 0.0f, step);
+        benchmark::DoNotOptimize(corrected.pixels()[0]);
     }
     const double pixels = 4000.0 * 3000.0 / (state.range(0) * state.range(0));
     state.counters["pixels/s"] =

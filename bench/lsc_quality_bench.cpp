@@ -32,10 +32,11 @@
 #include <benchmark/benchmark.h>
 
 #include "image/bayer_image.h"
+#include "lsc/fit_result.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
-#include "lsc/processing_context.h"
 #include "lsc/sample_collection.h"
+#include "lsc/shading_settings.h"
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
@@ -145,29 +146,30 @@ std::vector<double> worstBlockDeviations(const PreparedField& input, F value) {
 
 // The run's fit settings with lsc.sample_window = window; the default error
 // bounds are opened without the median filter so that every window is measured.
-void runSettings(ProcessingContext& context, int window, bool medianFilter) {
-    context.sampleAngleStep = 8;
-    context.procSamplingFactor = 1;
-    context.applyStep = 1;
-    context.sampleWindow = window;
-    context.quiet = true;
+ShadingSettings runSettings(int window, bool medianFilter) {
+    ShadingSettings settings;
+    settings.sampleAngleStep = 8;
+    settings.procSamplingFactor = 1;
+    settings.applyStep = 1;
+    settings.sampleWindow = window;
+    settings.quiet = true;
     if (!medianFilter) {
-        context.maxRmsError = 1.0f;
-        context.maxError = 1.0f;
+        settings.maxRmsError = 1.0f;
+        settings.maxError = 1.0f;
     }
+    return settings;
 }
 
 // The corrected image of one prepared field, as the run corrects it.
-const BayerImage& correctedImage(ProcessingContext& context, const PreparedField& input, int window,
-                                 bool medianFilter) {
+BayerImage correctedImage(const PreparedField& input, int window, bool medianFilter) {
     std::ostringstream messages;
-    runSettings(context, window, medianFilter);
-    context.image.copy(input.prepared);
-    collectSamples(context, messages);
-    fitLensShading(context, messages);
-    context.image.copy(input.prepared); // the correction starts from the prepared image
-    applyLensShading(context);
-    return context.corrected;
+    const ShadingSettings settings = runSettings(window, medianFilter);
+    const BayerImage levelled = levelledImage(input.prepared, settings.blackLevel);
+    const SampleSet samples = collectSamples(levelled, settings, messages);
+    FitDeviations deviations;
+    const FitResult fit = fitLensShading(samples, {levelled, true}, settings, messages, deviations);
+    return applyLensShading(input.prepared, fit.correction, settings.blackLevel,
+                            settings.applyStep);
 }
 
 void BM_FlatnessAfterCorrection(benchmark::State& state) {
@@ -187,14 +189,14 @@ void BM_FlatnessAfterCorrection(benchmark::State& state) {
     for (auto _ : state) {
         for (const PreparedField* input : inputs) {
             const std::size_t width = static_cast<std::size_t>(input->field.shape.width);
-            ProcessingContext context;
-            const float* corrected = nullptr;
+            BayerImage correctedField;
             try {
-                corrected = correctedImage(context, *input, window, medianFilter).pixels();
+                correctedField = correctedImage(*input, window, medianFilter);
             } catch (const std::exception& error) {
                 state.SkipWithError(error.what()); // as the run would end
                 break;
             }
+            const float* corrected = correctedField.pixels();
             const float* prepared = input->prepared.pixels();
             const std::vector<double> seedFlat = worstBlockDeviations(
                 *input, [&](int x, int y) { return corrected[y * width + x]; });

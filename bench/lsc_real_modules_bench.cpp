@@ -38,8 +38,8 @@
 #include <benchmark/benchmark.h>
 
 #include "image/bayer_image.h"
+#include "lsc/fit_result.h"
 #include "lsc/lens_shading_correction.h"
-#include "lsc/processing_context.h"
 #include "tests/support/flat_field.h"
 #include "tests/support/module_shading.h"
 #include "tests/support/temp_dir.h"
@@ -133,11 +133,11 @@ const Capture& capture(const Module& module, int temperature, int seed) {
 }
 
 // Patch factors and control grids of a register file.
-bool readRegisterFile(const std::string& text, ProcessingContext& context) {
+bool readRegisterFile(const std::string& text, ShadingCorrection& correction) {
     const char* factorNames[4] = {"leftPatchFactor", "centerPatchFactor", "topPatchFactor",
                                   "middlePatchFactor"};
-    double* factors[4] = {&context.leftFraction, &context.centerFraction, &context.topFraction,
-                          &context.middleFraction};
+    double* factors[4] = {&correction.layout.left, &correction.layout.center,
+                          &correction.layout.top, &correction.layout.middle};
     for (int i = 0; i < 4; ++i) {
         std::smatch match;
         if (!std::regex_search(
@@ -152,7 +152,7 @@ bool readRegisterFile(const std::string& text, ProcessingContext& context) {
         int found = 0;
         for (auto it = std::sregex_iterator(text.begin(), text.end(), point);
              it != std::sregex_iterator(); ++it, ++found)
-            context.controlGrids[k][std::stoi((*it)[1]) * 10 + std::stoi((*it)[2])] =
+            correction.controlGrids[k][std::stoi((*it)[1]) * 10 + std::stoi((*it)[2])] =
                 std::stof((*it)[3]);
         if (found != 100)
             return false;
@@ -207,20 +207,13 @@ BlockFigures blockFigures(const std::vector<float>& values, int width, int heigh
 }
 
 // The fitted gain at every pixel of the prepared image, as the run corrects it.
-std::vector<float> gainMap(const BayerImage& prepared, const ProcessingContext& fitted) {
-    ProcessingContext context;
-    context.image.copy(prepared);
-    std::fill(context.image.pixels(),
-              context.image.pixels() + std::size_t(prepared.width()) * prepared.height(), 1.0f);
-    context.applyStep = 1;
-    context.leftFraction = fitted.leftFraction;
-    context.centerFraction = fitted.centerFraction;
-    context.topFraction = fitted.topFraction;
-    context.middleFraction = fitted.middleFraction;
-    std::copy(&fitted.controlGrids[0][0], &fitted.controlGrids[0][0] + 400,
-              &context.controlGrids[0][0]);
-    applyLensShading(context);
-    const float* gains = context.corrected.pixels();
+std::vector<float> gainMap(const BayerImage& prepared, const ShadingCorrection& fitted) {
+    BayerImage ones;
+    ones.copy(prepared);
+    std::fill(ones.pixels(), ones.pixels() + std::size_t(prepared.width()) * prepared.height(),
+              1.0f);
+    const BayerImage corrected = applyLensShading(ones, fitted, 0.0f, 1);
+    const float* gains = corrected.pixels();
     return std::vector<float>(gains, gains + std::size_t(prepared.width()) * prepared.height());
 }
 
@@ -261,7 +254,7 @@ void BM_RealModule(benchmark::State& state, const Module& module, int temperatur
                 state.ResumeTiming();
                 continue;
             }
-            ProcessingContext fitted;
+            ShadingCorrection fitted;
             BayerImage prepared;
             prepared.read(input.dir->file("pre.kqraw"));
             if (!readRegisterFile(testing_support::readFile(input.dir->file("cal.txt")), fitted)) {
