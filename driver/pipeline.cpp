@@ -71,8 +71,8 @@ std::pair<float, float> printColourRatios(const char* label, const float (&level
     const float red = levels[0] / green;
     const float blue = levels[3] / green;
     out().precision(6);
-    out() << label << "R/G: " << red << std::endl;
-    out() << label << "B/G: " << blue << std::endl;
+    out() << label << msg::kRedRatio << red << std::endl;
+    out() << label << msg::kBlueRatio << blue << std::endl;
     return {red, blue};
 }
 
@@ -140,66 +140,64 @@ int Pipeline::run(int argc, const char* const argv[]) {
 }
 
 void Pipeline::runStages() {
-    beginStage("Reading the configuration");
+    beginStage(msg::kStageReadingTheConfiguration);
     readConfiguration();
     openMessages();
-    beginStage("Loading the input image");
+    beginStage(msg::kStageLoadingTheInputImage);
     loadInput();
-    beginStage("Checking the input image");
+    beginStage(msg::kStageCheckingTheInputImage);
     decideBitDepth();
     checkSettingsAgainstImage();
     if (!settings_.sensorGuid.empty()) {
         // Stored only in a fixed header, as a 64-bit number: a text that is
         // not one would be stored as 0.
         if (input_.hasFixedHeader() && !img::isHexGuid(settings_.sensorGuid))
-            throw std::invalid_argument("Invalid shared.sensor_guid value '" +
-                                        settings_.sensorGuid +
-                                        "' (a fixed-header raw image stores it as 1 to 16 "
-                                        "hexadecimal digits).");
+            throw std::invalid_argument(msg::kBadSensorGuidPrefix + settings_.sensorGuid +
+                                        msg::kBadSensorGuidSuffix);
         input_.setSensorGuid(settings_.sensorGuid);
     }
     inspectInput();
-    beginStage("Preparing the image");
+    beginStage(msg::kStagePreparingTheImage);
     prepareImage();
-    beginStage("Checking the prepared image");
+    beginStage(msg::kStageCheckingThePreparedImage);
     checkPreparedImage();
     lookForSetUpMistakes();
     writePreparedImage();
     shading_ = readShadingSettings();
     if (shading_.autoPatchLayout) {
-        beginStage("Choosing the patch layout");
+        beginStage(msg::kStageChoosingThePatchLayout);
         shading_.layout = choosePatchLayout();
     }
     FitResult fit;
     {
-        beginStage("Obtaining the samples");
+        beginStage(msg::kStageObtainingTheSamples);
         const SamplesTaken samples = obtainSamples();
-        beginStage("Fitting the lens shading surface");
+        beginStage(msg::kStageFittingTheLensShadingSurface);
         fit = fitSurface(samples);
     } // the levelled image the samples were measured on is released here
-    beginStage("Writing the calibration register file");
+    beginStage(msg::kStageWritingTheCalibrationRegisterFile);
     writeRegisterFile(fit);
     // The correction as stored in the binary data, when they are written.
     ShadingCorrection correction = fit.correction;
     if (!settings_.binary.empty()) {
-        beginStage("Binary calibration data");
+        beginStage(msg::kStageBinaryCalibrationData);
         correction = writeBinaryData(fit);
     }
-    beginStage("Correcting the lens shading");
+    beginStage(msg::kStageCorrectingTheLensShading);
     BayerImage flattened = correct(correction);
-    beginStage("White balance");
+    beginStage(msg::kStageWhiteBalance);
     balanceWhite(flattened, fit);
     // Before delta ab, which turns the flattened image into display values.
     const std::optional<float> lumaResidual = measureLuminance(flattened);
-    beginStage("Delta ab");
+    beginStage(msg::kStageDeltaAb);
     measureColourError(flattened);
     // After delta ab, so that its files are written for a failed run too.
-    beginStage("Luminance residual");
+    beginStage(msg::kStageLuminanceResidual);
     prep::checkLuminanceResidual(lumaResidual, shading_.maxLumaResidual);
-    beginStage("Writing the flattened images");
+    beginStage(msg::kStageWritingTheFlattenedImages);
     writeFlattenedImages(std::move(flattened));
     if (!checkPath_.empty()) {
-        beginStage("Writing the check image");
+        beginStage(msg::kStageWritingTheCheckImage);
         writeCheck(correction, fit);
     }
 }
@@ -229,7 +227,7 @@ void Pipeline::recordFailure() {
 void Pipeline::writeReport() {
     if (reportPath_.empty())
         return;
-    out() << "Writing calibration report." << std::endl;
+    out() << msg::kProgressWritingCalibrationReport << std::endl;
     writeRunReport(reportPath_, report_);
     noteOutput("report", reportPath_);
 }
@@ -237,7 +235,7 @@ void Pipeline::writeReport() {
 void Pipeline::writeResult() {
     if (resultPath_.empty())
         return;
-    out() << "Writing run result." << std::endl;
+    out() << msg::kProgressWritingRunResult << std::endl;
     writeRunResult(resultPath_, report_);
 }
 
@@ -252,8 +250,8 @@ void Pipeline::readConfiguration() {
     settings_.debug = config_->find_path("proc.debug").as_bool() || commandLine_.given("debug");
     timer_.enabled = settings_.debug;
     if (settings_.debug)
-        out() << "Start: " << boost::posix_time::to_simple_string(startTime_) << std::endl;
-    timerLine(timer_, "Reading configuration: ", out());
+        out() << msg::kStartLabel << boost::posix_time::to_simple_string(startTime_) << std::endl;
+    timerLine(timer_, msg::kTimerReadingConfiguration, out());
 
     // The median work area holds at most 100 distinct values of a window.
     if (config_->find_path("proc.median_filter_size").as_int() > 10)
@@ -271,9 +269,9 @@ void Pipeline::openMessages() {
         warn(text);
     if (settings_.input.empty())
         throw std::runtime_error(msg::kNoInput);
-    timerLine(timer_, "Processes configuration: ", out());
+    timerLine(timer_, msg::kTimerProcessesConfiguration, out());
     for (const std::string& frame : frames_)
-        out() << "Input file: " << frame << std::endl;
+        out() << msg::kInputFileLabel << frame << std::endl;
 }
 
 void Pipeline::saveIfAsked(const char* option, const std::string& path, const char* message,
@@ -357,23 +355,22 @@ void Pipeline::loadInput() {
         }
     }
     if (frames_.size() > 1)
-        out() << "Input frames averaged: " << frames_.size() << std::endl;
-    timerLine(timer_, "Image load time: ", out());
-    saveIfAsked("inputasjpeg", settings_.inputAsJpeg, "Saving raw input file in jpeg format.",
-                "JPEG image save time: ", [&](const std::string& path) {
-                    input_.storeJpeg(path, settings_.jpegQuality);
-                });
-    saveIfAsked("inputasbmp", settings_.inputAsBmp, "Saving raw input file in bmp format.",
-                "BMP image save time: ", [&](const std::string& path) { input_.storeBmp(path); });
+        out() << msg::kFramesAveragedLabel << frames_.size() << std::endl;
+    timerLine(timer_, msg::kTimerImageLoadTime, out());
+    saveIfAsked("inputasjpeg", settings_.inputAsJpeg, msg::kProgressSavingRawInputFileInJpegFormat,
+                msg::kTimerJPEGImageSaveTime,
+                [&](const std::string& path) { input_.storeJpeg(path, settings_.jpegQuality); });
+    saveIfAsked("inputasbmp", settings_.inputAsBmp, msg::kProgressSavingRawInputFileInBmpFormat,
+                msg::kTimerBMPImageSaveTime,
+                [&](const std::string& path) { input_.storeBmp(path); });
 }
 
 void Pipeline::decideBitDepth() {
     const int imageBits = input_.bitsPerSample();
     depth_ = settings_.bitRes == 0 ? imageBits : settings_.bitRes;
     if (settings_.bitRes != 0 && settings_.bitRes != imageBits)
-        out() << "WARNING - Bit depth of input image (" << imageBits
-              << ") is different than bit depth specified by shared.bit_res (" << settings_.bitRes
-              << ")." << std::endl;
+        out() << msg::kBitDepthDiffersPrefix << imageBits << msg::kBitDepthDiffersMiddle
+              << settings_.bitRes << msg::kBitDepthDiffersSuffix << std::endl;
     fullScale_ = prep::fullScale(depth_);
 
     report_.haveInput = true;
@@ -423,7 +420,7 @@ void Pipeline::checkSettingsAgainstImage() {
 
 void Pipeline::inspectInput() {
     if (settings_.debug) {
-        out() << "Input image data:" << std::endl;
+        out() << msg::kProgressInputImageData << std::endl;
         if (input_.hasSamples())
             prep::writeStatistics(input_, depth_, out());
         else
@@ -431,10 +428,11 @@ void Pipeline::inspectInput() {
         out() << std::endl;
     }
     out().precision(3);
-    out() << "Exposure time = " << input_.exposureTime() << std::endl;
-    out() << "Sensor gain = { " << input_.channelGain(0) << ", " << input_.channelGain(1) << ", "
-          << input_.channelGain(2) << ", " << input_.channelGain(3) << " }" << std::endl;
-    timerLine(timer_, "Image inspection time: ", out());
+    out() << msg::kExposureTimeLabel << input_.exposureTime() << std::endl;
+    out() << msg::kSensorGainPrefix << input_.channelGain(0) << msg::kListSeparator
+          << input_.channelGain(1) << msg::kListSeparator << input_.channelGain(2)
+          << msg::kListSeparator << input_.channelGain(3) << msg::kSensorGainSuffix << std::endl;
+    timerLine(timer_, msg::kTimerImageInspectionTime, out());
 }
 
 void Pipeline::prepareImage() {
@@ -442,17 +440,17 @@ void Pipeline::prepareImage() {
     // planes are never held at full resolution. The three timer lines stay;
     // the split's and the weave's work is counted in the filter's line.
     // A capture prepared while it was read is counted in the load's line.
-    timerLine(timer_, "Bayer deinterweave time: ", out());
+    timerLine(timer_, msg::kTimerBayerDeinterweaveTime, out());
     if (!preparedWhileLoading_)
         prepared_ = prep::prepareMosaic(input_, preparation());
-    timerLine(timer_, "Median filter and down sampling time: ", out());
+    timerLine(timer_, msg::kTimerMedianFilterAndDownSamplingTime, out());
 
     // The prepared image keeps the input's capture data, so it is stored in
     // the input's raw format.
     prepared_.copyMetadata(input_);
-    timerLine(timer_, "Bayer interweave time: ", out());
+    timerLine(timer_, msg::kTimerBayerInterweaveTime, out());
 
-    out() << "Preprocessed image data:" << std::endl;
+    out() << msg::kProgressPreprocessedImageData << std::endl;
     prep::writeStatistics(prepared_, depth_, out());
     out() << std::endl;
 }
@@ -483,25 +481,25 @@ void Pipeline::lookForSetUpMistakes() {
     const prep::PedestalEvidence pedestal = noise_.evidence();
     const double tolerance = std::max(2.0, prep::kPedestalTolerance * fullScale_);
     if (pedestal.measured && pedestal.lowerBound > blackLevel + tolerance)
-        warn("The noise of the capture shows a black level of at least " +
+        warn(msg::kPedestalPrefix +
              std::to_string(static_cast<long long>(std::floor(pedestal.lowerBound))) +
-             ", but proc.black_level is " + std::to_string(static_cast<long long>(blackLevel)) +
-             ": the pedestal left in the samples under-corrects the corners.");
+             msg::kPedestalMiddle + std::to_string(static_cast<long long>(blackLevel)) +
+             msg::kPedestalSuffix);
 }
 
 void Pipeline::warn(const std::string& text) {
-    out() << "WARNING: " << text << std::endl;
+    out() << msg::kWarningPrefix << text << std::endl;
     report_.warnings.push_back(text);
 }
 
 void Pipeline::writePreparedImage() {
     if (settings_.preproc.empty())
         return;
-    out() << "Preprocessed image file: " << settings_.preproc << std::endl;
+    out() << msg::kPreprocessedFileLabel << settings_.preproc << std::endl;
     prepared_.storeKqraw(settings_.preproc);
     noteOutput("preproc", settings_.preproc);
     if (identityTest()) {
-        out() << "Performing identity test." << std::endl;
+        out() << msg::kProgressPerformingIdentityTest << std::endl;
         BayerImage stored;
         stored.read(settings_.preproc);
         if (!stored.samePixels(input_))
@@ -519,7 +517,7 @@ ShadingSettings Pipeline::readShadingSettings() {
         report_.shadingBefore = reportBlockMeans(prepared_);
         scaleToPeak(report_.shadingBefore, shading.blackLevel);
     }
-    timerLine(timer_, "Image checking time: ", out());
+    timerLine(timer_, msg::kTimerImageCheckingTime, out());
     return shading;
 }
 
@@ -527,7 +525,7 @@ Pipeline::SamplesTaken Pipeline::obtainSamples() {
     const prep::SampleFileScale scale{prep::sampleFullScale(depth_), shading_.procSamplingFactor};
     SamplesTaken taken;
     if (settings_.samples.empty()) {
-        out() << "Create samples from image." << std::endl;
+        out() << msg::kProgressCreateSamplesFromImage << std::endl;
         taken.measuredOn = levelledImage(prepared_, shading_.blackLevel);
         taken.set = collectSamples(taken.measuredOn, shading_, out());
         taken.fromImage = true;
@@ -536,28 +534,26 @@ Pipeline::SamplesTaken Pipeline::obtainSamples() {
             noteOutput("outsamples", settings_.outSamples);
         }
     } else {
-        out() << "Loading sample points from file." << std::endl;
+        out() << msg::kProgressLoadingSamplePointsFromFile << std::endl;
         taken.set = prep::readSampleFile(settings_.samples, prepared_, scale);
     }
     return taken;
 }
 
 FitResult Pipeline::fitSurface(const SamplesTaken& samples) {
-    out() << "Computing lens shading surface." << std::endl;
+    out() << msg::kProgressComputingLensShadingSurface << std::endl;
     const SampleOrigin origin{samples.fromImage ? samples.measuredOn : prepared_,
                               samples.fromImage};
     FitResult fit = fitLensShading(samples.set, origin, shading_, out(), deviations_);
-    const auto ratios = printColourRatios("Measured ", fit.targetLevels);
+    const auto ratios = printColourRatios(msg::kMeasuredLabel, fit.targetLevels);
     report_.measuredRatios[0] = ratios.first;
     report_.measuredRatios[1] = ratios.second;
     if (settings_.xtest) {
-        out() << "X test mode specified." << std::endl;
-        out() << "Forcing lens shading surface to produce an X shaped color distortion."
-              << std::endl;
+        out() << msg::kProgressXTestModeSpecified << std::endl;
+        out() << msg::kProgressXTestSurface << std::endl;
         applyXTestSurface(fit.correction);
         report_.xtest = true;
-        warn("X-test run: the register file holds a test surface that distorts the colours on "
-             "purpose, not a calibration of this module.");
+        warn(msg::kXTestWarning);
     }
     report_.samplePoints.clear();
     for (const shadingSample& sample : samples.set.samples)
@@ -593,13 +589,13 @@ void Pipeline::recordFitError() {
 
 void Pipeline::writeRegisterFile(const FitResult& fit) {
     if (!settings_.calibrate.empty()) {
-        out() << "Generating configuration file." << std::endl;
+        out() << msg::kProgressGeneratingConfigurationFile << std::endl;
         registerText_ = write_register_file(settings_.calibrate, *config_, settings_.blockName,
                                             settings_.controlPointInfix,
                                             commandLine_.argumentsText(), fit, input_);
         noteOutput("calibrate", settings_.calibrate);
     }
-    timerLine(timer_, "Lens shading calculation time: ", out());
+    timerLine(timer_, msg::kTimerLensShadingCalculationTime, out());
 }
 
 // The calibration is read from the register text this run wrote and the
@@ -607,16 +603,16 @@ void Pipeline::writeRegisterFile(const FitResult& fit) {
 // paths they could be another run's files written over ours in the meantime,
 // or a device or pipe that gives nothing back (/dev/null, /dev/stdout).
 ShadingCorrection Pipeline::writeBinaryData(const FitResult& fit) {
-    out() << "Reading calibration data." << std::endl;
+    out() << msg::kProgressReadingCalibrationData << std::endl;
     parse_config_text(registerText_, *config_);
     if (!settings_.autofocus.empty()) {
-        out() << "Reading autofocus calibration data." << std::endl;
+        out() << msg::kProgressReadingAutofocusCalibrationData << std::endl;
         readAutofocusFile(settings_.autofocus, *config_);
     }
     const blob::BlobSources sources = blob::blobSourcesFromConfig(*config_);
-    timerLine(timer_, "Read calibration time: ", out());
+    timerLine(timer_, msg::kTimerReadCalibrationTime, out());
 
-    out() << "Generating binary calibration data." << std::endl;
+    out() << msg::kProgressGeneratingBinaryCalibrationData << std::endl;
     const std::vector<std::uint8_t> bytes = blob::generateBlob(sources, kBlobToolVersion, out());
     if (config_->find_path("blob.log_flag").as_bool()) {
         config_node_impl scratch("root");
@@ -628,43 +624,43 @@ ShadingCorrection Pipeline::writeBinaryData(const FitResult& fit) {
         if (!std::cout)
             throw std::runtime_error(msg::kCannotWriteDump);
     }
-    timerLine(timer_, "Binary data construction time: ", out());
+    timerLine(timer_, msg::kTimerBinaryDataConstructionTime, out());
 
     if (!writeWholeFile(settings_.binary, bytes.data(), bytes.size()))
         throw std::runtime_error(msg::kCannotStoreBinary);
     noteOutput("binary", settings_.binary);
-    timerLine(timer_, "Binary data save time: ", out());
+    timerLine(timer_, msg::kTimerBinaryDataSaveTime, out());
 
-    out() << "Reading binary calibration data." << std::endl;
+    out() << msg::kProgressReadingBinaryCalibrationData << std::endl;
     const std::vector<std::uint8_t>& stored = bytes;
-    timerLine(timer_, "Binary data reading time: ", out());
+    timerLine(timer_, msg::kTimerBinaryDataReadingTime, out());
     config_node_impl storedRoot("root");
     config_node& data = storedRoot.child("module").child("lsc");
     blob::parseBlob(stored.data(), stored.size(), data, storedRoot.child("config"));
-    timerLine(timer_, "Binary data parsing time: ", out());
+    timerLine(timer_, msg::kTimerBinaryDataParsingTime, out());
     // From here on the correction uses the control points as stored.
     const StoredCalibration calibration = readConfigParam(*root_, data, prepared_, fit.correction);
     recordFit(calibration.correction, fit.targetLevels);
-    timerLine(timer_, "Binary data transfer time: ", out());
+    timerLine(timer_, msg::kTimerBinaryDataTransferTime, out());
     return calibration.correction;
 }
 
 BayerImage Pipeline::correct(const ShadingCorrection& correction) {
-    out() << "Start correcting lens shading." << std::endl;
+    out() << msg::kProgressStartCorrectingLensShading << std::endl;
     BayerImage corrected =
         applyLensShading(prepared_, correction, shading_.blackLevel, shading_.applyStep);
-    timerLine(timer_, "Apply lens shading time: ", out());
+    timerLine(timer_, msg::kTimerApplyLensShadingTime, out());
     return corrected;
 }
 
 void Pipeline::balanceWhite(BayerImage& flattened, const FitResult& fit) {
-    out() << "Performing white balancing." << std::endl;
+    out() << msg::kProgressPerformingWhiteBalancing << std::endl;
     float balance[kChannels];
     prep::balanceLevels(fit.targetLevels, flattened, balance);
     prep::whiteBalance(flattened, balance);
     float levels[kChannels];
     prep::measureLevels(levels, flattened, shading_.awbFilterSize, shading_.procSamplingFactor);
-    const auto ratios = printColourRatios("Flattened image measured ", levels);
+    const auto ratios = printColourRatios(msg::kFlattenedMeasuredLabel, levels);
     report_.haveWhiteBalance = true;
     report_.flattenedRatios[0] = ratios.first;
     report_.flattenedRatios[1] = ratios.second;
@@ -673,15 +669,15 @@ void Pipeline::balanceWhite(BayerImage& flattened, const FitResult& fit) {
         report_.residualAfter = reportBlockMeans(flattened);
         deviationFromMean(report_.residualAfter);
     }
-    timerLine(timer_, "White balance time: ", out());
+    timerLine(timer_, msg::kTimerWhiteBalanceTime, out());
 }
 
 void Pipeline::measureColourError(BayerImage& flattened) {
     if (settings_.avgLuma == 1 || settings_.noDelta || settings_.xtest)
         return;
-    out() << "Calculating deltaAB." << std::endl;
-    out() << "Delta ab blocks: " << shading_.deltaAbBlocks[0] << " x " << shading_.deltaAbBlocks[1]
-          << std::endl;
+    out() << msg::kProgressCalculatingDeltaAB << std::endl;
+    out() << msg::kDeltaBlocksLabel << shading_.deltaAbBlocks[0] << msg::kBlocksBy
+          << shading_.deltaAbBlocks[1] << std::endl;
     const prep::DeltaAbResult delta = prep::evaluateDeltaAb(flattened, shading_);
     report_.haveDelta = true;
     report_.deltaColumns = delta.columns;
@@ -692,18 +688,18 @@ void Pipeline::measureColourError(BayerImage& flattened) {
     report_.meanChroma = delta.meanChroma;
     report_.deltaStdDev = delta.deltaStdDev;
     if (!settings_.delta.empty()) {
-        out() << "Writing delta ab data." << std::endl;
+        out() << msg::kProgressWritingDeltaAbData << std::endl;
         prep::writeDeltaFile(settings_.delta, delta);
         noteOutput("delta", settings_.delta);
     }
     out().precision(6);
-    out() << "Maximum delta ab: " << delta.maxDelta << std::endl;
+    out() << msg::kMaximumDeltaLabel << delta.maxDelta << std::endl;
     if (!settings_.stats.empty()) {
         prep::writeStatsFile(settings_.stats, delta);
         noteOutput("stats", settings_.stats);
     }
     prep::checkDeltaThreshold(delta.maxDelta, shading_.maxDeltaAb);
-    timerLine(timer_, "Calculate delta ab time: ", out());
+    timerLine(timer_, msg::kTimerCalculateDeltaAbTime, out());
 }
 
 // The samples, the fit, the register file and the binary data then use the
@@ -727,9 +723,9 @@ PatchLayout Pipeline::choosePatchLayout() {
             lsc.child(key).set(number);
         text += std::string(text.empty() ? "" : ", ") + key + " " + number;
     }
-    out() << "Patch layout: " << text << " (the flattest of " << choice.candidates << ")"
-          << std::endl;
-    timerLine(timer_, "Patch layout time: ", out());
+    out() << msg::kPatchLayoutLabel << text << msg::kPatchLayoutCandidatesPrefix
+          << choice.candidates << msg::kPatchLayoutCandidatesSuffix << std::endl;
+    timerLine(timer_, msg::kTimerPatchLayoutTime, out());
     return layout;
 }
 
@@ -741,7 +737,7 @@ std::optional<float> Pipeline::measureLuminance(const BayerImage& balanced) {
     // Only runs that set the bound print the figure, so that every other
     // run's output stays as it was.
     if (shading_.maxLumaResidual > 0.0f && residual)
-        out() << "Maximum luminance residual: " << fixedText(100.0 * *residual, 2) << " %"
+        out() << msg::kMaximumLumaLabel << fixedText(100.0 * *residual, 2) << msg::kPerCent
               << std::endl;
     return residual;
 }
@@ -751,34 +747,31 @@ void Pipeline::writeFlattenedImages(BayerImage flattened) {
     if (settings_.flat.empty() && settings_.jpeg.empty() && settings_.bmp.empty())
         return;
     flattened.copyMetadata(input_);
-    saveIfAsked("flat", settings_.flat, "Writing flattened image.",
-                "Flattened raw image save time: ", [&](const std::string& path) {
-                    flattened.storeKqraw(path);
-                });
-    saveIfAsked("jpeg", settings_.jpeg, "Writing flattened jpeg image.",
-                "Flattened JPEG image save time: ", [&](const std::string& path) {
-                    flattened.storeJpeg(path, settings_.jpegQuality);
-                });
-    saveIfAsked("bmp", settings_.bmp, "Writing flattened bmp image.",
-                "Flattened BMP image save time: ", [&](const std::string& path) {
-                    flattened.storeBmp(path);
-                });
+    saveIfAsked("flat", settings_.flat, msg::kProgressWritingFlattenedImage,
+                msg::kTimerFlattenedRawImageSaveTime,
+                [&](const std::string& path) { flattened.storeKqraw(path); });
+    saveIfAsked("jpeg", settings_.jpeg, msg::kProgressWritingFlattenedJpegImage,
+                msg::kTimerFlattenedJPEGImageSaveTime,
+                [&](const std::string& path) { flattened.storeJpeg(path, settings_.jpegQuality); });
+    saveIfAsked("bmp", settings_.bmp, msg::kProgressWritingFlattenedBmpImage,
+                msg::kTimerFlattenedBMPImageSaveTime,
+                [&](const std::string& path) { flattened.storeBmp(path); });
 }
 
 // Last: it takes the capture's samples, which nothing needs after it.
 void Pipeline::writeCheck(const ShadingCorrection& correction, const FitResult& fit) {
-    out() << "Writing full-resolution check image." << std::endl;
+    out() << msg::kProgressWritingFullResolutionCheckImage << std::endl;
     writeCheckImage(checkPath_, std::move(input_), correction, shading_.blackLevel,
                     fit.targetLevels);
     noteOutput("check", checkPath_);
-    timerLine(timer_, "Check image save time: ", out());
+    timerLine(timer_, msg::kTimerCheckImageSaveTime, out());
 }
 
 void Pipeline::finish() {
     if (settings_.debug)
-        out() << "Execution time:"
+        out() << msg::kExecutionTimeLabel
               << boost::posix_time::to_simple_string(
                      boost::posix_time::microsec_clock::local_time() - startTime_)
               << std::endl;
-    out() << "Completed." << std::endl;
+    out() << msg::kProgressCompleted << std::endl;
 }
