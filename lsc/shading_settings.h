@@ -34,10 +34,10 @@ struct ShadingSettings {
     bool quiet = false;           // --quiet: no progress lines from the fit
 
     // Correction and evaluation
-    unsigned applyStep = 1;         // apply_lsc.sampling_factor
-    float maxDeltaAb = 10.0f;       // apply_lsc.max_delta_ab
-    float maxLumaResidual = 0.0f;   // apply_lsc.max_luma_residual, per cent; 0: no bound
+    unsigned applyStep = 1;       // apply_lsc.sampling_factor
+    float maxDeltaAb = 10.0f;     // apply_lsc.max_delta_ab
+    float maxLumaResidual = 0.0f; // apply_lsc.max_luma_residual, per cent; 0: no bound
     float lumaNormalizeFactor = 0.75f;
-    int deltaAbBlocks[2] = {0, 0};  // horizontal, vertical
+    int deltaAbBlocks[2] = {0, 0}; // horizontal, vertical
     float ccm[3][3] = {{1, 0, 0}, {0, 1, 0}, {0, 0, 1}};
 };
