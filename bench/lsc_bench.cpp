@@ -120,7 +120,7 @@ void BM_ApplyLensShading12MP(benchmark::State& state) {
         const BayerImage corrected = applyLensShading(image, correction, 0.0f, step);
         benchmark::DoNotOptimize(corrected.pixels()[0]);
     }
-    const double pixels = 4000.0 * 3000.0 / (state.range(0) * state.range(0));
+    const double pixels = 4000.0 * 3000.0 / static_cast<double>(state.range(0) * state.range(0));
     state.counters["pixels/s"] =
         benchmark::Counter(pixels, benchmark::Counter::kIsIterationInvariantRate);
 }

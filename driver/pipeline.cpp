@@ -25,9 +25,6 @@
 #include "driver/headerless_raw.h"
 #include "driver/input_frames.h"
 #include "driver/output_stream.h"
-#include "driver/report_data.h"
-#include "driver/run_report_html.h"
-#include "driver/run_result_json.h"
 #include "driver/unknown_settings.h"
 #include "driver/version.h"
 #include "image/bayer_phase.h"
@@ -47,6 +44,9 @@
 #include "prep/mosaic_preparation.h"
 #include "prep/sample_file.h"
 #include "prep/white_balance.h"
+#include "report/run_report_html.h"
+#include "report/run_result_json.h"
+#include "report/stage_records.h"
 
 namespace {
 
@@ -91,12 +91,6 @@ std::string generalText(double value) {
     const auto result =
         std::to_chars(buffer, buffer + sizeof buffer, value, std::chars_format::general, 6);
     return result.ec == std::errc() ? std::string(buffer, result.ptr) : "?";
-}
-
-// The report's block grid: 16 blocks along the longer side, about square.
-ChannelBlockMeans reportBlockMeans(const BayerImage& image) {
-    const BlockGrid grid = blockGridFor(image.width(), image.height(), 16);
-    return blockMeans(image, grid.columns, grid.rows);
 }
 
 } // namespace
@@ -373,18 +367,8 @@ void Pipeline::decideBitDepth() {
               << settings_.bitRes << msg::kBitDepthDiffersSuffix << std::endl;
     fullScale_ = prep::fullScale(depth_);
 
-    report_.haveInput = true;
-    report_.inputPath = settings_.input;
-    report_.width = input_.width();
-    report_.height = input_.height();
-    report_.bayerOrder = cfaPatternName(input_.cfa());
-    report_.bitDepth = depth_;
-    report_.exposureTime = input_.exposureTime();
-    report_.framesAveraged = static_cast<int>(frames_.size());
-    report_.serialNumber = input_.serialNumber(32);
-    report_.inspectionInFixedNotation = settings_.debug;
-    for (int channel = 0; channel < kChannels; ++channel)
-        report_.gains[channel] = input_.channelGain(channel);
+    recordInput(report_, input_, settings_.input, depth_, static_cast<int>(frames_.size()),
+                settings_.debug);
 }
 
 void Pipeline::checkSettingsAgainstImage() {
@@ -510,13 +494,7 @@ void Pipeline::writePreparedImage() {
 ShadingSettings Pipeline::readShadingSettings() {
     ShadingSettings shading = load_fit_settings(*config_, input_);
     shading.quiet = settings_.quiet;
-    report_.havePrepared = true;
-    report_.preparedWidth = prepared_.width();
-    report_.preparedHeight = prepared_.height();
-    if (!reportPath_.empty()) {
-        report_.shadingBefore = reportBlockMeans(prepared_);
-        scaleToPeak(report_.shadingBefore, shading.blackLevel);
-    }
+    recordPrepared(report_, prepared_, shading.blackLevel, !reportPath_.empty());
     timerLine(timer_, msg::kTimerImageCheckingTime, out());
     return shading;
 }
@@ -546,8 +524,7 @@ FitResult Pipeline::fitSurface(const SamplesTaken& samples) {
                               samples.fromImage};
     FitResult fit = fitLensShading(samples.set, origin, shading_, out(), deviations_);
     const auto ratios = printColourRatios(msg::kMeasuredLabel, fit.targetLevels);
-    report_.measuredRatios[0] = ratios.first;
-    report_.measuredRatios[1] = ratios.second;
+    recordMeasuredRatios(report_, ratios.first, ratios.second);
     if (settings_.xtest) {
         out() << msg::kProgressXTestModeSpecified << std::endl;
         out() << msg::kProgressXTestSurface << std::endl;
@@ -555,36 +532,15 @@ FitResult Pipeline::fitSurface(const SamplesTaken& samples) {
         report_.xtest = true;
         warn(msg::kXTestWarning);
     }
-    report_.samplePoints.clear();
-    for (const shadingSample& sample : samples.set.samples)
-        report_.samplePoints.emplace_back(sample.x, sample.y);
-    recordFit(fit.correction, fit.targetLevels);
-    return fit;
-}
-
-void Pipeline::recordFit(const ShadingCorrection& correction,
-                         const float (&targetLevels)[kChannels]) {
-    report_.haveFit = true;
-    const PatchLayout& layout = correction.layout;
-    report_.fractions[0] = layout.left;
-    report_.fractions[1] = layout.center;
-    report_.fractions[2] = layout.top;
-    report_.fractions[3] = layout.middle;
-    std::copy(&correction.controlGrids[0][0],
-              &correction.controlGrids[0][0] + kChannels * kGridPoints,
-              &report_.controlGrids[0][0]);
-    std::copy(targetLevels, targetLevels + kChannels, report_.targetLevels);
+    recordSamples(report_, samples.set);
+    recordFit(report_, fit.correction, fit.targetLevels);
     recordFitError();
+    return fit;
 }
 
 // Also after a failed fit: the deviations show why a bound ended the run.
 void Pipeline::recordFitError() {
-    report_.maxRmsBound = shading_.maxRmsError;
-    report_.maxErrorBound = shading_.maxError;
-    report_.maxGain = shading_.maxGain;
-    report_.haveFitError = deviations_.measured;
-    std::copy(deviations_.max, deviations_.max + kChannels, report_.deviationMax);
-    std::copy(deviations_.rms, deviations_.rms + kChannels, report_.deviationRms);
+    recordDeviations(report_, deviations_, shading_);
 }
 
 void Pipeline::writeRegisterFile(const FitResult& fit) {
@@ -640,7 +596,8 @@ ShadingCorrection Pipeline::writeBinaryData(const FitResult& fit) {
     timerLine(timer_, msg::kTimerBinaryDataParsingTime, out());
     // From here on the correction uses the control points as stored.
     const StoredCalibration calibration = readConfigParam(*root_, data, prepared_, fit.correction);
-    recordFit(calibration.correction, fit.targetLevels);
+    recordFit(report_, calibration.correction, fit.targetLevels);
+    recordFitError();
     timerLine(timer_, msg::kTimerBinaryDataTransferTime, out());
     return calibration.correction;
 }
@@ -661,14 +618,7 @@ void Pipeline::balanceWhite(BayerImage& flattened, const FitResult& fit) {
     float levels[kChannels];
     prep::measureLevels(levels, flattened, shading_.awbFilterSize, shading_.procSamplingFactor);
     const auto ratios = printColourRatios(msg::kFlattenedMeasuredLabel, levels);
-    report_.haveWhiteBalance = true;
-    report_.flattenedRatios[0] = ratios.first;
-    report_.flattenedRatios[1] = ratios.second;
-    if (!reportPath_.empty()) {
-        report_.haveResidual = true;
-        report_.residualAfter = reportBlockMeans(flattened);
-        deviationFromMean(report_.residualAfter);
-    }
+    recordWhiteBalance(report_, ratios.first, ratios.second, flattened, !reportPath_.empty());
     timerLine(timer_, msg::kTimerWhiteBalanceTime, out());
 }
 
@@ -679,14 +629,7 @@ void Pipeline::measureColourError(BayerImage& flattened) {
     out() << msg::kDeltaBlocksLabel << shading_.deltaAbBlocks[0] << msg::kBlocksBy
           << shading_.deltaAbBlocks[1] << std::endl;
     const prep::DeltaAbResult delta = prep::evaluateDeltaAb(flattened, shading_);
-    report_.haveDelta = true;
-    report_.deltaColumns = delta.columns;
-    report_.deltaRows = delta.rows;
-    report_.delta = delta.deltaImage;
-    report_.threshold = shading_.maxDeltaAb;
-    report_.maxDelta = delta.maxDelta;
-    report_.meanChroma = delta.meanChroma;
-    report_.deltaStdDev = delta.deltaStdDev;
+    recordDeltaAb(report_, delta, shading_.maxDeltaAb);
     if (!settings_.delta.empty()) {
         out() << msg::kProgressWritingDeltaAbData << std::endl;
         prep::writeDeltaFile(settings_.delta, delta);
@@ -731,9 +674,7 @@ PatchLayout Pipeline::choosePatchLayout() {
 
 std::optional<float> Pipeline::measureLuminance(const BayerImage& balanced) {
     const std::optional<float> residual = prep::luminanceResidual(balanced, shading_);
-    report_.haveLuma = residual.has_value();
-    report_.lumaResidual = residual.value_or(-1.0f);
-    report_.lumaBound = shading_.maxLumaResidual;
+    recordLuminance(report_, residual, shading_.maxLumaResidual);
     // Only runs that set the bound print the figure, so that every other
     // run's output stays as it was.
     if (shading_.maxLumaResidual > 0.0f && residual)

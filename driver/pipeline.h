@@ -14,7 +14,6 @@
 
 #include "config/config_node.h"
 #include "driver/command_line.h"
-#include "driver/run_report.h"
 #include "driver/run_settings.h"
 #include "driver/stage_timer.h"
 #include "image/bayer_image.h"
@@ -24,6 +23,7 @@
 #include "prep/capture_evidence.h"
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
+#include "report/run_report.h"
 
 class Pipeline {
 public:
@@ -63,7 +63,6 @@ private:
     };
     SamplesTaken obtainSamples();
     FitResult fitSurface(const SamplesTaken& samples);
-    void recordFit(const ShadingCorrection& correction, const float (&targetLevels)[kChannels]);
     void recordFitError();
     void writeRegisterFile(const FitResult& fit);
     // Returns the correction as the binary data store it.

@@ -1,10 +1,10 @@
-#include "driver/run_result_json.h"
+#include "report/run_result_json.h"
 
 #include <charconv>
 #include <stdexcept>
 
-#include "driver/report_data.h"
 #include "image/output_file.h"
+#include "report/report_data.h"
 
 #include <nlohmann/json.hpp>
 #include <sys/stat.h>

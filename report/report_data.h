@@ -7,9 +7,9 @@
 #include <cstdint>
 #include <vector>
 
-#include "driver/run_report.h"
 #include "image/bayer_image.h"
 #include "lsc/patch_geometry.h"
+#include "report/run_report.h"
 
 // Block counts for a width x height image: `longSide` blocks along the longer
 // side and as many along the other as keep the blocks about square (at least 1).

@@ -1,13 +1,13 @@
-#include "driver/report_data.h"
+#include "report/report_data.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
 #include <stdexcept>
 
-#include "driver/report_messages.h"
 #include "image/bayer_phase.h"
 #include "lsc/eval_patch.h"
+#include "report/report_messages.h"
 
 namespace {
 

@@ -1,11 +1,11 @@
-#include "driver/report_svg.h"
+#include "report/report_svg.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
 #include <vector>
 
-#include "driver/report_text.h"
+#include "report/report_text.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 
 #include <gtest/gtest.h>
 
-#include "driver/report_svg.h"
+#include "report/report_svg.h"
 
 namespace {
 

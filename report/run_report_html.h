@@ -7,7 +7,7 @@
 
 #include <string>
 
-#include "driver/run_report.h"
+#include "report/run_report.h"
 
 // The whole page.
 std::string runReportHtml(const RunReport& report);

@@ -7,7 +7,7 @@
 #include <cmath>
 #include <cstdint>
 
-#include "driver/run_report.h"
+#include "report/run_report.h"
 
 namespace report_test {
 

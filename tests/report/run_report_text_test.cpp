@@ -4,7 +4,7 @@
 
 #include <gtest/gtest.h>
 
-#include "driver/report_text.h"
+#include "report/report_text.h"
 
 namespace {
 

@@ -1,8 +1,8 @@
-#include "driver/report_figures.h"
+#include "report/report_figures.h"
 
 #include <algorithm>
 
-#include "driver/report_text.h"
+#include "report/report_text.h"
 
 namespace {
 

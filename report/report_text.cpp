@@ -1,4 +1,4 @@
-#include "driver/report_text.h"
+#include "report/report_text.h"
 
 #include <cstddef>
 #include <iomanip>

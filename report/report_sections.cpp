@@ -1,13 +1,13 @@
-#include "driver/report_sections.h"
+#include "report/report_sections.h"
 
 #include <algorithm>
 #include <cstddef>
 #include <vector>
 
-#include "driver/report_data.h"
-#include "driver/report_figures.h"
-#include "driver/report_text.h"
 #include "lsc/patch_geometry.h"
+#include "report/report_data.h"
+#include "report/report_figures.h"
+#include "report/report_text.h"
 
 namespace {
 

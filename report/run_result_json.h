@@ -6,7 +6,7 @@
 
 #include <string>
 
-#include "driver/run_report.h"
+#include "report/run_report.h"
 
 inline constexpr int kResultSchemaVersion = 1;
 

@@ -5,7 +5,7 @@
 
 #include <string>
 
-#include "driver/run_report.h"
+#include "report/run_report.h"
 
 std::string verdictSection(const RunReport& report);
 std::string runSection(const RunReport& report);

@@ -7,9 +7,9 @@
 #include <utility>
 #include <vector>
 
-#include "driver/report_data.h"
-#include "driver/report_svg.h"
 #include "lsc/patch_geometry.h"
+#include "report/report_data.h"
+#include "report/report_svg.h"
 
 inline constexpr char kSamplePointsId[] = "sample-points";
 

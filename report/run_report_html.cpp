@@ -1,12 +1,12 @@
-#include "driver/run_report_html.h"
+#include "report/run_report_html.h"
 
 #include <cstdio>
 #include <stdexcept>
 
-#include "driver/report_messages.h"
-#include "driver/report_sections.h"
-#include "driver/report_text.h"
 #include "image/output_file.h"
+#include "report/report_messages.h"
+#include "report/report_sections.h"
+#include "report/report_text.h"
 
 namespace {
 

@@ -7,8 +7,8 @@
 
 #include <gtest/gtest.h>
 
-#include "driver/report_data.h"
 #include "lsc/eval_patch.h"
+#include "report/report_data.h"
 
 namespace {
 

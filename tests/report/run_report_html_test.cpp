@@ -11,8 +11,8 @@
 
 #include <gtest/gtest.h>
 
-#include "driver/run_report_html.h"
-#include "tests/driver/run_report_example.h"
+#include "report/run_report_html.h"
+#include "tests/report/run_report_example.h"
 #include "tests/support/temp_dir.h"
 
 #include <dirent.h>
