@@ -87,9 +87,10 @@ KqRawContainer* headerlessContainer(float exposureTime, float gain, const std::s
         return nullptr;
     header.release();
     KqRawBlockPtr capture(kqrawBlockCreateCapture());
-    bool set = capture && kqrawBlockSetFloat(capture.get(), kqcap::kExposureTime, exposureTime);
+    bool set =
+        capture && kqrawBlockSetFloat(capture.get(), img::kqcap::kExposureTime, exposureTime);
     for (std::uint32_t c = 0; c < 4; ++c)
-        set = set && kqrawBlockSetFloat(capture.get(), kqcap::kGain0 + 4 * c, gain);
+        set = set && kqrawBlockSetFloat(capture.get(), img::kqcap::kGain0 + 4 * c, gain);
     if (!set || !kqrawContainerAdd(container.get(), capture.get()))
         return nullptr;
     capture.release();
@@ -107,12 +108,13 @@ KqRawFixedHeader* headerlessFixedHeader(float exposureTime, float gain, const st
     KqRawFixedHeader* header = kqrawFixedHeaderCreate();
     if (!header)
         return nullptr;
-    kqrawFixedSetFloat(header, kqfix::kExposureFloat, exposureTime);
+    kqrawFixedSetFloat(header, img::kqfix::kExposureFloat, exposureTime);
     for (std::uint32_t c = 0; c < 4; ++c)
-        kqrawFixedSetFloat(header, kqfix::kGain0 + 4 * c, gain);
+        kqrawFixedSetFloat(header, img::kqfix::kGain0 + 4 * c, gain);
     if (!sensorGuid.empty())
-        kqrawFixedSet64(header, kqfix::kSensorGuid, img::parseHex64(sensorGuid.c_str()));
-    img::parseHexBytes(serial.c_str(), header->bytes + kqfix::kSerial, kqfix::kSerialSize);
+        kqrawFixedSet64(header, img::kqfix::kSensorGuid, img::parseHex64(sensorGuid.c_str()));
+    img::parseHexBytes(serial.c_str(), header->bytes + img::kqfix::kSerial,
+                       img::kqfix::kSerialSize);
     return header;
 }
 

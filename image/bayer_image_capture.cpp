@@ -21,7 +21,7 @@ const KqRawFixedHeader* fixedHeaderOf(const ImageBuffer* image) {
 
 // A float of the last capture block; 0 when there is none or it is too short.
 float captureValue(const KqRawContainer* container, std::uint32_t offset) {
-    const int index = kqrawContainerFindLast(container, kqtag::kCapture);
+    const int index = kqrawContainerFindLast(container, img::kqtag::kCapture);
     float value = 0.0f;
     if (index < 0 || !kqrawBlockGetFloat(container->blocks[index], offset, &value))
         return 0.0f;
@@ -32,11 +32,11 @@ float captureValue(const KqRawContainer* container, std::uint32_t offset) {
 
 float BayerImage::exposureTime() const {
     if (const KqRawContainer* container = containerOf(buffer_.get()))
-        return captureValue(container, kqcap::kExposureTime);
+        return captureValue(container, img::kqcap::kExposureTime);
     if (const KqRawFixedHeader* header = fixedHeaderOf(buffer_.get())) {
-        if (kqrawFixedGet32(header, kqfix::kRevision) < kqfix::kFirstFixedPointRevision)
-            return kqrawFixedGetFloat(header, kqfix::kExposureFloat);
-        return static_cast<float>(kqrawFixedGet32(header, kqfix::kExposureFixed)) / 65536.0f;
+        if (kqrawFixedGet32(header, img::kqfix::kRevision) < img::kqfix::kFirstFixedPointRevision)
+            return kqrawFixedGetFloat(header, img::kqfix::kExposureFloat);
+        return static_cast<float>(kqrawFixedGet32(header, img::kqfix::kExposureFixed)) / 65536.0f;
     }
     return 0.0f;
 }
@@ -46,15 +46,15 @@ float BayerImage::channelGain(int channel) const {
         return 0.0f;
     const auto offset = static_cast<std::uint32_t>(4 * channel);
     if (const KqRawContainer* container = containerOf(buffer_.get()))
-        return captureValue(container, kqcap::kGain0 + offset);
+        return captureValue(container, img::kqcap::kGain0 + offset);
     if (const KqRawFixedHeader* header = fixedHeaderOf(buffer_.get()))
-        return kqrawFixedGetFloat(header, kqfix::kGain0 + offset);
+        return kqrawFixedGetFloat(header, img::kqfix::kGain0 + offset);
     return 0.0f;
 }
 
 std::string BayerImage::serialNumber(std::size_t maxLength) const {
     if (const KqRawContainer* container = containerOf(buffer_.get())) {
-        const int index = kqrawContainerFind(container, kqtag::kSensorInfo);
+        const int index = kqrawContainerFind(container, img::kqtag::kSensorInfo);
         if (index < 0 || container->blocks[index]->form != KqRawForm::kSensorInfo)
             return std::string();
         std::string serial(container->blocks[index]->strings[1].text);
@@ -65,8 +65,8 @@ std::string BayerImage::serialNumber(std::size_t maxLength) const {
     if (const KqRawFixedHeader* header = fixedHeaderOf(buffer_.get())) {
         // The field holds 16 bytes; what lies behind it is not serial number.
         const std::size_t bytes =
-            maxLength / 2 < kqfix::kSerialSize ? maxLength / 2 : kqfix::kSerialSize;
-        return img::hexOfBytes(header->bytes + kqfix::kSerial, bytes);
+            maxLength / 2 < img::kqfix::kSerialSize ? maxLength / 2 : img::kqfix::kSerialSize;
+        return img::hexOfBytes(header->bytes + img::kqfix::kSerial, bytes);
     }
     return std::string();
 }
@@ -78,6 +78,6 @@ bool BayerImage::hasFixedHeader() const {
 void BayerImage::setSensorGuid(const std::string& guidHex) {
     if (!fixedHeaderOf(buffer_.get()))
         return;
-    kqrawFixedSet64(static_cast<KqRawFixedHeader*>(buffer_->rawHeader), kqfix::kSensorGuid,
+    kqrawFixedSet64(static_cast<KqRawFixedHeader*>(buffer_->rawHeader), img::kqfix::kSensorGuid,
                     img::parseHex64(guidHex.c_str()));
 }

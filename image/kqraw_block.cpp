@@ -170,7 +170,7 @@ KqRawBlock* kqrawBlockClone(const KqRawBlock* source) noexcept {
 }
 
 KqRawBlock* kqrawBlockCreateHeader() noexcept {
-    KqRawBlock* block = createOpaque(kqtag::kFileHeader, kKqRawFileHeaderPayloadSize);
+    KqRawBlock* block = createOpaque(img::kqtag::kFileHeader, kKqRawFileHeaderPayloadSize);
     if (block)
         kqrawHeaderStamp(block);
     return block;
@@ -179,7 +179,7 @@ KqRawBlock* kqrawBlockCreateHeader() noexcept {
 KqRawBlock* kqrawBlockCreatePixels(const std::uint16_t* samples, std::uint64_t count) noexcept {
     if (count > (UINT32_MAX - kKqRawPixelLeadSize) / 2 || (count > 0 && !samples))
         return nullptr;
-    KqRawBlockPtr block(allocateBlock(kqtag::kPixels, KqRawForm::kPixels));
+    KqRawBlockPtr block(allocateBlock(img::kqtag::kPixels, KqRawForm::kPixels));
     if (!block)
         return nullptr;
     img::storeLE32(block->lead, 1);
@@ -193,14 +193,14 @@ KqRawBlock* kqrawBlockCreatePixels(const std::uint16_t* samples, std::uint64_t c
 }
 
 KqRawBlock* kqrawBlockCreateCapture() noexcept {
-    KqRawBlock* block = createOpaque(kqtag::kCapture, kKqRawCapturePayloadSize);
+    KqRawBlock* block = createOpaque(img::kqtag::kCapture, kKqRawCapturePayloadSize);
     if (block)
-        img::storeLE32(block->payload + kqcap::kVersion, 2);
+        img::storeLE32(block->payload + img::kqcap::kVersion, 2);
     return block;
 }
 
 KqRawBlock* kqrawBlockCreateSensorInfo() noexcept {
-    KqRawBlockPtr block(allocateBlock(kqtag::kSensorInfo, KqRawForm::kSensorInfo));
+    KqRawBlockPtr block(allocateBlock(img::kqtag::kSensorInfo, KqRawForm::kSensorInfo));
     if (!block)
         return nullptr;
     block->infoWord = 1;
@@ -211,11 +211,11 @@ KqRawBlock* kqrawBlockCreateSensorInfo() noexcept {
 }
 
 KqRawBlock* kqrawBlockCreateComment(const char* text) noexcept {
-    return createText(kqtag::kComment, text);
+    return createText(img::kqtag::kComment, text);
 }
 
 KqRawBlock* kqrawBlockCreateMakerNote(const char* text) noexcept {
-    return createText(kqtag::kMakerNote, text);
+    return createText(img::kqtag::kMakerNote, text);
 }
 
 bool kqrawBlockSetString(KqRawBlock* block, int index, const char* text) noexcept {
@@ -284,19 +284,19 @@ void kqrawHeaderStamp(KqRawBlock* header) noexcept {
     struct timeval now;
     if (gettimeofday(&now, nullptr) != 0)
         now = {};
-    kqrawBlockSet32(header, kqhdr::kSeconds, static_cast<std::uint32_t>(now.tv_sec));
-    kqrawBlockSet32(header, kqhdr::kMicroseconds, static_cast<std::uint32_t>(now.tv_usec));
+    kqrawBlockSet32(header, img::kqhdr::kSeconds, static_cast<std::uint32_t>(now.tv_sec));
+    kqrawBlockSet32(header, img::kqhdr::kMicroseconds, static_cast<std::uint32_t>(now.tv_usec));
 }
 
 namespace {
 
 KqRawForm formOfTag(const std::uint8_t* tag) {
     auto is = [tag](const char* name) { return std::memcmp(tag, name, kKqRawTagSize) == 0; };
-    if (is(kqtag::kPixels))
+    if (is(img::kqtag::kPixels))
         return KqRawForm::kPixels;
-    if (is(kqtag::kComment) || is(kqtag::kMakerNote))
+    if (is(img::kqtag::kComment) || is(img::kqtag::kMakerNote))
         return KqRawForm::kText;
-    if (is(kqtag::kSensorInfo))
+    if (is(img::kqtag::kSensorInfo))
         return KqRawForm::kSensorInfo;
     return KqRawForm::kOpaque;
 }

@@ -18,23 +18,23 @@ constexpr std::uint32_t kKqRawFileHeaderPayloadSize = 36;
 constexpr std::uint32_t kKqRawCapturePayloadSize = 56;
 constexpr std::uint32_t kKqRawPixelLeadSize = 8; // the two words before the samples
 
-namespace kqtag {
+namespace img::kqtag {
 inline constexpr char kFileHeader[] = "KQRAWFILE_111107";
 inline constexpr char kPixels[] = "PIXELDATA_111107";
 inline constexpr char kCapture[] = "CAPTURE___120118";
 inline constexpr char kSensorInfo[] = "SENSORINFO120131";
 inline constexpr char kComment[] = "COMMENT___120131";
 inline constexpr char kMakerNote[] = "MAKERNOTE_120131";
-} // namespace kqtag
+} // namespace img::kqtag
 
 // Payload offsets of the file header block.
-namespace kqhdr {
+namespace img::kqhdr {
 constexpr std::uint32_t kWidth = 0, kHeight = 4, kBayerCode = 8, kBitsPerSample = 12,
                         kSamplesPerPixel = 16, kNumberOfImages = 20, kSeconds = 24,
                         kMicroseconds = 28;
 }
 // Payload offsets of the capture block.
-namespace kqcap {
+namespace img::kqcap {
 constexpr std::uint32_t kVersion = 0, kExposureTime = 4, kSecondValue = 8, kCarried1 = 12,
                         kCarried2 = 16, kGain0 = 28;
 }

@@ -14,12 +14,12 @@
 namespace {
 
 bool isHeaderBlock(const KqRawBlock* block) {
-    return kqrawBlockHasTag(block, kqtag::kFileHeader) && block->form == KqRawForm::kOpaque &&
+    return kqrawBlockHasTag(block, img::kqtag::kFileHeader) && block->form == KqRawForm::kOpaque &&
            block->size == kKqRawFileHeaderPayloadSize;
 }
 
 bool isPixelBlock(const KqRawBlock* block) {
-    return kqrawBlockHasTag(block, kqtag::kPixels) && block->form == KqRawForm::kPixels;
+    return kqrawBlockHasTag(block, img::kqtag::kPixels) && block->form == KqRawForm::kPixels;
 }
 
 // Puts `block` at *index (releasing what was there) or appends it.
@@ -66,7 +66,8 @@ bool kqrawContainerSetPixels(KqRawContainer* container, KqRawBlock* block) noexc
 
 bool kqrawContainerAdd(KqRawContainer* container, KqRawBlock* block) noexcept {
     if (!container || !block || container->count >= kKqRawMaxBlocks ||
-        kqrawBlockHasTag(block, kqtag::kFileHeader) || kqrawBlockHasTag(block, kqtag::kPixels))
+        kqrawBlockHasTag(block, img::kqtag::kFileHeader) ||
+        kqrawBlockHasTag(block, img::kqtag::kPixels))
         return false;
     container->blocks[container->count++] = block;
     return true;
@@ -114,7 +115,7 @@ bool startsWithHeaderBlock(img::ByteSource& source) {
         return false;
     KqRawBlock probe{};
     std::memcpy(probe.tag, head, kKqRawTagSize);
-    return kqrawBlockHasTag(&probe, kqtag::kFileHeader) &&
+    return kqrawBlockHasTag(&probe, img::kqtag::kFileHeader) &&
            img::loadLE32(head + 32) == kKqRawFileHeaderPayloadSize;
 }
 
@@ -133,12 +134,12 @@ bool roomForOrdinaryBlock(const KqRawContainer* container) {
 }
 
 int keepBlock(KqRawContainer* container, KqRawBlock* block, const char* sourceName) {
-    if (kqrawBlockHasTag(block, kqtag::kFileHeader)) {
+    if (kqrawBlockHasTag(block, img::kqtag::kFileHeader)) {
         if (!kqrawContainerSetHeader(container, block))
             return img::kRawBadContainer; // a header block of the wrong size
         return img::kOk;
     }
-    if (kqrawBlockHasTag(block, kqtag::kPixels))
+    if (kqrawBlockHasTag(block, img::kqtag::kPixels))
         return kqrawContainerSetPixels(container, block) ? img::kOk : img::kRawBadContainer;
     if (!roomForOrdinaryBlock(container) || !kqrawContainerAdd(container, block)) {
         img::warn(img::msg::kTooManyBlocks, sourceName, img::printableTag(block->tag).c_str());

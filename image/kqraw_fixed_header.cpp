@@ -35,10 +35,10 @@ KqRawFixedHeader* kqrawFixedHeaderCreate() noexcept {
     auto* header = static_cast<KqRawFixedHeader*>(std::calloc(1, sizeof(KqRawFixedHeader)));
     if (!header)
         return nullptr;
-    kqrawFixedSet32(header, kqfix::kVersion, 1);
-    kqrawFixedSet32(header, kqfix::kRevision, 1);
-    kqrawFixedSet32(header, kqfix::kMagic, kqfix::kMagicValue);
-    kqrawFixedSet32(header, kqfix::kEndMarker, kqfix::kEndMarkerValue);
+    kqrawFixedSet32(header, img::kqfix::kVersion, 1);
+    kqrawFixedSet32(header, img::kqfix::kRevision, 1);
+    kqrawFixedSet32(header, img::kqfix::kMagic, img::kqfix::kMagicValue);
+    kqrawFixedSet32(header, img::kqfix::kEndMarker, img::kqfix::kEndMarkerValue);
     return header;
 }
 
@@ -67,19 +67,20 @@ int kqrawFixedRead(img::ByteSource& source, ImageBuffer** out, std::uint64_t* sa
     int rc = readHeader(source, &header);
     if (rc != img::kOk)
         return rc;
-    if (kqrawFixedGet32(header.get(), kqfix::kVersion) != 1 ||
-        kqrawFixedGet32(header.get(), kqfix::kEndMarker) != kqfix::kEndMarkerValue)
+    if (kqrawFixedGet32(header.get(), img::kqfix::kVersion) != 1 ||
+        kqrawFixedGet32(header.get(), img::kqfix::kEndMarker) != img::kqfix::kEndMarkerValue)
         return img::kWrongFormat;
-    const std::uint32_t width = kqrawFixedGet32(header.get(), kqfix::kWidth);
-    const std::uint32_t height = kqrawFixedGet32(header.get(), kqfix::kHeight);
+    const std::uint32_t width = kqrawFixedGet32(header.get(), img::kqfix::kWidth);
+    const std::uint32_t height = kqrawFixedGet32(header.get(), img::kqfix::kHeight);
     const std::uint64_t expected = kKqRawFixedHeaderSize + 2 * (std::uint64_t{width} * height);
     if (img::samplesFit(source.size(), kKqRawFixedHeaderSize, width, height) &&
         source.size() > expected)
         img::warn(img::msg::kFixedHeaderTooBig, source.name());
     ImageBuffer* image = nullptr;
-    rc = img::readRawImage(source, kKqRawFixedHeaderSize, width, height,
-                           img::cfaOfBayerCode(kqrawFixedGet32(header.get(), kqfix::kBayerCode)),
-                           &image, samplesAt);
+    rc = img::readRawImage(
+        source, kKqRawFixedHeaderSize, width, height,
+        img::cfaOfBayerCode(kqrawFixedGet32(header.get(), img::kqfix::kBayerCode)), &image,
+        samplesAt);
     if (rc != img::kOk)
         return rc;
     image->fileType = kFileKqRaw;
@@ -92,8 +93,9 @@ namespace {
 
 // Offset of the first end marker word from +108 on, 0 when there is none.
 std::uint32_t findEndMarker(const KqRawFixedHeader* header) {
-    for (std::uint32_t offset = kqfix::kFirstTable; offset <= kqfix::kEndMarker; offset += 4)
-        if (kqrawFixedGet32(header, offset) == kqfix::kEndMarkerValue)
+    for (std::uint32_t offset = img::kqfix::kFirstTable; offset <= img::kqfix::kEndMarker;
+         offset += 4)
+        if (kqrawFixedGet32(header, offset) == img::kqfix::kEndMarkerValue)
             return offset;
     return 0;
 }
@@ -104,21 +106,22 @@ KqRawBlock* captureBlockOf(const KqRawFixedHeader* header) {
         return nullptr;
     // A new capture block holds both fields.
     const bool set =
-        kqrawBlockSetFloat(capture, kqcap::kExposureTime,
-                           static_cast<float>(kqrawFixedGet32(header, kqfix::kExposureFixed)) /
+        kqrawBlockSetFloat(capture, img::kqcap::kExposureTime,
+                           static_cast<float>(kqrawFixedGet32(header, img::kqfix::kExposureFixed)) /
                                65536.0f) &&
-        kqrawBlockSetFloat(capture, kqcap::kSecondValue,
-                           static_cast<float>(kqrawFixedGet32(header, kqfix::kSecondValue)) /
+        kqrawBlockSetFloat(capture, img::kqcap::kSecondValue,
+                           static_cast<float>(kqrawFixedGet32(header, img::kqfix::kSecondValue)) /
                                65536.0f);
     if (!set) {
         kqrawBlockRelease(capture);
         return nullptr;
     }
-    kqrawBlockSet32(capture, kqcap::kCarried1, kqrawFixedGet32(header, kqfix::kExposureFloat));
-    kqrawBlockSet32(capture, kqcap::kCarried2, kqrawFixedGet32(header, kqfix::kWord48));
+    kqrawBlockSet32(capture, img::kqcap::kCarried1,
+                    kqrawFixedGet32(header, img::kqfix::kExposureFloat));
+    kqrawBlockSet32(capture, img::kqcap::kCarried2, kqrawFixedGet32(header, img::kqfix::kWord48));
     for (std::uint32_t c = 0; c < 4; ++c)
-        kqrawBlockSet32(capture, kqcap::kGain0 + 4 * c,
-                        kqrawFixedGet32(header, kqfix::kGain0 + 4 * c));
+        kqrawBlockSet32(capture, img::kqcap::kGain0 + 4 * c,
+                        kqrawFixedGet32(header, img::kqfix::kGain0 + 4 * c));
     return capture;
 }
 
@@ -131,14 +134,15 @@ int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** out) noexcep
     if (rc != img::kOk)
         return rc;
     const KqRawFixedHeader* h = header.get();
-    if (kqrawFixedGet32(h, kqfix::kVersion) != 1 || kqrawFixedGet32(h, kqfix::kRevision) >= 5 ||
-        kqrawFixedGet32(h, kqfix::kMagic) != kqfix::kMagicValue)
+    if (kqrawFixedGet32(h, img::kqfix::kVersion) != 1 ||
+        kqrawFixedGet32(h, img::kqfix::kRevision) >= 5 ||
+        kqrawFixedGet32(h, img::kqfix::kMagic) != img::kqfix::kMagicValue)
         return img::kWrongFormat;
     const std::uint32_t marker = findEndMarker(h);
     if (marker == 0)
         return img::kWrongFormat;
-    const std::uint32_t width = kqrawFixedGet32(h, kqfix::kWidth);
-    const std::uint32_t height = kqrawFixedGet32(h, kqfix::kHeight);
+    const std::uint32_t width = kqrawFixedGet32(h, img::kqfix::kWidth);
+    const std::uint32_t height = kqrawFixedGet32(h, img::kqfix::kHeight);
     const std::uint64_t pixelOffset = std::uint64_t{marker} + 4;
     if (width == 0 || height == 0 || !img::samplesFit(source.size(), pixelOffset, width, height))
         return img::kRawBadContainer;
@@ -155,9 +159,10 @@ int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** out) noexcep
         kqrawBlockRelease(headerBlock);
         return img::kNoMemory;
     }
-    kqrawBlockSet32(headerBlock, kqhdr::kWidth, width);
-    kqrawBlockSet32(headerBlock, kqhdr::kHeight, height);
-    kqrawBlockSet32(headerBlock, kqhdr::kBayerCode, kqrawFixedGet32(h, kqfix::kBayerCode));
+    kqrawBlockSet32(headerBlock, img::kqhdr::kWidth, width);
+    kqrawBlockSet32(headerBlock, img::kqhdr::kHeight, height);
+    kqrawBlockSet32(headerBlock, img::kqhdr::kBayerCode,
+                    kqrawFixedGet32(h, img::kqfix::kBayerCode));
 
     KqRawBlock* pixels = kqrawBlockCreatePixels(nullptr, 0);
     if (!pixels || !kqrawContainerSetPixels(container.get(), pixels)) {

@@ -13,7 +13,7 @@ struct KqRawFixedHeader {
     std::uint8_t bytes[kKqRawFixedHeaderSize];
 };
 
-namespace kqfix {
+namespace img::kqfix {
 constexpr std::uint32_t kVersion = 0, kRevision = 4, kWidth = 8, kHeight = 12, kBayerCode = 16,
                         kSensorGuid = 24, kExposureFixed = 32, kExposureFloat = 36,
                         kSecondValue = 40, kWord48 = 48, kGain0 = 68, kSerial = 88,
@@ -23,7 +23,7 @@ constexpr std::uint32_t kMagicValue = 0xDEADBEEF;
 constexpr std::uint32_t kEndMarkerValue = 0xCAFEFEED;
 // Revisions from 2 on hold the exposure time as 16.16 fixed point only.
 constexpr std::uint32_t kFirstFixedPointRevision = 2;
-} // namespace kqfix
+} // namespace img::kqfix
 
 // A fresh header (malloc'd, released with std::free): zeros, the magic word,
 // version 1, revision 1 and the end marker. Null when out of memory.

@@ -20,12 +20,12 @@
 #include "image/image_buffer.h"
 #include "image/kqraw_fixed_header.h"
 
-namespace nkraw {
+namespace img::nkraw {
 inline constexpr char kMagic[] = "NKRAWHDR";
 constexpr std::uint32_t kMagicSize = 8, kWidth = 8, kHeight = 12, kBayerCode = 16,
                         kExposureMicroseconds = 20, kGainStep = 24, kGainNumerator = 28,
                         kGainDenominator = 32;
-} // namespace nkraw
+} // namespace img::nkraw
 
 // Result: 0 and a RAW, RAW_CFA, UINT16 image of file type NKRAW carrying the
 // header (bit depth from the largest sample, as for the other raw files); -4

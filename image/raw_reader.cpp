@@ -24,9 +24,9 @@ int imageOfContainer(KqRawContainerPtr container, ImageBuffer** out, bool sample
     const KqRawBlock* header = container->blocks[container->headerIndex];
     KqRawBlock* pixels = container->blocks[container->pixelIndex];
     std::uint32_t width = 0, height = 0, code = 0;
-    kqrawBlockGet32(header, kqhdr::kWidth, &width);
-    kqrawBlockGet32(header, kqhdr::kHeight, &height);
-    kqrawBlockGet32(header, kqhdr::kBayerCode, &code);
+    kqrawBlockGet32(header, img::kqhdr::kWidth, &width);
+    kqrawBlockGet32(header, img::kqhdr::kHeight, &height);
+    kqrawBlockGet32(header, img::kqhdr::kBayerCode, &code);
     if (width == 0 || height == 0 || width > INT32_MAX || height > INT32_MAX ||
         pixels->sampleCount / width < height)
         return kRawBadContainer;

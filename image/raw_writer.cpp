@@ -52,14 +52,14 @@ int writeKqRaw(std::FILE* file, const ImageBuffer* image) {
     } else if (image->fileType == kFileNkRaw && image->rawHeader) {
         nkrawCaptureToFixedHeader(static_cast<const std::uint8_t*>(image->rawHeader), header.get());
     }
-    kqrawFixedSet32(header.get(), kqfix::kWidth, static_cast<std::uint32_t>(image->width));
-    kqrawFixedSet32(header.get(), kqfix::kHeight, static_cast<std::uint32_t>(image->height));
-    kqrawFixedSet32(header.get(), kqfix::kVersion, 1);
+    kqrawFixedSet32(header.get(), img::kqfix::kWidth, static_cast<std::uint32_t>(image->width));
+    kqrawFixedSet32(header.get(), img::kqfix::kHeight, static_cast<std::uint32_t>(image->height));
+    kqrawFixedSet32(header.get(), img::kqfix::kVersion, 1);
     // A header of revision 2 or later holds its exposure time only as fixed
     // point at +32; calling it revision 1 would make readers take +36 instead.
-    if (kqrawFixedGet32(header.get(), kqfix::kRevision) < kqfix::kFirstFixedPointRevision)
-        kqrawFixedSet32(header.get(), kqfix::kRevision, 1);
-    kqrawFixedSet32(header.get(), kqfix::kBayerCode, img::bayerCodeOfCfa(image->cfa[1]));
+    if (kqrawFixedGet32(header.get(), img::kqfix::kRevision) < img::kqfix::kFirstFixedPointRevision)
+        kqrawFixedSet32(header.get(), img::kqfix::kRevision, 1);
+    kqrawFixedSet32(header.get(), img::kqfix::kBayerCode, img::bayerCodeOfCfa(image->cfa[1]));
     if (std::fwrite(header->bytes, 1, sizeof header->bytes, file) != sizeof header->bytes ||
         !img::writeSamplesLE(file, samplesOf(image), pixelCount(image)))
         return img::kIoError;
@@ -86,17 +86,17 @@ int writeKqRaw2(std::FILE* file, const ImageBuffer* image) {
                                                : kqrawBlockCreateHeader());
     if (!header)
         return img::kNoMemory;
-    kqrawBlockSet32(header.get(), kqhdr::kWidth, static_cast<std::uint32_t>(image->width));
-    kqrawBlockSet32(header.get(), kqhdr::kHeight, static_cast<std::uint32_t>(image->height));
-    kqrawBlockSet32(header.get(), kqhdr::kBayerCode, img::bayerCodeOfCfa(image->cfa[1]));
-    kqrawBlockSet32(header.get(), kqhdr::kBitsPerSample, image->bitsPerSample);
-    kqrawBlockSet32(header.get(), kqhdr::kSamplesPerPixel, image->samplesPerPixel);
-    kqrawBlockSet32(header.get(), kqhdr::kNumberOfImages, image->numberOfImages);
+    kqrawBlockSet32(header.get(), img::kqhdr::kWidth, static_cast<std::uint32_t>(image->width));
+    kqrawBlockSet32(header.get(), img::kqhdr::kHeight, static_cast<std::uint32_t>(image->height));
+    kqrawBlockSet32(header.get(), img::kqhdr::kBayerCode, img::bayerCodeOfCfa(image->cfa[1]));
+    kqrawBlockSet32(header.get(), img::kqhdr::kBitsPerSample, image->bitsPerSample);
+    kqrawBlockSet32(header.get(), img::kqhdr::kSamplesPerPixel, image->samplesPerPixel);
+    kqrawBlockSet32(header.get(), img::kqhdr::kNumberOfImages, image->numberOfImages);
     kqrawHeaderStamp(header.get());
 
     // A new pixel block that borrows the image's samples for the write.
     KqRawBlock pixels{};
-    std::memcpy(pixels.tag, kqtag::kPixels, kKqRawTagSize);
+    std::memcpy(pixels.tag, img::kqtag::kPixels, kKqRawTagSize);
     pixels.form = KqRawForm::kPixels;
     img::storeLE32(pixels.lead, 1);
     pixels.samples = const_cast<std::uint16_t*>(samplesOf(image));

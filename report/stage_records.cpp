@@ -30,8 +30,7 @@ void recordInput(RunReport& report, const BayerImage& input, const std::string& 
         report.gains[channel] = input.channelGain(channel);
 }
 
-void recordPrepared(RunReport& report, const BayerImage& prepared, float blackLevel,
-                    bool shading) {
+void recordPrepared(RunReport& report, const BayerImage& prepared, float blackLevel, bool shading) {
     report.havePrepared = true;
     report.preparedWidth = prepared.width();
     report.preparedHeight = prepared.height();
@@ -56,8 +55,7 @@ void recordFit(RunReport& report, const ShadingCorrection& correction,
     report.fractions[2] = layout.top;
     report.fractions[3] = layout.middle;
     std::copy(&correction.controlGrids[0][0],
-              &correction.controlGrids[0][0] + kChannels * kGridPoints,
-              &report.controlGrids[0][0]);
+              &correction.controlGrids[0][0] + kChannels * kGridPoints, &report.controlGrids[0][0]);
     std::copy(targetLevels, targetLevels + kChannels, report.targetLevels);
 }
 

@@ -117,12 +117,12 @@ TEST_F(BayerImageTest, ContainerInputIsStoredBackAsContainerWithItsBlocks) {
     const auto* c = static_cast<const KqRawContainer*>(raw->rawHeader);
     ASSERT_EQ(c->count, 6);
     EXPECT_EQ(c->headerIndex, 0);
-    EXPECT_TRUE(kqrawBlockHasTag(c->blocks[1], kqtag::kCapture));
+    EXPECT_TRUE(kqrawBlockHasTag(c->blocks[1], img::kqtag::kCapture));
     EXPECT_TRUE(kqrawBlockHasTag(c->blocks[2], "CAMSTATE__120118"));
     EXPECT_EQ(std::string(reinterpret_cast<const char*>(c->blocks[2]->reserved), 16),
               "RESERVED-BYTES!!");
     EXPECT_EQ(std::string(reinterpret_cast<const char*>(c->blocks[2]->payload), 5), "state");
-    EXPECT_TRUE(kqrawBlockHasTag(c->blocks[3], kqtag::kSensorInfo));
+    EXPECT_TRUE(kqrawBlockHasTag(c->blocks[3], img::kqtag::kSensorInfo));
     EXPECT_STREQ(c->blocks[4]->strings[0].text, "a comment");
     EXPECT_EQ(c->pixelIndex, 5);
     const BayerImage again = load(out);

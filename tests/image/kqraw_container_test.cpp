@@ -49,15 +49,15 @@ TEST(KqRawContainerParse, ReadsBlocksInOrderWithHeaderAndPixelPositions) {
     ASSERT_EQ(pixels->sampleCount, 4u);
     EXPECT_EQ(pixels->samples[3], 4);
     float exposure = 0;
-    EXPECT_TRUE(kqrawBlockGetFloat(c->blocks[2], kqcap::kExposureTime, &exposure));
+    EXPECT_TRUE(kqrawBlockGetFloat(c->blocks[2], img::kqcap::kExposureTime, &exposure));
     EXPECT_EQ(exposure, 33.0f);
     const KqRawBlock* info = c->blocks[3];
     ASSERT_EQ(info->form, KqRawForm::kSensorInfo);
     EXPECT_EQ(info->infoWord, 1u);
     EXPECT_STREQ(info->strings[1].text, "SN42");
     EXPECT_STREQ(c->blocks[4]->strings[0].text, "hi");
-    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kComment), 4);
-    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kMakerNote), -1);
+    EXPECT_EQ(kqrawContainerFind(c.get(), img::kqtag::kComment), 4);
+    EXPECT_EQ(kqrawContainerFind(c.get(), img::kqtag::kMakerNote), -1);
 }
 
 TEST(KqRawContainerParse, RejectsFirstBlockThatIsNotTheFileHeader) {
@@ -69,7 +69,8 @@ TEST(KqRawContainerParse, RejectsFirstBlockThatIsNotTheFileHeader) {
 TEST(KqRawContainerParse, RejectsFirstSizeFieldOtherThan36) {
     int rc = 0;
     const std::string payload(36, '\0');
-    EXPECT_FALSE(parse(KqRawBuilder().block(tag(kqtag::kFileHeader), payload, 40).bytes(), &rc));
+    EXPECT_FALSE(
+        parse(KqRawBuilder().block(tag(img::kqtag::kFileHeader), payload, 40).bytes(), &rc));
     EXPECT_EQ(rc, -4);
 }
 
@@ -85,12 +86,14 @@ TEST(KqRawContainerParse, RefusesBlockSizeRunningPastTheEndBeforeAllocating) {
 
 TEST(KqRawContainerParse, RefusesPixelBlockWithoutWholeSamples) {
     int rc = 0;
-    EXPECT_FALSE(
-        parse(KqRawBuilder().header(1, 1, 0).block(tag(kqtag::kPixels), "1234567").bytes(), &rc));
-    EXPECT_EQ(rc, -21);
     EXPECT_FALSE(parse(
-        KqRawBuilder().header(1, 1, 0).block(tag(kqtag::kPixels), std::string(11, '\0')).bytes(),
-        &rc));
+        KqRawBuilder().header(1, 1, 0).block(tag(img::kqtag::kPixels), "1234567").bytes(), &rc));
+    EXPECT_EQ(rc, -21);
+    EXPECT_FALSE(parse(KqRawBuilder()
+                           .header(1, 1, 0)
+                           .block(tag(img::kqtag::kPixels), std::string(11, '\0'))
+                           .bytes(),
+                       &rc));
     EXPECT_EQ(rc, -21);
 }
 
@@ -107,7 +110,7 @@ TEST(KqRawContainerParse, SecondHeaderBlockReplacesTheFirstInPlace) {
     ASSERT_TRUE(c);
     EXPECT_EQ(c->count, 2);
     std::uint32_t width = 0;
-    kqrawBlockGet32(c->blocks[c->headerIndex], kqhdr::kWidth, &width);
+    kqrawBlockGet32(c->blocks[c->headerIndex], img::kqhdr::kWidth, &width);
     EXPECT_EQ(width, 7u);
 }
 
@@ -145,7 +148,7 @@ TEST(KqRawContainerParse, StringLengthsBeyondThePayloadKeepTheBlockAsRead) {
     const std::string payload = rawtest::u32(1) + rawtest::u32(2) + "ab" + rawtest::u32(50) + "x";
     int rc = 0;
     testing::internal::CaptureStderr();
-    ContainerPtr c = parse(minimal().block(tag(kqtag::kSensorInfo), payload).bytes(), &rc);
+    ContainerPtr c = parse(minimal().block(tag(img::kqtag::kSensorInfo), payload).bytes(), &rc);
     const std::string warning = testing::internal::GetCapturedStderr();
     ASSERT_TRUE(c);
     const KqRawBlock* info = c->blocks[2];
@@ -159,7 +162,7 @@ TEST(KqRawContainerParse, StringLengthsBeyondThePayloadKeepTheBlockAsRead) {
 TEST(KqRawContainerParse, BytesBehindTheStringsAreCarried) {
     const std::string payload = rawtest::u32(3) + "abc" + "PAD";
     int rc = 0;
-    ContainerPtr c = parse(minimal().block(tag(kqtag::kMakerNote), payload).bytes(), &rc);
+    ContainerPtr c = parse(minimal().block(tag(img::kqtag::kMakerNote), payload).bytes(), &rc);
     ASSERT_TRUE(c);
     const KqRawBlock* note = c->blocks[2];
     EXPECT_EQ(note->form, KqRawForm::kText);
@@ -186,21 +189,21 @@ TEST(KqRawContainerParse, ConvertsAFixedHeaderFileWhoseMarkerIsEarly) {
     ASSERT_EQ(pixels->sampleCount, 2u);
     EXPECT_EQ(pixels->samples[0], 700);
     EXPECT_EQ(pixels->samples[1], 13);
-    const int capture = kqrawContainerFind(c.get(), kqtag::kCapture);
+    const int capture = kqrawContainerFind(c.get(), img::kqtag::kCapture);
     ASSERT_GE(capture, 0);
     float value = 0;
     std::uint32_t word = 0;
-    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], kqcap::kExposureTime, &value));
+    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], img::kqcap::kExposureTime, &value));
     EXPECT_EQ(value, 33.0f);
-    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], kqcap::kSecondValue, &value));
+    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], img::kqcap::kSecondValue, &value));
     EXPECT_EQ(value, 0.5f);
-    kqrawBlockGet32(c->blocks[capture], kqcap::kCarried1, &word);
+    kqrawBlockGet32(c->blocks[capture], img::kqcap::kCarried1, &word);
     EXPECT_EQ(word, 0x11223344u);
-    kqrawBlockGet32(c->blocks[capture], kqcap::kCarried2, &word);
+    kqrawBlockGet32(c->blocks[capture], img::kqcap::kCarried2, &word);
     EXPECT_EQ(word, 0x55667788u);
-    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], kqcap::kGain0 + 8, &value));
+    ASSERT_TRUE(kqrawBlockGetFloat(c->blocks[capture], img::kqcap::kGain0 + 8, &value));
     EXPECT_EQ(value, 2.5f);
-    kqrawBlockGet32(c->blocks[c->headerIndex], kqhdr::kBayerCode, &word);
+    kqrawBlockGet32(c->blocks[c->headerIndex], img::kqhdr::kBayerCode, &word);
     EXPECT_EQ(word, 0x52474742u);
 }
 
@@ -227,7 +230,7 @@ TEST(KqRawContainerApi, AddRefusesHeaderAndPixelTagsAndAFullList) {
     KqRawBlock* extra = kqrawBlockCreateComment("too many");
     EXPECT_FALSE(kqrawContainerAdd(c.get(), extra));
     kqrawBlockRelease(extra);
-    EXPECT_EQ(kqrawContainerFindLast(c.get(), kqtag::kComment), kKqRawMaxBlocks - 1);
+    EXPECT_EQ(kqrawContainerFindLast(c.get(), img::kqtag::kComment), kKqRawMaxBlocks - 1);
 }
 
 TEST(KqRawContainerApi, SettersKeepTheSizeFieldInStepWithTheContent) {

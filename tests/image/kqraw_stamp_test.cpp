@@ -17,8 +17,8 @@ TEST(KqRawHeaderStamp, RecordsTheSystemClock) {
     const std::int64_t after = static_cast<std::int64_t>(std::time(nullptr));
 
     std::uint32_t seconds = 0, microseconds = 0;
-    ASSERT_TRUE(kqrawBlockGet32(header.get(), kqhdr::kSeconds, &seconds));
-    ASSERT_TRUE(kqrawBlockGet32(header.get(), kqhdr::kMicroseconds, &microseconds));
+    ASSERT_TRUE(kqrawBlockGet32(header.get(), img::kqhdr::kSeconds, &seconds));
+    ASSERT_TRUE(kqrawBlockGet32(header.get(), img::kqhdr::kMicroseconds, &microseconds));
     EXPECT_GE(seconds, before);
     EXPECT_LE(seconds, after);
     EXPECT_LT(microseconds, 1000000u);

@@ -105,7 +105,7 @@ TEST(RawWriteKqRaw2, ContainerInputIsStoredAsContainerWithItsBlocks) {
     // The image's own container is left as it was.
     const auto* c = static_cast<const KqRawContainer*>(image->rawHeader);
     std::uint32_t bits = 0;
-    kqrawBlockGet32(c->blocks[c->headerIndex], kqhdr::kBitsPerSample, &bits);
+    kqrawBlockGet32(c->blocks[c->headerIndex], img::kqhdr::kBitsPerSample, &bits);
     EXPECT_EQ(bits, 10u);
 }
 
