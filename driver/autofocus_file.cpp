@@ -4,6 +4,8 @@
 
 #include "config/config_file.h"
 
+namespace driver {
+
 namespace {
 
 // The first setting of `added` (a tree of the file alone) that is not
@@ -40,3 +42,5 @@ void readAutofocusFile(const std::string& path, config_node& config) {
     }
     parse_config_text(text, config, path);
 }
+
+} // namespace driver

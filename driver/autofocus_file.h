@@ -8,6 +8,8 @@
 
 #include "config/config_node.h"
 
+namespace driver {
+
 // Reads the file at `path` and adds its settings to `config` (the "config"
 // node that already holds the register file). Settings under "module."
 // (module.af.set[...], module.serial_no) are autofocus data; any other
@@ -16,3 +18,5 @@
 // which would change the calibration data." Nothing is added then. Read
 // errors as read_config_file.
 void readAutofocusFile(const std::string& path, config_node& config);
+
+} // namespace driver

@@ -3,6 +3,8 @@
 #include "config/parameter_table.h"
 #include "config/value_text.h"
 
+namespace driver {
+
 namespace {
 
 bool sameValue(const std::string& value, const config_node& defaultNode) {
@@ -46,3 +48,5 @@ std::vector<std::pair<std::string, std::string>> changedSettings(const config_no
     }
     return changed;
 }
+
+} // namespace driver

@@ -11,6 +11,8 @@
 #include "image/tiff_writer.h"
 #include "lsc/lens_shading_correction.h"
 
+namespace driver {
+
 void writeCheckImage(const std::string& path, BayerImage capture,
                      const ShadingCorrection& correction, float blackLevel,
                      const float (&targetLevels)[kChannels]) {
@@ -50,3 +52,5 @@ void writeCheckImage(const std::string& path, BayerImage capture,
             errno != 0 ? systemReason(path, errno) : path + ": the TIFF could not be written",
             "Cannot store check image: " + path);
 }
+
+} // namespace driver

@@ -8,6 +8,8 @@
 #include "image/bayer_image.h"
 #include "lsc/fit_result.h"
 
+namespace driver {
+
 // Applies the correction (control grids, patch layout) and the black level
 // to every pixel of `capture`, balances the four channels to the larger
 // green's target level, so a good flat field shows as an even grey mosaic,
@@ -19,3 +21,5 @@
 void writeCheckImage(const std::string& path, BayerImage capture,
                      const ShadingCorrection& correction, float blackLevel,
                      const float (&targetLevels)[kChannels]);
+
+} // namespace driver

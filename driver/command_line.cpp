@@ -12,6 +12,8 @@
 #include "driver/version.h"
 #include "image/error_detail.h"
 
+namespace driver {
+
 namespace po = boost::program_options;
 
 namespace {
@@ -185,3 +187,5 @@ std::vector<std::string> CommandLine::values(const char* name) const {
         return *several;
     return {found->second.as<std::string>()};
 }
+
+} // namespace driver

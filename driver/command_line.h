@@ -7,6 +7,8 @@
 
 #include <boost/program_options/variables_map.hpp>
 
+namespace driver {
+
 // Frames of one capture that --input may name, averaged before preparation.
 constexpr std::size_t kMaxInputFrames = 16;
 
@@ -34,3 +36,5 @@ private:
     boost::program_options::variables_map map_;
     std::string arguments_;
 };
+
+} // namespace driver

@@ -1,4 +1,7 @@
 #pragma once
+
+namespace driver {
+
 // Texts the run driver prints, exactly as operators and station scripts see them.
 
 namespace msg {
@@ -198,3 +201,5 @@ inline constexpr char kRawTooLongHint[] =
     "the headerless raw configuration file.";
 
 } // namespace msg
+
+} // namespace driver

@@ -8,6 +8,8 @@
 #include "image/error_detail.h"
 #include "lsc/apan_exception.h"
 
+namespace driver {
+
 namespace {
 
 FailureText error(const std::string& text) {
@@ -47,3 +49,5 @@ FailureText describeFailure(std::exception_ptr failure) {
         return error(msg::kUnknownError);
     }
 }
+
+} // namespace driver

@@ -5,6 +5,8 @@
 #include <exception>
 #include <string>
 
+namespace driver {
+
 // Detail lines (what and where) stand under the error's text, indented so.
 inline constexpr char kDetailIndent[] = "  ";
 
@@ -17,3 +19,5 @@ struct FailureText {
 // `failure` must hold an exception. A `notice` gives status 0 and its text.
 // An error that carries an ErrorDetail gets it as one more, indented line.
 FailureText describeFailure(std::exception_ptr failure);
+
+} // namespace driver

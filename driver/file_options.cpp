@@ -11,6 +11,8 @@
 
 #include <sys/stat.h>
 
+namespace driver {
+
 namespace {
 
 constexpr const char* kInputOptions[] = {"config", "input", "raw", "samples", "autofocus"};
@@ -108,3 +110,5 @@ void checkOutputsReplaceNothing(const CommandLine& line) {
                 refuse(outputs[i], "output", outputs[j]);
     }
 }
+
+} // namespace driver

@@ -5,6 +5,8 @@
 
 #include "driver/command_line.h"
 
+namespace driver {
+
 // Throws std::runtime_error
 //   "Output --<a> names the same file as input --<b>: <path>"
 //   "Output --<a> names the same file as output --<b>: <path>"
@@ -14,3 +16,5 @@
 // standard output or error already writes to are streams, not stored files:
 // any number of options may name them. "--log -" is standard output.
 void checkOutputsReplaceNothing(const CommandLine& line);
+
+} // namespace driver

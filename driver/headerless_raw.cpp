@@ -20,6 +20,8 @@
 
 #include <sys/stat.h>
 
+namespace driver {
+
 namespace po = boost::program_options;
 
 namespace {
@@ -227,3 +229,5 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
     }
     return streamed;
 }
+
+} // namespace driver

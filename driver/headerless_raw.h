@@ -10,6 +10,8 @@
 #include "prep/image_checks.h"
 #include "prep/mosaic_preparation.h"
 
+namespace driver {
+
 struct HeaderlessRawDetails {
     std::uint32_t width = 0;
     std::uint32_t height = 0;
@@ -40,3 +42,5 @@ bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint
                        BayerImage* prepared = nullptr,
                        prep::SampleStatistics* inputStatistics = nullptr,
                        img::MosaicRowSink* rows = nullptr);
+
+} // namespace driver

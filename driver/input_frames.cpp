@@ -8,6 +8,8 @@
 #include "prep/frame_average.h"
 #include "prep/image_checks.h"
 
+namespace driver {
+
 namespace {
 
 prep::FrameShape shapeOf(const BayerImage& image) {
@@ -63,3 +65,5 @@ void feedRows(const BayerImage& image, img::MosaicRowSink& sink) {
         sink.addRow(row.data());
     }
 }
+
+} // namespace driver

@@ -11,6 +11,8 @@
 #include "image/bayer_image.h"
 #include "image/mosaic_rows.h"
 
+namespace driver {
+
 // Reads `paths[0]` into `image` with `read`, then every further frame, and
 // leaves their average in `image` (the first frame's capture data kept), in
 // whole sample units as prep::averageSample makes it, so the result is the
@@ -22,3 +24,5 @@ void readAveragedFrames(BayerImage& image, const std::vector<std::string>& paths
 
 // Hands the rows of a whole image to `sink` as whole samples of its depth.
 void feedRows(const BayerImage& image, img::MosaicRowSink& sink);
+
+} // namespace driver

@@ -1,5 +1,5 @@
 #include "driver/run.h"
 
 int main(int argc, char* argv[]) {
-    return runProgram(argc, argv);
+    return driver::runProgram(argc, argv);
 }

@@ -29,7 +29,7 @@ void outputStream::openInfoFile(const std::string& name) {
     }
     std::FILE* file = std::fopen(name.c_str(), "w+");
     if (!file)
-        throw apan::exception(240, msg::kInfoFileOpen, msg::kInfoFileOpenHint);
+        throw apan::exception(240, driver::msg::kInfoFileOpen, driver::msg::kInfoFileOpenHint);
     buffer_.target = file;
 }
 

@@ -48,6 +48,8 @@
 #include "report/run_result_json.h"
 #include "report/stage_records.h"
 
+namespace driver {
+
 namespace {
 
 std::ostream& out() {
@@ -716,3 +718,5 @@ void Pipeline::finish() {
               << std::endl;
     out() << msg::kProgressCompleted << std::endl;
 }
+
+} // namespace driver

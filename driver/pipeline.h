@@ -25,6 +25,8 @@
 #include "prep/mosaic_preparation.h"
 #include "report/run_report.h"
 
+namespace driver {
+
 class Pipeline {
 public:
     Pipeline();
@@ -113,3 +115,5 @@ private:
     RunReport report_;
     const char* stage_ = "";
 };
+
+} // namespace driver

@@ -11,6 +11,8 @@
 
 #include <unistd.h>
 
+namespace driver {
+
 namespace {
 
 // An operator's Ctrl-C, a station's kill or a closed terminal ends the run
@@ -60,3 +62,5 @@ int runProgram(int argc, const char* const argv[]) {
     }
     return status;
 }
+
+} // namespace driver

@@ -1,5 +1,7 @@
 #include "driver/run_settings.h"
 
+namespace driver {
+
 RunSettings readRunSettings(const CommandLine& line, const config_node& config) {
     RunSettings s;
     s.input = line.value("input");
@@ -40,3 +42,5 @@ RunSettings readRunSettings(const CommandLine& line, const config_node& config) 
         s.controlPointInfix = ".ctrlPoints[" + std::to_string(s.blockNum) + "]";
     return s;
 }
+
+} // namespace driver

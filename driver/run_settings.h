@@ -7,6 +7,8 @@
 #include "config/config_node.h"
 #include "driver/command_line.h"
 
+namespace driver {
+
 struct RunSettings {
     // File options (empty: not given)
     std::string input, inputAsJpeg, inputAsBmp, raw, translate, preproc, log, autofocus, calibrate,
@@ -30,3 +32,5 @@ struct RunSettings {
 };
 
 RunSettings readRunSettings(const CommandLine& line, const config_node& config);
+
+} // namespace driver

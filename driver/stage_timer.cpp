@@ -1,5 +1,7 @@
 #include "driver/stage_timer.h"
 
+namespace driver {
+
 StageTimer startStageTimer() {
     StageTimer timer;
     timer.start = timer.last = std::clock();
@@ -15,3 +17,5 @@ void timerLine(StageTimer& timer, const char* label, std::ostream& out) {
     out << static_cast<float>(now - timer.last) / 1000000.0f << " sec" << std::endl;
     timer.last = now;
 }
+
+} // namespace driver

@@ -4,6 +4,8 @@
 #include <ctime>
 #include <ostream>
 
+namespace driver {
+
 struct StageTimer {
     std::clock_t start = 0;
     std::clock_t last = 0;
@@ -17,3 +19,5 @@ StageTimer startStageTimer();
 // notation) and " sec" as one line, then restarts the interval. Disabled, it
 // does nothing at all.
 void timerLine(StageTimer& timer, const char* label, std::ostream& out);
+
+} // namespace driver

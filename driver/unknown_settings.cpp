@@ -4,6 +4,8 @@
 
 #include "config/parameter_table.h"
 
+namespace driver {
+
 namespace {
 
 // Every key of a tree that holds a value, depth-first in print order.
@@ -87,3 +89,5 @@ std::vector<std::string> unknownSettingWarnings(const config_node_impl& config,
     }
     return warnings;
 }
+
+} // namespace driver

@@ -9,6 +9,8 @@
 
 #include "config/config_node.h"
 
+namespace driver {
+
 // One text per unknown key, in the configuration's print order:
 // "Unknown configuration key proc.min_pixle_val (ignored); did you mean
 // proc.min_pixel_val?". Known are the parameter table's keys, the register
@@ -19,3 +21,5 @@ std::vector<std::string> unknownSettingWarnings(const config_node_impl& config,
 
 // Levenshtein distance (insertions, deletions and substitutions of one byte).
 std::size_t editDistance(const std::string& a, const std::string& b);
+
+} // namespace driver

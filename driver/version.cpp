@@ -1,5 +1,7 @@
 #include "driver/version.h"
 
+namespace driver {
+
 namespace lscversion {
 
 std::string versionText() {
@@ -11,3 +13,5 @@ std::string versionLine() {
 }
 
 } // namespace lscversion
+
+} // namespace driver

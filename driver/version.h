@@ -2,6 +2,8 @@
 
 #include <string>
 
+namespace driver {
+
 namespace lscversion {
 
 inline constexpr char kShortName[] = "lsc";
@@ -13,3 +15,5 @@ std::string versionText();
 std::string versionLine();
 
 } // namespace lscversion
+
+} // namespace driver

@@ -20,6 +20,9 @@
 
 namespace {
 
+using driver::HeaderlessRawDetails;
+using driver::parseHeaderlessDetails;
+
 bool isHexText(const std::string& text) {
     for (const char c : text)
         if (!((c >= '0' && c <= '9') || (c >= 'a' && c <= 'f') || (c >= 'A' && c <= 'F')))

@@ -6,6 +6,8 @@
 
 namespace {
 
+using driver::changedSettings;
+
 std::vector<std::pair<std::string, std::string>> changedAfter(const std::string& text) {
     config_node_impl root("root");
     auto& config = static_cast<config_node_impl&>(root.child("config"));

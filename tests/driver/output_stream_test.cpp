@@ -10,6 +10,10 @@
 
 namespace {
 
+using driver::StageTimer;
+using driver::startStageTimer;
+using driver::timerLine;
+
 using testing_support::readFile;
 using testing_support::TempDir;
 

@@ -10,6 +10,8 @@
 
 namespace {
 
+using driver::runProgram;
+
 class TopLevelReport : public ::testing::Test {
 protected:
     void SetUp() override {
