@@ -224,7 +224,7 @@ void Pipeline::writeReport() {
     if (reportPath_.empty())
         return;
     out() << msg::kProgressWritingCalibrationReport << std::endl;
-    writeRunReport(reportPath_, report_);
+    report::writeRunReport(reportPath_, report_);
     noteOutput("report", reportPath_);
 }
 
@@ -232,7 +232,7 @@ void Pipeline::writeResult() {
     if (resultPath_.empty())
         return;
     out() << msg::kProgressWritingRunResult << std::endl;
-    writeRunResult(resultPath_, report_);
+    report::writeRunResult(resultPath_, report_);
 }
 
 void Pipeline::readConfiguration() {
@@ -369,8 +369,8 @@ void Pipeline::decideBitDepth() {
               << settings_.bitRes << msg::kBitDepthDiffersSuffix << std::endl;
     fullScale_ = prep::fullScale(depth_);
 
-    recordInput(report_, input_, settings_.input, depth_, static_cast<int>(frames_.size()),
-                settings_.debug);
+    report::recordInput(report_, input_, settings_.input, depth_, static_cast<int>(frames_.size()),
+                        settings_.debug);
 }
 
 void Pipeline::checkSettingsAgainstImage() {
@@ -496,7 +496,7 @@ void Pipeline::writePreparedImage() {
 ShadingSettings Pipeline::readShadingSettings() {
     ShadingSettings shading = load_fit_settings(*config_, input_);
     shading.quiet = settings_.quiet;
-    recordPrepared(report_, prepared_, shading.blackLevel, !reportPath_.empty());
+    report::recordPrepared(report_, prepared_, shading.blackLevel, !reportPath_.empty());
     timerLine(timer_, msg::kTimerImageCheckingTime, out());
     return shading;
 }
@@ -526,7 +526,7 @@ FitResult Pipeline::fitSurface(const SamplesTaken& samples) {
                               samples.fromImage};
     FitResult fit = fitLensShading(samples.set, origin, shading_, out(), deviations_);
     const auto ratios = printColourRatios(msg::kMeasuredLabel, fit.targetLevels);
-    recordMeasuredRatios(report_, ratios.first, ratios.second);
+    report::recordMeasuredRatios(report_, ratios.first, ratios.second);
     if (settings_.xtest) {
         out() << msg::kProgressXTestModeSpecified << std::endl;
         out() << msg::kProgressXTestSurface << std::endl;
@@ -534,15 +534,15 @@ FitResult Pipeline::fitSurface(const SamplesTaken& samples) {
         report_.xtest = true;
         warn(msg::kXTestWarning);
     }
-    recordSamples(report_, samples.set);
-    recordFit(report_, fit.correction, fit.targetLevels);
+    report::recordSamples(report_, samples.set);
+    report::recordFit(report_, fit.correction, fit.targetLevels);
     recordFitError();
     return fit;
 }
 
 // Also after a failed fit: the deviations show why a bound ended the run.
 void Pipeline::recordFitError() {
-    recordDeviations(report_, deviations_, shading_);
+    report::recordDeviations(report_, deviations_, shading_);
 }
 
 void Pipeline::writeRegisterFile(const FitResult& fit) {
@@ -598,7 +598,7 @@ ShadingCorrection Pipeline::writeBinaryData(const FitResult& fit) {
     timerLine(timer_, msg::kTimerBinaryDataParsingTime, out());
     // From here on the correction uses the control points as stored.
     const StoredCalibration calibration = readConfigParam(*root_, data, prepared_, fit.correction);
-    recordFit(report_, calibration.correction, fit.targetLevels);
+    report::recordFit(report_, calibration.correction, fit.targetLevels);
     recordFitError();
     timerLine(timer_, msg::kTimerBinaryDataTransferTime, out());
     return calibration.correction;
@@ -620,7 +620,8 @@ void Pipeline::balanceWhite(BayerImage& flattened, const FitResult& fit) {
     float levels[kChannels];
     prep::measureLevels(levels, flattened, shading_.awbFilterSize, shading_.procSamplingFactor);
     const auto ratios = printColourRatios(msg::kFlattenedMeasuredLabel, levels);
-    recordWhiteBalance(report_, ratios.first, ratios.second, flattened, !reportPath_.empty());
+    report::recordWhiteBalance(report_, ratios.first, ratios.second, flattened,
+                               !reportPath_.empty());
     timerLine(timer_, msg::kTimerWhiteBalanceTime, out());
 }
 
@@ -631,7 +632,7 @@ void Pipeline::measureColourError(BayerImage& flattened) {
     out() << msg::kDeltaBlocksLabel << shading_.deltaAbBlocks[0] << msg::kBlocksBy
           << shading_.deltaAbBlocks[1] << std::endl;
     const prep::DeltaAbResult delta = prep::evaluateDeltaAb(flattened, shading_);
-    recordDeltaAb(report_, delta, shading_.maxDeltaAb);
+    report::recordDeltaAb(report_, delta, shading_.maxDeltaAb);
     if (!settings_.delta.empty()) {
         out() << msg::kProgressWritingDeltaAbData << std::endl;
         prep::writeDeltaFile(settings_.delta, delta);
@@ -676,7 +677,7 @@ PatchLayout Pipeline::choosePatchLayout() {
 
 std::optional<float> Pipeline::measureLuminance(const BayerImage& balanced) {
     const std::optional<float> residual = prep::luminanceResidual(balanced, shading_);
-    recordLuminance(report_, residual, shading_.maxLumaResidual);
+    report::recordLuminance(report_, residual, shading_.maxLumaResidual);
     // Only runs that set the bound print the figure, so that every other
     // run's output stays as it was.
     if (shading_.maxLumaResidual > 0.0f && residual)

@@ -112,7 +112,7 @@ private:
     prep::NoiseSampler noise_;
     std::string reportPath_;
     std::string resultPath_; // --json
-    RunReport report_;
+    report::RunReport report_;
     const char* stage_ = "";
 };
 

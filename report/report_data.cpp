@@ -9,6 +9,8 @@
 #include "lsc/eval_patch.h"
 #include "report/report_messages.h"
 
+namespace report {
+
 namespace {
 
 // Pixel at fraction (index + offset) / count of a size, inside 0..size - 1.
@@ -183,3 +185,5 @@ GainSurface sampleGainSurface(const float (&grid)[kGridPoints], std::uint32_t wi
     }
     return surface;
 }
+
+} // namespace report

@@ -11,6 +11,8 @@
 #include "lsc/patch_geometry.h"
 #include "report/run_report.h"
 
+namespace report {
+
 // Block counts for a width x height image: `longSide` blocks along the longer
 // side and as many along the other as keep the blocks about square (at least 1).
 struct BlockGrid {
@@ -70,3 +72,5 @@ float gainAt(const float (&grid)[kGridPoints], const PatchBreakpoints& breaks, s
 GainSurface sampleGainSurface(const float (&grid)[kGridPoints], std::uint32_t width,
                               std::uint32_t height, const double (&fractions)[4], int columns,
                               int rows);
+
+} // namespace report

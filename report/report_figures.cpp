@@ -4,6 +4,8 @@
 
 #include "report/report_text.h"
 
+namespace report {
+
 namespace {
 
 constexpr double kFigureWidth = 400.0;  // user units across a figure in a column
@@ -154,3 +156,5 @@ std::string deltaFigure(int columns, int rows, const std::vector<float>& delta, 
     out += svgColourBar(scale, 0, barTop, figureWidth, kBarHeight, ticks, mark);
     return out + "</svg>";
 }
+
+} // namespace report

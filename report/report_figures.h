@@ -11,6 +11,8 @@
 #include "report/report_data.h"
 #include "report/report_svg.h"
 
+namespace report {
+
 inline constexpr char kSamplePointsId[] = "sample-points";
 
 // The sample points (prepared-image pixels of 2 x 2 blocks) inside a width x
@@ -37,3 +39,5 @@ std::string channelMapsFigure(const ChannelBlockMeans& means, const ColourScale&
 // blocks above the threshold outlined and the threshold marked on the scale.
 std::string deltaFigure(int columns, int rows, const std::vector<float>& delta, float threshold,
                         const std::string& thresholdText, double aspect, const std::string& label);
+
+} // namespace report

@@ -1,4 +1,7 @@
 #pragma once
+
+namespace report {
+
 // Texts of the calibration report writer and its figures.
 
 namespace msg {
@@ -9,3 +12,5 @@ inline constexpr char kReportNeedsBayerImage[] =
 inline constexpr char kReportBadBlockGrid[] = "The report's block grid needs at least one block.";
 
 } // namespace msg
+
+} // namespace report

@@ -9,6 +9,8 @@
 #include "report/report_figures.h"
 #include "report/report_text.h"
 
+namespace report {
+
 namespace {
 
 constexpr int kSurfaceCells = 64; // gain surface cells along the longer side
@@ -385,3 +387,5 @@ std::string fitErrorSection(const RunReport& report) {
             number(report.maxGain) + "</span>.</p>";
     return section("fit-error", "Fit error", body);
 }
+
+} // namespace report

@@ -7,6 +7,8 @@
 
 #include "report/run_report.h"
 
+namespace report {
+
 std::string verdictSection(const RunReport& report);
 std::string runSection(const RunReport& report);
 std::string surfacesSection(const RunReport& report);
@@ -16,3 +18,5 @@ std::string shadingSection(const RunReport& report);
 std::string colourSection(const RunReport& report);
 // Empty when the fit-error check did not run.
 std::string fitErrorSection(const RunReport& report);
+
+} // namespace report

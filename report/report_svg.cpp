@@ -7,6 +7,8 @@
 
 #include "report/report_text.h"
 
+namespace report {
+
 namespace {
 
 struct Rgb {
@@ -199,3 +201,5 @@ std::string svgText(double x, double y, const std::string& text, double size, co
         out += std::string(" class=\"") + cssClass + "\"";
     return out + ">" + htmlEscape(text) + "</text>";
 }
+
+} // namespace report

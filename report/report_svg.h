@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace report {
+
 // Sequential: dark violet through teal to yellow, for levels and gains.
 // Diverging: blue below the middle, near white at it, red above, for signed deviations.
 enum class ScaleKind { Sequential, Diverging };
@@ -77,3 +79,5 @@ double colourBarExtent(double height, bool marked);
 // Text at (x, y) in user units, escaped; anchor is "start", "middle" or "end".
 std::string svgText(double x, double y, const std::string& text, double size,
                     const char* anchor = "start", const char* cssClass = nullptr);
+
+} // namespace report

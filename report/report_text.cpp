@@ -5,6 +5,8 @@
 #include <locale>
 #include <sstream>
 
+namespace report {
+
 namespace {
 
 std::ostringstream numberStream() {
@@ -103,3 +105,5 @@ std::string formatFixed(double value, int decimals) {
     text << std::fixed << std::setprecision(decimals) << value;
     return text.str();
 }
+
+} // namespace report

@@ -6,6 +6,8 @@
 #include <string>
 #include <string_view>
 
+namespace report {
+
 // & < > " and ' as character references. Control characters other than tab
 // and line feed, and bytes that are not UTF-8, become U+FFFD, so a file name
 // of any bytes still makes a well-formed page.
@@ -18,3 +20,5 @@ std::string formatGeneral(double value, int precision);
 // A number as a stream in fixed notation prints it with `decimals` digits
 // after the point ("0.912345").
 std::string formatFixed(double value, int decimals);
+
+} // namespace report

@@ -10,6 +10,8 @@
 
 #include "lsc/shading_sample.h"
 
+namespace report {
+
 // Per-channel block means of a Bayer image, row-major, blocks x blocks.
 struct ChannelBlockMeans {
     int columns = 0;
@@ -85,3 +87,5 @@ struct RunReport {
     // the input statistics come first and leave the messages in fixed notation.
     bool inspectionInFixedNotation = false;
 };
+
+} // namespace report

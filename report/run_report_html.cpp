@@ -8,6 +8,8 @@
 #include "report/report_sections.h"
 #include "report/report_text.h"
 
+namespace report {
+
 namespace {
 
 // Sizes in mm and pt so print and screen agree; colours that print well in
@@ -87,3 +89,5 @@ void writeRunReport(const std::string& path, const RunReport& report) {
     if (std::fwrite(page.data(), 1, page.size(), file.stream()) != page.size() || !file.commit())
         throw std::runtime_error(msg::kCannotWriteReport + path);
 }
+
+} // namespace report

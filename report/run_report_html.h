@@ -9,6 +9,8 @@
 
 #include "report/run_report.h"
 
+namespace report {
+
 // The whole page.
 std::string runReportHtml(const RunReport& report);
 
@@ -16,3 +18,5 @@ std::string runReportHtml(const RunReport& report);
 // page. Throws std::runtime_error "Cannot write report file: " + path when it
 // cannot be created or written.
 void writeRunReport(const std::string& path, const RunReport& report);
+
+} // namespace report

@@ -9,6 +9,8 @@
 #include <nlohmann/json.hpp>
 #include <sys/stat.h>
 
+namespace report {
+
 namespace {
 
 using nlohmann::ordered_json;
@@ -157,3 +159,5 @@ void writeRunResult(const std::string& path, const RunReport& report) {
     if (!writeWholeFile(path, text.data(), text.size()))
         throw std::runtime_error("Cannot write result file: " + path);
 }
+
+} // namespace report

@@ -8,6 +8,8 @@
 
 #include "report/run_report.h"
 
+namespace report {
+
 inline constexpr int kResultSchemaVersion = 1;
 
 // The document, without a trailing line end. Every figure is the number the
@@ -19,3 +21,5 @@ std::string runResultJson(const RunReport& report);
 // Writes it to `path` through OutputFile (never half-written). Throws
 // std::runtime_error "Cannot write result file: " + path.
 void writeRunResult(const std::string& path, const RunReport& report);
+
+} // namespace report

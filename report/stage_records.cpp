@@ -4,6 +4,8 @@
 
 #include "report/report_data.h"
 
+namespace report {
+
 namespace {
 
 // The report's block grid: 16 blocks along the longer side, about square.
@@ -102,3 +104,5 @@ void recordDeltaAb(RunReport& report, const prep::DeltaAbResult& delta, float th
     report.meanChroma = delta.meanChroma;
     report.deltaStdDev = delta.deltaStdDev;
 }
+
+} // namespace report

@@ -12,6 +12,8 @@
 #include "prep/delta_ab.h"
 #include "report/run_report.h"
 
+namespace report {
+
 // The input image as the run reads it: `depth` is the run's bit depth,
 // `frames` the number averaged; with `fixedNotation` the inspection lines
 // were printed after the debug statistics.
@@ -45,3 +47,5 @@ void recordWhiteBalance(RunReport& report, float red, float blue, const BayerIma
 void recordLuminance(RunReport& report, std::optional<float> residual, float boundPercent);
 
 void recordDeltaAb(RunReport& report, const prep::DeltaAbResult& delta, float threshold);
+
+} // namespace report

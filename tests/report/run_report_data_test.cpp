@@ -10,6 +10,7 @@
 #include "lsc/eval_patch.h"
 #include "report/report_data.h"
 
+namespace report {
 namespace {
 
 BayerImage makeMosaic(int width, int height, std::uint32_t cfa,
@@ -221,3 +222,4 @@ TEST(GainSurface, RefusesUnusableGeometryAndEmptyGrids) {
 }
 
 } // namespace
+} // namespace report

@@ -9,7 +9,7 @@
 
 #include "report/run_report.h"
 
-namespace report_test {
+namespace report::test {
 
 inline ChannelBlockMeans exampleBlocks(int columns, int rows,
                                        float (*value)(int k, double u, double v)) {
@@ -87,4 +87,4 @@ inline RunReport exampleRunReport() {
     return report;
 }
 
-} // namespace report_test
+} // namespace report::test

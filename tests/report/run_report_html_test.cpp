@@ -18,6 +18,7 @@
 #include <dirent.h>
 #include <unistd.h>
 
+namespace report {
 namespace {
 
 using testing_support::readFile;
@@ -89,7 +90,7 @@ TEST_F(ReportPage, CheckerRefusesWhatAPageMustNotHave) {
 }
 
 TEST_F(ReportPage, PassingRunShowsEverySectionWithTheNumbersAsPrinted) {
-    expectValidPage(report_test::exampleRunReport(),
+    expectValidPage(report::test::exampleRunReport(),
                     {"--verdict=pass",
                      "--figures=7",
                      "--section=run",
@@ -122,7 +123,7 @@ TEST_F(ReportPage, PassingRunShowsEverySectionWithTheNumbersAsPrinted) {
 }
 
 TEST_F(ReportPage, ShowsTheShadingBeforeAndTheResidualAfterInPerCent) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.shadingBefore.mean[2][5] = 0.2f;     // darkest green/blue block: a fifth of the peak
     report.residualAfter.mean[3][7] = -0.0125f; // largest blue residual
     expectValidPage(report,
@@ -131,7 +132,7 @@ TEST_F(ReportPage, ShowsTheShadingBeforeAndTheResidualAfterInPerCent) {
 }
 
 TEST_F(ReportPage, ShowsTheLuminanceResidualAgainstItsBound) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.haveLuma = true;
     report.lumaResidual = 0.0234f;
     report.lumaBound = 3.0f;
@@ -142,7 +143,7 @@ TEST_F(ReportPage, ShowsTheLuminanceResidualAgainstItsBound) {
 }
 
 TEST_F(ReportPage, InDebugModeExposureAndGainsShowThreeDecimals) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.inspectionInFixedNotation = true;
     report.gains[3] = 1.5f;
     expectValidPage(report, {"--expect=exposure-time=0.033",
@@ -150,7 +151,7 @@ TEST_F(ReportPage, InDebugModeExposureAndGainsShowThreeDecimals) {
 }
 
 TEST_F(ReportPage, FailedRunNamesTheStageAndKeepsTheMessageAsText) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.finished = false;
     report.failedStage = "Delta ab";
     report.failureMessage =
@@ -181,13 +182,13 @@ TEST_F(ReportPage, RunThatEndedBeforeLoadingShowsWhatItKnows) {
 }
 
 TEST_F(ReportPage, UnfinishedRunWithoutAMessageIsNotAPass) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.finished = false;
     expectValidPage(report, {"--verdict=incomplete"});
 }
 
 TEST_F(ReportPage, XTestRunIsNeverAPassAndWarningsStandUnderTheVerdict) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.xtest = true;
     report.warnings = {"X-test run: <test surface>", "Unknown configuration key a.b (ignored)"};
     expectValidPage(report, {"--verdict=xtest",
@@ -196,7 +197,7 @@ TEST_F(ReportPage, XTestRunIsNeverAPassAndWarningsStandUnderTheVerdict) {
 }
 
 TEST_F(ReportPage, SkippedDeltaAbStageSaysSo) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.haveDelta = false;
     expectValidPage(report, {"--verdict=pass", "--figures=6", "--absent=delta-map",
                              "--expect=delta-ab=Delta ab: not measured in this run.",
@@ -204,7 +205,7 @@ TEST_F(ReportPage, SkippedDeltaAbStageSaysSo) {
 }
 
 TEST_F(ReportPage, FitErrorCheckShowsEachChannelAgainstItsBounds) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.haveFitError = true;
     report.maxErrorBound = 0.2f;
     report.maxRmsBound = 0.05f;
@@ -223,7 +224,7 @@ TEST_F(ReportPage, FitErrorCheckShowsEachChannelAgainstItsBounds) {
 }
 
 TEST_F(ReportPage, SamplePointsAreWrittenOnceAndOnlyThoseInsideTheImage) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.samplePoints = {{0, 0}, {0, 0}, {158, 118}, {160, 0}, {0, 500}};
     const std::string page = runReportHtml(report);
     EXPECT_NE(page.find("d=\"M1 1h0M159 119h0\""), std::string::npos);
@@ -231,7 +232,7 @@ TEST_F(ReportPage, SamplePointsAreWrittenOnceAndOnlyThoseInsideTheImage) {
 }
 
 TEST_F(ReportPage, PatchGeometryWithoutPixelsIsReportedNotDrawn) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.fractions[0] = 0.0;
     expectValidPage(report, {"--figures=3", "--absent=surface-red"});
     EXPECT_NE(runReportHtml(report).find("The patch geometry leaves a patch without pixels"),
@@ -239,7 +240,7 @@ TEST_F(ReportPage, PatchGeometryWithoutPixelsIsReportedNotDrawn) {
 }
 
 TEST(ReportFileNames, MarkupAndBrokenBytesStayText) {
-    RunReport report = report_test::exampleRunReport();
+    RunReport report = report::test::exampleRunReport();
     report.inputPath = "in<put>&\"\xFF.kqraw";
     const std::string page = runReportHtml(report);
     EXPECT_NE(page.find("<code>in&lt;put&gt;&amp;&quot;\xEF\xBF\xBD.kqraw</code>"),
@@ -252,7 +253,7 @@ struct CommaDecimal : std::numpunct<char> {
 };
 
 TEST(ReportBytes, SameReportGivesTheSamePageInAnyLocale) {
-    const RunReport report = report_test::exampleRunReport();
+    const RunReport report = report::test::exampleRunReport();
     const std::string first = runReportHtml(report);
     const std::locale previous =
         std::locale::global(std::locale(std::locale::classic(), new CommaDecimal));
@@ -275,7 +276,7 @@ std::vector<std::string> entries(const std::string& path) {
 
 TEST(WriteRunReport, WritesThePageAndLeavesNothingElse) {
     TempDir dir;
-    const RunReport report = report_test::exampleRunReport();
+    const RunReport report = report::test::exampleRunReport();
     writeRunReport(dir.file("r.html"), report);
     EXPECT_EQ(readFile(dir.file("r.html")), runReportHtml(report));
     EXPECT_EQ(entries(dir.path()), std::vector<std::string>{"r.html"});
@@ -285,13 +286,13 @@ TEST(WriteRunReport, NamesTheFileItCannotWrite) {
     TempDir dir;
     const std::string missing = dir.file("no/such/dir/r.html");
     try {
-        writeRunReport(missing, report_test::exampleRunReport());
+        writeRunReport(missing, report::test::exampleRunReport());
         ADD_FAILURE() << "no error";
     } catch (const std::runtime_error& error) {
         EXPECT_EQ(std::string(error.what()), "Cannot write report file: " + missing);
     }
     try {
-        writeRunReport("/dev/full", report_test::exampleRunReport());
+        writeRunReport("/dev/full", report::test::exampleRunReport());
         ADD_FAILURE() << "no error";
     } catch (const std::runtime_error& error) {
         EXPECT_EQ(std::string(error.what()), "Cannot write report file: /dev/full");
@@ -299,3 +300,4 @@ TEST(WriteRunReport, NamesTheFileItCannotWrite) {
 }
 
 } // namespace
+} // namespace report

@@ -8,6 +8,7 @@
 
 #include "report/report_svg.h"
 
+namespace report {
 namespace {
 
 std::size_t count(const std::string& text, const std::string& part) {
@@ -111,3 +112,4 @@ TEST(SvgOpen, SizesTheDrawingInMillimetresAtTheCommonScale) {
 }
 
 } // namespace
+} // namespace report

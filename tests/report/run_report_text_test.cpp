@@ -6,6 +6,7 @@
 
 #include "report/report_text.h"
 
+namespace report {
 namespace {
 
 TEST(ReportText, EscapesMarkupAndQuotes) {
@@ -58,3 +59,4 @@ TEST(ReportText, NumbersIgnoreTheGlobalLocale) {
 }
 
 } // namespace
+} // namespace report
