@@ -10,6 +10,9 @@
 #include "blob/blob_writer.h"
 #include "config/config_node.h"
 
+using config::config_node;
+using config::config_node_impl;
+
 namespace {
 
 void fillCalibration(config_node& config) {

@@ -9,6 +9,11 @@
 #include "config/config_file.h"
 #include "config/parameter_table.h"
 
+using config::config_node;
+using config::config_node_impl;
+using config::parse_config_text;
+using config::set_defaults;
+
 namespace {
 
 // 10,000 lines in the shapes real files use: scalars, lists, indexed keys,

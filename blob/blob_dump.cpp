@@ -6,6 +6,8 @@
 
 namespace blob {
 
+using config::config_node;
+
 namespace {
 
 // The value text, or empty for a node that is missing or was never set.

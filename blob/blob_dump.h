@@ -16,8 +16,8 @@ namespace blob {
 // register-name prefix of the lens-shading and white-balance values
 // ("reference."). The stream is flushed at the end; the caller checks its
 // state.
-void writeCalibrationText(const config_node& calibration, const std::string& prefix,
-                          const config_node& config, const std::string& toolName,
+void writeCalibrationText(const config::config_node& calibration, const std::string& prefix,
+                          const config::config_node& config, const std::string& toolName,
                           const std::string& toolVersionText, const BlobVersions& versions,
                           std::ostream& out);
 

@@ -16,6 +16,10 @@
 
 namespace blob {
 
+using config::config_node;
+using config::doubleText;
+using config::integerText;
+
 namespace {
 
 [[noreturn]] void fail(const char* message) {

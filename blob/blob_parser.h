@@ -21,7 +21,7 @@ struct BlobVersions {
 // `config`. Throws std::runtime_error with a fixed message on the first
 // problem; blocks stored before it stay in the trees. Each block is read and
 // checked whole before anything of it is stored.
-BlobVersions parseBlob(const std::uint8_t* data, std::size_t size, config_node& calibration,
-                       config_node& config);
+BlobVersions parseBlob(const std::uint8_t* data, std::size_t size, config::config_node& calibration,
+                       config::config_node& config);
 
 } // namespace blob

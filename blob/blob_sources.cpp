@@ -2,6 +2,8 @@
 
 namespace blob {
 
+using config::config_node;
+
 BlobSources blobSourcesFromConfig(const config_node& config) {
     const config_node& shared = config.find("shared");
     const config_node& registers = config.find(shared.find("block_name").as_string());

@@ -7,10 +7,10 @@
 namespace blob {
 
 struct BlobSources {
-    const config_node& registers;     // <block_name>: serial_no, R, GR, GB, B
-    const config_node& controlPoints; // controlPointR ... controlPointB
-    const config_node& module;        // module: serial_no, af.set[i]
-    const config_node& config;        // the "config" node: shared.*, blob.*
+    const config::config_node& registers;     // <block_name>: serial_no, R, GR, GB, B
+    const config::config_node& controlPoints; // controlPointR ... controlPointB
+    const config::config_node& module;        // module: serial_no, af.set[i]
+    const config::config_node& config;        // the "config" node: shared.*, blob.*
 };
 
 // The nodes as the register file lays them out under the "config" node:
@@ -18,6 +18,6 @@ struct BlobSources {
 // shared.block_num_flag is set, under `<block_name>.ctrlPoints[<block_num>]`;
 // autofocus data under `module`. Missing nodes come back as the null node
 // (a negative block number finds none).
-BlobSources blobSourcesFromConfig(const config_node& config);
+BlobSources blobSourcesFromConfig(const config::config_node& config);
 
 } // namespace blob

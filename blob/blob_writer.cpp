@@ -18,6 +18,10 @@
 
 namespace blob {
 
+using config::config_date_seconds;
+using config::config_node;
+using config::config_relative_path;
+
 namespace {
 
 constexpr std::int64_t kMaxU8 = 0xFF;

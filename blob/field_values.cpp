@@ -9,6 +9,10 @@
 
 namespace blob {
 
+using config::config_node;
+using config::config_relative_path;
+using config::integerText;
+
 namespace {
 
 [[noreturn]] void refuse(const config_node& config, const config_node& node,

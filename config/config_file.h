@@ -8,6 +8,8 @@
 
 #include "config/config_node.h"
 
+namespace config {
+
 // Reads the whole file and parses it. Throws std::invalid_argument when the
 // file cannot be read, std::runtime_error when its text does not parse; both
 // carry an ErrorDetail (image/error_detail.h): the path and the system's
@@ -21,3 +23,5 @@ std::string read_config_text(const std::string& path);
 // detail names `sourceName`, when given, before the line).
 void parse_config_text(std::string_view text, config_node& config,
                        const std::string& sourceName = std::string());
+
+} // namespace config

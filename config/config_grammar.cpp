@@ -24,6 +24,8 @@
 #include "image/error_detail.h"
 #include "image/file_ptr.h"
 
+namespace config {
+
 namespace {
 
 namespace qi = boost::spirit::qi;
@@ -151,7 +153,7 @@ private:
         for (Iterator c = step.begin() + 1; c + 1 < step.end(); ++c) {
             index = index * 10 + static_cast<std::uint64_t>(*c - '0');
             if (index > kMaxIndex)
-                throwWithText(place_, config::msg::kKeyIndexTooLarge, keyStart_, step.end());
+                throwWithText(place_, msg::kKeyIndexTooLarge, keyStart_, step.end());
         }
         if (index >= current_->size())
             countNewEntries(index + 1 - current_->size(), step.end());
@@ -167,13 +169,13 @@ private:
 
     void checkKeyLength(Iterator stepEnd) const {
         if (stepEnd - keyStart_ > kMaxKeyLength)
-            throwWithText(place_, config::msg::kKeyTooLong, keyStart_, keyStart_ + kMaxKeyLength);
+            throwWithText(place_, msg::kKeyTooLong, keyStart_, keyStart_ + kMaxKeyLength);
     }
 
     void countNewEntries(std::uint64_t count, Iterator stepEnd) {
         newEntries_ += count;
         if (newEntries_ > kMaxNewEntries)
-            throwWithText(place_, config::msg::kTooManyEntries, keyStart_, stepEnd);
+            throwWithText(place_, msg::kTooManyEntries, keyStart_, stepEnd);
     }
 
     template <typename Number, typename Format>
@@ -196,7 +198,7 @@ private:
     [[noreturn]] void error_handler_impl(Iterator settingStart, Iterator errorPosition,
                                          const boost::spirit::info& expected) const {
         std::ostringstream message;
-        message << config::msg::kParseExpecting << expected << ":\n";
+        message << msg::kParseExpecting << expected << ":\n";
         message.write(settingStart, errorPosition - settingStart);
         throwAt(place_, settingStart, message.str());
     }
@@ -229,9 +231,9 @@ void parse_config_text(std::string_view text, config_node& config, const std::st
     Iterator stop = position;
     while (stop != end && *stop != '\n' && *stop != '\r')
         ++stop;
-    std::string message = config::msg::kParseStopped;
+    std::string message = msg::kParseStopped;
     message += '\n';
-    message += config::msg::kStoppedAt;
+    message += msg::kStoppedAt;
     message += '"';
     message.append(position, stop);
     message += "\"\n";
@@ -242,21 +244,23 @@ std::string read_config_text(const std::string& path) {
     img::FilePtr file(std::fopen(path.c_str(), "rb"));
     if (!file)
         throw DetailedError<std::invalid_argument>(systemReason(path, errno),
-                                                   config::msg::kCannotOpenConfig);
+                                                   msg::kCannotOpenConfig);
     std::string text;
     char chunk[65536];
     std::size_t got = 0;
     while ((got = std::fread(chunk, 1, sizeof chunk, file.get())) > 0) {
         if (text.size() + got > kMaxFileSize)
-            throw DetailedError<std::runtime_error>(path, config::msg::kConfigTooLarge);
+            throw DetailedError<std::runtime_error>(path, msg::kConfigTooLarge);
         text.append(chunk, got);
     }
     if (std::ferror(file.get()))
         throw DetailedError<std::invalid_argument>(systemReason(path, errno),
-                                                   config::msg::kCannotOpenConfig);
+                                                   msg::kCannotOpenConfig);
     return text;
 }
 
 void read_config_file(const std::string& path, config_node& config) {
     parse_config_text(read_config_text(path), config, path);
 }
+
+} // namespace config

@@ -13,6 +13,8 @@
 #include "config/value_text.h"
 #include "image/error_detail.h"
 
+namespace config {
+
 namespace {
 
 // Indices above this are refused: an index is a small list position, and a
@@ -27,7 +29,7 @@ constexpr std::size_t kMaxPathLength = config::kMaxKeyLength;
 constexpr std::size_t kMaxNewEntries = 262144;
 
 [[noreturn]] void throwNoneHasNoValue() {
-    throw std::invalid_argument(config::msg::kNoneHasNoValue);
+    throw std::invalid_argument(msg::kNoneHasNoValue);
 }
 
 // The key as the configuration file writes it: "root.config.lsc.max_gain"
@@ -63,7 +65,7 @@ struct PathStep {
 };
 
 [[noreturn]] void throwBadPath(const std::string& path) {
-    throw std::invalid_argument(config::msg::kBadPathPrefix + path);
+    throw std::invalid_argument(msg::kBadPathPrefix + path);
 }
 
 // As the configuration grammar's names (block names may hold a dash).
@@ -134,8 +136,7 @@ const config_node& config_node::find_path(const std::string& path) const {
 
 config_node& config_node::child_path(const std::string& path) {
     if (path.size() > kMaxPathLength)
-        throw std::invalid_argument(config::msg::kPathTooLongPrefix +
-                                    path.substr(0, kMaxPathLength));
+        throw std::invalid_argument(msg::kPathTooLongPrefix + path.substr(0, kMaxPathLength));
     std::size_t newEntries = 0;
     return walkPath(*this, path, [&](config_node& node, const PathStep& step) -> config_node& {
         // Counted before anything is created; an index beyond the limit is
@@ -144,7 +145,7 @@ config_node& config_node::child_path(const std::string& path) {
                          : !node.find(step.name).valid())
             newEntries += step.isIndex ? step.index + 1 - node.size() : 1;
         if (newEntries > kMaxNewEntries)
-            throw std::out_of_range(config::msg::kPathTooManyEntriesPrefix + path);
+            throw std::out_of_range(msg::kPathTooManyEntriesPrefix + path);
         return step.isIndex ? node.child(step.index) : node.child(step.name);
     });
 }
@@ -177,8 +178,8 @@ config_node_impl::~config_node_impl() {
 
 void config_node_impl::checkInitialized() const {
     if (!initialized_)
-        throw std::invalid_argument(config::msg::kNotInitializedPrefix + name_ +
-                                    config::msg::kNotInitializedSuffix);
+        throw std::invalid_argument(msg::kNotInitializedPrefix + name_ +
+                                    msg::kNotInitializedSuffix);
 }
 
 const std::string& config_node_impl::as_string() const {
@@ -225,9 +226,8 @@ const config_node& config_node_impl::find(const std::string& name) const {
 
 config_node& config_node_impl::child(std::size_t index) {
     if (index > kMaxIndex)
-        throw std::out_of_range(config::msg::kIndexTooLargePrefix + std::to_string(index) +
-                                config::msg::kIndexTooLargeMiddle + name_ +
-                                config::msg::kIndexTooLargeSuffix);
+        throw std::out_of_range(msg::kIndexTooLargePrefix + std::to_string(index) +
+                                msg::kIndexTooLargeMiddle + name_ + msg::kIndexTooLargeSuffix);
     if (index >= indexed_.size()) {
         // No exact reserve here: lists grow one index at a time, and
         // push_back's geometric growth keeps that linear.
@@ -306,3 +306,5 @@ std::string config_relative_path(const config_node& configNode, const config_nod
         return full.substr(base.size() + 1);
     return full;
 }
+
+} // namespace config

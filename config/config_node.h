@@ -11,6 +11,8 @@
 #include <string>
 #include <vector>
 
+namespace config {
+
 class config_node {
 public:
     virtual ~config_node() = default;
@@ -119,3 +121,5 @@ private:
 // The path of a node relative to the "config" node, as messages name it:
 // "root.config.lsc.max_gain" -> "lsc.max_gain".
 std::string config_relative_path(const config_node& configNode, const config_node& parameter);
+
+} // namespace config

@@ -8,6 +8,8 @@
 #include "config/parameter_table.h"
 #include "config/value_text.h"
 
+namespace config {
+
 namespace {
 
 const config_node& setting(const config_node& config, const char* section, const char* key) {
@@ -37,7 +39,7 @@ void loadDeltaAbBlocks(const config_node& config, std::int32_t width, std::int32
     const config_node& blocks = setting(config, "apply_lsc", "delta_ab_blocks");
     // Columns and rows: a third value would be ignored without a word.
     if (blocks.size() != 2)
-        throw std::range_error(config::msg::kDeltaAbBlocksNotTwo);
+        throw std::range_error(msg::kDeltaAbBlocksNotTwo);
     const int horizontal = blocks.find(0).as_int();
     const int vertical = blocks.find(1).as_int();
     if (horizontal != 0 || vertical != 0) {
@@ -60,8 +62,8 @@ void loadDeltaAbBlocks(const config_node& config, std::int32_t width, std::int32
     }
     if (settings.deltaAbBlocks[0] < 1 || settings.deltaAbBlocks[0] > width ||
         settings.deltaAbBlocks[1] > height)
-        throw std::range_error(config::msg::kNoDeltaAbBlocksPrefix + integerText(width) + "x" +
-                               integerText(height) + config::msg::kNoDeltaAbBlocksSuffix);
+        throw std::range_error(msg::kNoDeltaAbBlocksPrefix + integerText(width) + "x" +
+                               integerText(height) + msg::kNoDeltaAbBlocksSuffix);
 }
 
 } // namespace
@@ -101,9 +103,11 @@ ShadingSettings load_fit_settings(const config_node& config, const BayerImage& i
     if (bits == 0)
         bits = image.bitsPerSample();
     if (bits <= 0)
-        throw std::runtime_error(config::msg::kZeroBitDepth);
+        throw std::runtime_error(msg::kZeroBitDepth);
     const std::uint32_t fullScale = bits >= 32 ? 0xFFFFFFFFu : (1u << bits) - 1u;
     settings.blackLevel =
         setting(config, "proc", "black_level").as_float() / static_cast<float>(fullScale);
     return settings;
 }
+
+} // namespace config

@@ -7,8 +7,12 @@
 #include "image/bayer_image.h"
 #include "lsc/shading_settings.h"
 
+namespace config {
+
 // Reads below the "config" node; `image` gives width, height and bit depth.
 // Throws the getters' errors, std::range_error for delta-ab block counts that
 // leave a block empty, std::runtime_error for an image without bit depth.
 // The quiet flag stays false (it comes from the command line).
 ShadingSettings load_fit_settings(const config_node& config, const BayerImage& image);
+
+} // namespace config

@@ -8,6 +8,8 @@
 #include "config/config_messages.h"
 #include "config/value_text.h"
 
+namespace config {
+
 namespace {
 
 // Layout: the words "config" and "auto".
@@ -106,35 +108,34 @@ void checkEntry(const config_node& config, const Parameter& parameter) {
     if (parameter.check == Check::Layout) {
         const std::string value = node.as_string();
         if (value != "config" && value != "auto")
-            throw std::range_error(config::msg::kValueSpecifiedFor +
-                                   config_relative_path(config, node) +
-                                   config::msg::kMustBeConfigOrAuto);
+            throw std::range_error(msg::kValueSpecifiedFor + config_relative_path(config, node) +
+                                   msg::kMustBeConfigOrAuto);
         return;
     }
     check_int_range(config, node, static_cast<int>(parameter.low),
                     static_cast<int>(parameter.high));
     // A window centred on a sample needs an odd size.
     if (parameter.check == Check::OddInt && node.as_int() % 2 == 0)
-        throw std::range_error(config::msg::kValueSpecifiedFor +
-                               config_relative_path(config, node) + config::msg::kMustBeOdd);
+        throw std::range_error(msg::kValueSpecifiedFor + config_relative_path(config, node) +
+                               msg::kMustBeOdd);
 }
 
 void checkBlockName(const std::string& name) {
     if (name.empty())
-        throw std::range_error(config::msg::kEmptyBlockName);
+        throw std::range_error(msg::kEmptyBlockName);
     // Every register key starts with it; the longest must stay a valid key.
     static_assert(config::kMaxBlockNameLength == 987, "kBlockNameTooLong names the limit");
     if (name.size() > config::kMaxBlockNameLength)
-        throw std::range_error(config::msg::kBlockNameTooLong);
+        throw std::range_error(msg::kBlockNameTooLong);
     auto isLetter = [](char c) { return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z'); };
     auto isNameChar = [&](char c) {
         return isLetter(c) || (c >= '0' && c <= '9') || c == '-' || c == '_';
     };
     if (!isLetter(name.front()))
-        throw std::range_error(config::msg::kBadBlockName);
+        throw std::range_error(msg::kBadBlockName);
     for (char c : name)
         if (!isNameChar(c))
-            throw std::range_error(config::msg::kBadBlockName);
+            throw std::range_error(msg::kBadBlockName);
 }
 
 // Bounds as a stream writes a float by default: up to six significant digits.
@@ -147,10 +148,8 @@ std::string boundText(double bound) {
 
 [[noreturn]] void throwOutOfRange(const config_node& config, const config_node& parameter,
                                   bool tooLow, const std::string& low, const std::string& high) {
-    throw std::range_error(config::msg::kValueSpecifiedFor +
-                           config_relative_path(config, parameter) +
-                           (tooLow ? config::msg::kTooLow : config::msg::kTooHigh) + low +
-                           config::msg::kAnd + high + ".");
+    throw std::range_error(msg::kValueSpecifiedFor + config_relative_path(config, parameter) +
+                           (tooLow ? msg::kTooLow : msg::kTooHigh) + low + msg::kAnd + high + ".");
 }
 
 // Days from 1970-01-01 to year/month/day of the proleptic Gregorian calendar
@@ -254,6 +253,8 @@ std::int64_t config_date_seconds(const std::string& text) {
                     readNumber(text, pos, minute) && pos == text.size();
     if (!ok || year > 9999 || month < 1 || month > 12 || day < 1 ||
         day > daysInMonth(year, month) || hour > 23 || minute > 59)
-        throw std::invalid_argument(config::msg::kInvalidDate);
+        throw std::invalid_argument(msg::kInvalidDate);
     return daysFromCivil(year, month, day) * 86400 + hour * 3600 + minute * 60;
 }
+
+} // namespace config

@@ -7,6 +7,8 @@
 
 #include "config/config_node.h"
 
+namespace config {
+
 // Writes every default (marked as default) under the "config" node.
 void set_defaults(config_node& config);
 
@@ -28,3 +30,5 @@ std::string block_prefix(const config_node& root);
 // Seconds since 1970-01-01 00:00 UTC of a "YYYY-MM-DDTHH:MM" text, whatever the
 // machine's time zone. Throws std::invalid_argument for any other text.
 std::int64_t config_date_seconds(const std::string& text);
+
+} // namespace config

@@ -6,6 +6,8 @@
 #include "config/config_messages.h"
 #include "config/value_text.h"
 
+namespace config {
+
 namespace {
 
 constexpr const char* kLegacyKeys[] = {"leftPatchWidth", "centerPatchWidth", "topPatchHeight",
@@ -37,8 +39,7 @@ bool allInitialized(const config_node& data, const char* const (&keys)[N]) {
 
 // "<key> from input data does not match lsc.<key> in configuration file."
 [[noreturn]] void throwMismatch(const char* key) {
-    throw std::runtime_error(std::string(key) + config::msg::kMismatchMiddle + key +
-                             config::msg::kMismatchSuffix);
+    throw std::runtime_error(std::string(key) + msg::kMismatchMiddle + key + msg::kMismatchSuffix);
 }
 
 void setFractions(PatchLayout& layout, const double (&fractions)[4]) {
@@ -51,7 +52,7 @@ void setFractions(PatchLayout& layout, const double (&fractions)[4]) {
 void readLegacyGeometry(const config_node& lsc, const config_node& data, float width, float height,
                         PatchLayout& layout) {
     if (!allInitialized(data, kLegacyKeys))
-        throw std::runtime_error(config::msg::kMissingPatchSizes);
+        throw std::runtime_error(msg::kMissingPatchSizes);
     int sizes[4];
     for (int i = 0; i < 4; ++i)
         sizes[i] = data.find(kLegacyKeys[i]).as_int();
@@ -60,7 +61,7 @@ void readLegacyGeometry(const config_node& lsc, const config_node& data, float w
                   static_cast<float>(sizes[2]) / height, static_cast<float>(sizes[3]) / height});
     if (lsc.find("left_patch_width").is_default()) {
         if (!lsc.find("leftPatchFactor").is_default())
-            throw std::runtime_error(config::msg::kConfigWithoutLegacyDataWithLegacy);
+            throw std::runtime_error(msg::kConfigWithoutLegacyDataWithLegacy);
         return;
     }
     for (int i = 0; i < 4; ++i)
@@ -72,7 +73,7 @@ void readFactorGeometry(const config_node& lsc, const config_node& data, std::in
                         std::int32_t height, PatchLayout& layout) {
     if (!allInitialized(data, kFactorKeys) || !data.find("imageWidth").initialized() ||
         !data.find("imageHeight").initialized())
-        throw std::runtime_error(config::msg::kMissingPatchSizes);
+        throw std::runtime_error(msg::kMissingPatchSizes);
     float factors[4];
     for (int i = 0; i < 4; ++i)
         factors[i] = data.find(kFactorKeys[i]).as_float();
@@ -80,13 +81,13 @@ void readFactorGeometry(const config_node& lsc, const config_node& data, std::in
     const int dataWidth = data.find("imageWidth").as_int();
     const int dataHeight = data.find("imageHeight").as_int();
     if (dataWidth != width || dataHeight != height)
-        throw std::range_error(config::msg::kDimensionsPrefix + integerText(width) + "x" +
-                               integerText(height) + config::msg::kDimensionsMiddle +
+        throw std::range_error(msg::kDimensionsPrefix + integerText(width) + "x" +
+                               integerText(height) + msg::kDimensionsMiddle +
                                integerText(dataWidth) + "x" + integerText(dataHeight) +
-                               config::msg::kDimensionsSuffix);
+                               msg::kDimensionsSuffix);
     if (lsc.find("leftPatchFactor").is_default()) {
         if (!lsc.find("left_patch_width").is_default())
-            throw std::runtime_error(config::msg::kConfigWithLegacyDataWithout);
+            throw std::runtime_error(msg::kConfigWithLegacyDataWithout);
         return;
     }
     for (int i = 0; i < 4; ++i)
@@ -103,7 +104,7 @@ void readFactorGeometry(const config_node& lsc, const config_node& data, std::in
 StoredCalibration readConfigParam(const config_node& root, const config_node& data,
                                   const BayerImage& image, const ShadingCorrection& fitted) {
     if (image.empty())
-        throw std::runtime_error(config::msg::kImageNotSet);
+        throw std::runtime_error(msg::kImageNotSet);
     const std::int32_t width = image.width();
     const std::int32_t height = image.height();
     const config_node& lsc = root.find("config").find("lsc");
@@ -132,3 +133,5 @@ StoredCalibration readConfigParam(const config_node& root, const config_node& da
                 static_cast<float>(data.find(kWhiteBalanceKeys[channel]).as_int());
     return stored;
 }
+
+} // namespace config

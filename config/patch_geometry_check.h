@@ -8,6 +8,8 @@
 #include "image/bayer_image.h"
 #include "lsc/fit_result.h"
 
+namespace config {
+
 // What stored calibration data hold: the correction (patch layout and
 // control points) and the white-balance levels.
 struct StoredCalibration {
@@ -23,3 +25,5 @@ struct StoredCalibration {
 // std::runtime_error for the other mismatches.
 StoredCalibration readConfigParam(const config_node& root, const config_node& data,
                                   const BayerImage& image, const ShadingCorrection& fitted);
+
+} // namespace config

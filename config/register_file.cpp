@@ -12,6 +12,8 @@
 #include "image/output_file.h"
 #include "lsc/patch_geometry.h"
 
+namespace config {
+
 namespace {
 
 constexpr const char* kChannelRegisters[kChannels] = {"R", "GR", "GB", "B"};
@@ -50,12 +52,11 @@ private:
 void checkExportedSizes(const ExportedPatchSizes& s, std::int32_t width, std::int32_t height) {
     if (std::min({s.left, s.center, s.right, s.top, s.middle, s.bottom}) >= 2)
         return;
-    throw std::runtime_error(config::msg::kBadExportedGeometryPrefix + integerText(width) + "x" +
-                             integerText(height) + config::msg::kBadExportedGeometryMiddle +
-                             integerText(s.left) + ", " + integerText(s.center) + ", " +
-                             integerText(s.right) + " x " + integerText(s.top) + ", " +
-                             integerText(s.middle) + ", " + integerText(s.bottom) +
-                             config::msg::kBadExportedGeometrySuffix);
+    throw std::runtime_error(
+        msg::kBadExportedGeometryPrefix + integerText(width) + "x" + integerText(height) +
+        msg::kBadExportedGeometryMiddle + integerText(s.left) + ", " + integerText(s.center) +
+        ", " + integerText(s.right) + " x " + integerText(s.top) + ", " + integerText(s.middle) +
+        ", " + integerText(s.bottom) + msg::kBadExportedGeometrySuffix);
 }
 
 void writeGeometry(RegisterText& out, const config_node& lsc, const ExportedPatchSizes& sizes,
@@ -80,9 +81,8 @@ void writeGeometry(RegisterText& out, const config_node& lsc, const ExportedPatc
 // wrap around to a small number; negative targets give 0.
 std::uint32_t whiteBalanceLevel(float target, std::uint32_t fullScale, int channel) {
     if (!std::isfinite(target))
-        throw std::runtime_error(config::msg::kNonFiniteLevelPrefix +
-                                 std::string(kChannelNames[channel]) +
-                                 config::msg::kNonFiniteLevelSuffix);
+        throw std::runtime_error(msg::kNonFiniteLevelPrefix + std::string(kChannelNames[channel]) +
+                                 msg::kNonFiniteLevelSuffix);
     const float level = std::floor(0.5f + static_cast<float>(fullScale) * target);
     const std::uint32_t limit = std::min<std::uint32_t>(fullScale, 0xFFFFu);
     if (!(level > 0.0f))
@@ -118,7 +118,7 @@ std::string serialValue(const std::string& serial) {
     if (isPlainToken(serial))
         return serial;
     if (serial.find('"') != std::string::npos)
-        throw std::runtime_error(config::msg::kQuoteInSerial);
+        throw std::runtime_error(msg::kQuoteInSerial);
     return "\"" + serial + "\"";
 }
 
@@ -150,9 +150,9 @@ void writeControlPoints(RegisterText& out, const std::string& infix, const FitRe
             const double value = fit.correction.controlGrids[channel][n];
             const std::string text = generalText(value, 12);
             if (!std::isfinite(value))
-                throw std::runtime_error(config::msg::kNonFiniteControlPointPrefix +
+                throw std::runtime_error(msg::kNonFiniteControlPointPrefix +
                                          name.substr(infix.size() + 1) +
-                                         config::msg::kNonFiniteControlPointSuffix + text);
+                                         msg::kNonFiniteControlPointSuffix + text);
             // An infix starts with its own "." and the prefix already ends in one.
             out.assign(name.substr(1) + "  ", text);
         }
@@ -210,9 +210,11 @@ std::string write_register_file(const std::string& path, const config_node& conf
         register_file_text(config, blockName, controlPointInfix, commandLineText, fit, image);
     OutputFile file;
     if (!file.open(path))
-        throw std::runtime_error(config::msg::kCannotWriteCalibration);
+        throw std::runtime_error(msg::kCannotWriteCalibration);
     const bool written = std::fwrite(text.data(), 1, text.size(), file.stream()) == text.size();
     if (!written || !file.commit())
-        throw std::runtime_error(config::msg::kCannotWriteCalibration);
+        throw std::runtime_error(msg::kCannotWriteCalibration);
     return text;
 }
+
+} // namespace config

@@ -9,6 +9,8 @@
 #include "image/bayer_image.h"
 #include "lsc/fit_result.h"
 
+namespace config {
+
 // Builds the whole text first, so that a geometry or value the file cannot
 // hold is refused before anything is written, then writes it through a
 // temporary file renamed into place. `blockName` prefixes every register;
@@ -30,3 +32,5 @@ std::string register_file_text(const config_node& config, const std::string& blo
                                const std::string& controlPointInfix,
                                const std::string& commandLineText, const FitResult& fit,
                                const BayerImage& image);
+
+} // namespace config

@@ -1,5 +1,7 @@
 #include "config/strip_comments.h"
 
+namespace config {
+
 std::string strip_comments::strip(const std::string& line, char commentChar) {
     enum class Quoting { Outside, Inside, JustClosed };
     Quoting state = Quoting::Outside;
@@ -28,3 +30,5 @@ std::string strip_comments::strip(const std::string& line, char commentChar) {
     }
     return line;
 }
+
+} // namespace config

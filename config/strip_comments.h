@@ -7,6 +7,8 @@
 
 #include <boost/iostreams/filter/line.hpp>
 
+namespace config {
+
 class strip_comments : public boost::iostreams::line_filter {
 public:
     explicit strip_comments(char commentChar) : commentChar_(commentChar) {}
@@ -20,3 +22,5 @@ private:
 
     char commentChar_;
 };
+
+} // namespace config

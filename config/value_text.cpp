@@ -8,6 +8,8 @@
 
 #include "image/number_scan.h"
 
+namespace config {
+
 namespace {
 
 bool equalsIgnoringCase(std::string_view text, std::string_view lowerWord) {
@@ -62,3 +64,5 @@ std::string doubleText(double value) {
         std::to_chars(buffer, buffer + sizeof buffer, value, std::chars_format::general, 17);
     return std::string(buffer, result.ptr);
 }
+
+} // namespace config

@@ -7,6 +7,8 @@
 #include <string>
 #include <string_view>
 
+namespace config {
+
 // Whole-text signed 32-bit integer: an optional "-" or "+", then one or more
 // decimal digits and nothing else. False when the text does not match or the
 // number lies outside -2147483648..2147483647.
@@ -24,3 +26,5 @@ std::string integerText(std::int64_t value);
 // printf "%.17g" as the "C" locale writes it; "inf", "-inf", "nan", "-nan"
 // for the non-finite values.
 std::string doubleText(double value);
+
+} // namespace config

@@ -6,6 +6,12 @@
 
 namespace driver {
 
+using config::config_node;
+using config::config_node_impl;
+using config::config_relative_path;
+using config::parse_config_text;
+using config::read_config_text;
+
 namespace {
 
 // The first setting of `added` (a tree of the file alone) that is not

@@ -17,6 +17,6 @@ namespace driver {
 // "The autofocus file may only add autofocus data (module.*); it sets <key>,
 // which would change the calibration data." Nothing is added then. Read
 // errors as read_config_file.
-void readAutofocusFile(const std::string& path, config_node& config);
+void readAutofocusFile(const std::string& path, config::config_node& config);
 
 } // namespace driver

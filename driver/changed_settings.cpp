@@ -5,6 +5,12 @@
 
 namespace driver {
 
+using config::config_node;
+using config::config_node_impl;
+using config::config_relative_path;
+using config::parseFloatText;
+using config::set_defaults;
+
 namespace {
 
 bool sameValue(const std::string& value, const config_node& defaultNode) {

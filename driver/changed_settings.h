@@ -12,6 +12,7 @@ namespace driver {
 // parameter table's default (or that the table does not know), as (path
 // relative to "config", value), in the order the tree prints them. A value
 // given in the file that equals its default, as number or as text, is left out.
-std::vector<std::pair<std::string, std::string>> changedSettings(const config_node_impl& config);
+std::vector<std::pair<std::string, std::string>>
+changedSettings(const config::config_node_impl& config);
 
 } // namespace driver

@@ -22,6 +22,8 @@
 
 namespace driver {
 
+using config::strip_comments;
+
 namespace po = boost::program_options;
 
 namespace {

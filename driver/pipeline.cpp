@@ -50,6 +50,18 @@
 
 namespace driver {
 
+using config::check_int_range;
+using config::config_node;
+using config::config_node_impl;
+using config::load_fit_settings;
+using config::parse_config_text;
+using config::read_config_file;
+using config::readConfigParam;
+using config::set_defaults;
+using config::StoredCalibration;
+using config::validate;
+using config::write_register_file;
+
 namespace {
 
 std::ostream& out() {

@@ -89,8 +89,8 @@ private:
     StageTimer timer_;
     CommandLine commandLine_;
     RunSettings settings_;
-    std::shared_ptr<config_node_impl> root_;
-    config_node_impl* config_ = nullptr;
+    std::shared_ptr<config::config_node_impl> root_;
+    config::config_node_impl* config_ = nullptr;
 
     int depth_ = 0;               // bit depth of the run
     std::uint32_t fullScale_ = 0; // 2^depth - 1

@@ -2,6 +2,8 @@
 
 namespace driver {
 
+using config::config_node;
+
 RunSettings readRunSettings(const CommandLine& line, const config_node& config) {
     RunSettings s;
     s.input = line.value("input");

@@ -31,6 +31,6 @@ struct RunSettings {
     std::string controlPointInfix;
 };
 
-RunSettings readRunSettings(const CommandLine& line, const config_node& config);
+RunSettings readRunSettings(const CommandLine& line, const config::config_node& config);
 
 } // namespace driver

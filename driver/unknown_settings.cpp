@@ -6,6 +6,10 @@
 
 namespace driver {
 
+using config::config_node_impl;
+using config::config_relative_path;
+using config::set_defaults;
+
 namespace {
 
 // Every key of a tree that holds a value, depth-first in print order.

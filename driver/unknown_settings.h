@@ -16,7 +16,7 @@ namespace driver {
 // proc.min_pixel_val?". Known are the parameter table's keys, the register
 // file's keys (under `blockName` and global.configType/configVersion) and the
 // autofocus data (module.*).
-std::vector<std::string> unknownSettingWarnings(const config_node_impl& config,
+std::vector<std::string> unknownSettingWarnings(const config::config_node_impl& config,
                                                 const std::string& blockName);
 
 // Levenshtein distance (insertions, deletions and substitutions of one byte).

@@ -16,6 +16,9 @@
 #include "blob/md5.h"
 #include "config/config_node.h"
 
+using config::config_node;
+using config::config_node_impl;
+
 namespace {
 
 void parseAndDump(const std::uint8_t* data, std::size_t size) {

@@ -10,6 +10,10 @@
 
 #include "config/config_file.h"
 
+using config::config_node;
+using config::config_node_impl;
+using config::parse_config_text;
+
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     config_node_impl root("root");
     config_node& config = root.child("config");

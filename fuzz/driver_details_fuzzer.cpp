@@ -18,6 +18,8 @@
 #include "image/image_buffer.h"
 #include "lsc/apan_exception.h"
 
+using config::strip_comments;
+
 namespace {
 
 using driver::HeaderlessRawDetails;

@@ -7,6 +7,9 @@
 #include "blob_test_builder.h"
 
 namespace blob {
+
+using config::config_node;
+using config::config_node_impl;
 namespace {
 
 using test::BlobBuilder;

@@ -12,6 +12,10 @@
 #include "config/config_file.h"
 
 namespace blob {
+
+using config::config_node;
+using config::config_node_impl;
+using config::parse_config_text;
 namespace {
 
 using Bytes = std::vector<std::uint8_t>;

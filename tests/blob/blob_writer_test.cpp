@@ -13,6 +13,9 @@
 #include "reference_md5.h"
 
 namespace blob {
+
+using config::config_node;
+using config::config_node_impl;
 namespace {
 
 using test::Bytes;

@@ -7,6 +7,9 @@
 #include "blob/field_values.h"
 
 namespace blob {
+
+using config::config_node;
+using config::config_node_impl;
 namespace {
 
 class FieldValues : public ::testing::Test {

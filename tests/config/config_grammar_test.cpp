@@ -8,6 +8,7 @@
 #include "config/config_file.h"
 #include "tests/support/temp_dir.h"
 
+namespace config {
 namespace {
 
 class ConfigGrammarTest : public ::testing::Test {
@@ -248,3 +249,4 @@ TEST_F(ConfigGrammarTest, UnreadableFileIsReported) {
 }
 
 } // namespace
+} // namespace config

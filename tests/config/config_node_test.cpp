@@ -14,6 +14,7 @@
 
 #include <pthread.h>
 
+namespace config {
 namespace {
 
 std::string messageOf(const std::function<void()>& action) {
@@ -309,3 +310,4 @@ TEST_F(ConfigNodeTest, PathLongerThanAKeyIsRefused) {
 }
 
 } // namespace
+} // namespace config

@@ -8,6 +8,7 @@
 #include "config/fit_settings.h"
 #include "config/parameter_table.h"
 
+namespace config {
 namespace {
 
 BayerImage imageOf(std::int32_t width, std::int32_t height, std::uint16_t bits = 10) {
@@ -168,3 +169,4 @@ TEST_F(FitSettingsTest, ConversionErrorsPassThrough) {
 }
 
 } // namespace
+} // namespace config

@@ -10,6 +10,7 @@
 #include "config/config_file.h"
 #include "config/parameter_table.h"
 
+namespace config {
 namespace {
 
 class ParameterTableTest : public ::testing::Test {
@@ -266,3 +267,4 @@ TEST(ConfigDate, RefusesOtherShapes) {
 }
 
 } // namespace
+} // namespace config

@@ -8,6 +8,7 @@
 #include "config/parameter_table.h"
 #include "config/patch_geometry_check.h"
 
+namespace config {
 namespace {
 
 class PatchGeometryCheckTest : public ::testing::Test {
@@ -193,3 +194,4 @@ TEST_F(PatchGeometryCheckTest, ControlPointThatIsNoNumberGivesTheConversionError
 }
 
 } // namespace
+} // namespace config

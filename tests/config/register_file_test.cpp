@@ -12,6 +12,7 @@
 #include "config/register_file.h"
 #include "tests/support/temp_dir.h"
 
+namespace config {
 namespace {
 
 class RegisterFileTest : public ::testing::Test {
@@ -293,3 +294,4 @@ TEST_F(RegisterFileTest, WriteErrorsAreReported) {
 }
 
 } // namespace
+} // namespace config

@@ -7,6 +7,7 @@
 
 #include "config/strip_comments.h"
 
+namespace config {
 namespace {
 
 TEST(StripComments, CutsAtTheFirstCommentOutsideQuotes) {
@@ -36,3 +37,4 @@ TEST(StripComments, StackedFiltersRemoveBothCommentStyles) {
 }
 
 } // namespace
+} // namespace config

@@ -5,6 +5,7 @@
 
 #include "config/value_text.h"
 
+namespace config {
 namespace {
 
 TEST(DoubleText, WritesSeventeenSignificantDigits) {
@@ -31,3 +32,4 @@ TEST(IntegerText, WritesPlainDecimal) {
 }
 
 } // namespace
+} // namespace config

@@ -4,6 +4,10 @@
 #include "config/parameter_table.h"
 #include "driver/changed_settings.h"
 
+using config::config_node_impl;
+using config::parse_config_text;
+using config::set_defaults;
+
 namespace {
 
 using driver::changedSettings;

@@ -9,6 +9,9 @@
 #include "tests/e2e/e2e_fixture.h"
 
 namespace e2e {
+
+using config::config_node_impl;
+using config::set_defaults;
 namespace {
 
 // The man page as a reader sees its words: no font changes, minus signs and
