@@ -17,6 +17,19 @@
 #include "lsc/sample_collection.h"
 #include "lsc/shading_settings.h"
 
+using lsc::applyLensShading;
+using lsc::collectSamples;
+using lsc::FitDeviations;
+using lsc::fitLensShading;
+using lsc::FitResult;
+using lsc::kChannels;
+using lsc::kGridPoints;
+using lsc::patchSurface;
+using lsc::SampleSet;
+using lsc::ShadingCorrection;
+using lsc::shadingSample;
+using lsc::ShadingSettings;
+
 namespace {
 
 // A lens-like flat field: each channel falls to about half at the corners.

@@ -41,6 +41,15 @@
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
 
+using lsc::applyLensShading;
+using lsc::collectSamples;
+using lsc::FitDeviations;
+using lsc::fitLensShading;
+using lsc::FitResult;
+using lsc::levelledImage;
+using lsc::SampleSet;
+using lsc::ShadingSettings;
+
 namespace {
 
 using testing_support::FlatField;

@@ -45,6 +45,9 @@
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
 
+using lsc::applyLensShading;
+using lsc::ShadingCorrection;
+
 namespace {
 
 using testing_support::FlatField;

@@ -10,6 +10,9 @@
 
 namespace config {
 
+using lsc::PatchLayout;
+using lsc::ShadingSettings;
+
 namespace {
 
 const config_node& setting(const config_node& config, const char* section, const char* key) {

@@ -8,6 +8,11 @@
 
 namespace config {
 
+using lsc::kChannels;
+using lsc::kGridPoints;
+using lsc::PatchLayout;
+using lsc::ShadingCorrection;
+
 namespace {
 
 constexpr const char* kLegacyKeys[] = {"leftPatchWidth", "centerPatchWidth", "topPatchHeight",

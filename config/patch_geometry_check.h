@@ -13,8 +13,8 @@ namespace config {
 // What stored calibration data hold: the correction (patch layout and
 // control points) and the white-balance levels.
 struct StoredCalibration {
-    ShadingCorrection correction;
-    float whiteBalance[kChannels] = {0, 0, 0, 0};
+    lsc::ShadingCorrection correction;
+    float whiteBalance[lsc::kChannels] = {0, 0, 0, 0};
 };
 
 // `root` is the configuration tree's root (read as config.lsc.*); `data`
@@ -24,6 +24,6 @@ struct StoredCalibration {
 // Throws std::range_error when the sensor size does not match,
 // std::runtime_error for the other mismatches.
 StoredCalibration readConfigParam(const config_node& root, const config_node& data,
-                                  const BayerImage& image, const ShadingCorrection& fitted);
+                                  const BayerImage& image, const lsc::ShadingCorrection& fitted);
 
 } // namespace config

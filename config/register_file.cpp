@@ -14,6 +14,15 @@
 
 namespace config {
 
+using lsc::ExportedPatchSizes;
+using lsc::exportedPatchSizes;
+using lsc::FitResult;
+using lsc::kChannelNames;
+using lsc::kChannels;
+using lsc::kGridPoints;
+using lsc::PatchStep;
+using lsc::patchStep;
+
 namespace {
 
 constexpr const char* kChannelRegisters[kChannels] = {"R", "GR", "GB", "B"};

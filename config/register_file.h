@@ -24,13 +24,13 @@ namespace config {
 // device (/dev/null, a pipe) may answer differently.
 std::string write_register_file(const std::string& path, const config_node& config,
                                 const std::string& blockName, const std::string& controlPointInfix,
-                                const std::string& commandLineText, const FitResult& fit,
+                                const std::string& commandLineText, const lsc::FitResult& fit,
                                 const BayerImage& image);
 
 // The text alone (same checks, nothing written).
 std::string register_file_text(const config_node& config, const std::string& blockName,
                                const std::string& controlPointInfix,
-                               const std::string& commandLineText, const FitResult& fit,
+                               const std::string& commandLineText, const lsc::FitResult& fit,
                                const BayerImage& image);
 
 } // namespace config

@@ -13,6 +13,10 @@
 
 namespace driver {
 
+using lsc::applyLensShading;
+using lsc::kChannels;
+using lsc::ShadingCorrection;
+
 void writeCheckImage(const std::string& path, BayerImage capture,
                      const ShadingCorrection& correction, float blackLevel,
                      const float (&targetLevels)[kChannels]) {

@@ -19,7 +19,7 @@ namespace driver {
 // its size and Bayer order are needed afterwards). Throws std::runtime_error
 // "Cannot store check image: <path>" when it cannot be written.
 void writeCheckImage(const std::string& path, BayerImage capture,
-                     const ShadingCorrection& correction, float blackLevel,
-                     const float (&targetLevels)[kChannels]);
+                     const lsc::ShadingCorrection& correction, float blackLevel,
+                     const float (&targetLevels)[lsc::kChannels]);
 
 } // namespace driver

@@ -50,6 +50,20 @@
 
 namespace driver {
 
+using lsc::applyLensShading;
+using lsc::applyXTestSurface;
+using lsc::chooseLayout;
+using lsc::collectSamples;
+using lsc::fitLensShading;
+using lsc::FitResult;
+using lsc::kChannels;
+using lsc::LayoutChoice;
+using lsc::levelledImage;
+using lsc::PatchLayout;
+using lsc::SampleOrigin;
+using lsc::ShadingCorrection;
+using lsc::ShadingSettings;
+
 using config::check_int_range;
 using config::config_node;
 using config::config_node_impl;

@@ -54,28 +54,28 @@ private:
     // Prints "WARNING: <text>" and keeps the text for the report and the result.
     void warn(const std::string& text);
     void writePreparedImage();
-    ShadingSettings readShadingSettings();
-    PatchLayout choosePatchLayout();
+    lsc::ShadingSettings readShadingSettings();
+    lsc::PatchLayout choosePatchLayout();
     // The samples and the image they were measured on: the levelled image
     // they were taken from, or (empty) the prepared image for a sample file.
     struct SamplesTaken {
-        SampleSet set;
+        lsc::SampleSet set;
         BayerImage measuredOn;
         bool fromImage = false;
     };
     SamplesTaken obtainSamples();
-    FitResult fitSurface(const SamplesTaken& samples);
+    lsc::FitResult fitSurface(const SamplesTaken& samples);
     void recordFitError();
-    void writeRegisterFile(const FitResult& fit);
+    void writeRegisterFile(const lsc::FitResult& fit);
     // Returns the correction as the binary data store it.
-    ShadingCorrection writeBinaryData(const FitResult& fit);
-    BayerImage correct(const ShadingCorrection& correction);
-    void balanceWhite(BayerImage& flattened, const FitResult& fit);
+    lsc::ShadingCorrection writeBinaryData(const lsc::FitResult& fit);
+    BayerImage correct(const lsc::ShadingCorrection& correction);
+    void balanceWhite(BayerImage& flattened, const lsc::FitResult& fit);
     std::optional<float> measureLuminance(const BayerImage& balanced);
     // Turns the flattened image into display values (see evaluateDeltaAb).
     void measureColourError(BayerImage& flattened);
     void writeFlattenedImages(BayerImage flattened);
-    void writeCheck(const ShadingCorrection& correction, const FitResult& fit);
+    void writeCheck(const lsc::ShadingCorrection& correction, const lsc::FitResult& fit);
     void finish();
     // When `path` is set: the message line, store(path), the timer line.
     void saveIfAsked(const char* option, const std::string& path, const char* message,
@@ -100,8 +100,8 @@ private:
     // its header and capture data only.
     bool preparedWhileLoading_ = false;
     prep::SampleStatistics inputStatistics_; // of such a capture, in debug mode
-    ShadingSettings shading_;                // from the configuration, with the layout the run uses
-    FitDeviations deviations_;               // set by the fit, also when a bound then ends the run
+    lsc::ShadingSettings shading_;           // from the configuration, with the layout the run uses
+    lsc::FitDeviations deviations_;          // set by the fit, also when a bound then ends the run
     // The register file as this run wrote it; the binary data are built from it.
     std::string registerText_;
 

@@ -11,6 +11,9 @@
 
 #include "prep/sample_file.h"
 
+using lsc::SampleSet;
+using lsc::shadingSample;
+
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     constexpr std::int32_t kWidth = 648, kHeight = 486;
     const prep::SampleFileScale scale{1023, 4};

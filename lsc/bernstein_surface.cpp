@@ -9,6 +9,10 @@
 #include "lsc/linear_least_squares.h"
 #include "lsc/lsc_messages.h"
 
+namespace lsc {
+
+using apan::denseMatrix;
+
 bernsteinSurface::bernsteinSurface(std::uint32_t rows, std::uint32_t columns, double x0,
                                    double xExtent, double y0, double yExtent)
     : controlPoints_(rows, columns), x0_(x0), xExtent_(xExtent), y0_(y0), yExtent_(yExtent),
@@ -61,3 +65,5 @@ void bernsteinSurface::fit(double tolerance) {
     for (std::size_t k = 0; k < unknowns; ++k)
         controlPoints_[k] = solution[k];
 }
+
+} // namespace lsc

@@ -8,6 +8,8 @@
 #include "lsc/dense_matrix.h"
 #include "lsc/fit_sample.h"
 
+namespace lsc {
+
 class bernsteinSurface {
 public:
     // rows x columns control points (rows along y) over x0 .. x0 + xExtent and
@@ -25,13 +27,15 @@ public:
     // and the solver's exceptions.
     void fit(double tolerance);
 
-    denseMatrix& controlPoints() { return controlPoints_; }
-    const denseMatrix& controlPoints() const { return controlPoints_; }
+    apan::denseMatrix& controlPoints() { return controlPoints_; }
+    const apan::denseMatrix& controlPoints() const { return controlPoints_; }
 
 private:
-    denseMatrix controlPoints_;
+    apan::denseMatrix controlPoints_;
     double x0_, xExtent_, y0_, yExtent_;
     double sx_, sy_;         // 1 / extent
     double ox_ = 0, oy_ = 0; // offsets added after the origin is subtracted
     std::vector<fitSample> samples_;
 };
+
+} // namespace lsc

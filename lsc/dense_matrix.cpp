@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <new>
 
+namespace apan {
+
 denseMatrix::denseMatrix(std::uint32_t rows, std::uint32_t columns) {
     // Counted in 64 bits: on a 32-bit host rows * columns * 8 can wrap size_t.
     const std::uint64_t count = static_cast<std::uint64_t>(rows) * columns;
@@ -17,3 +19,5 @@ denseMatrix::denseMatrix(std::uint32_t rows, std::uint32_t columns) {
 void denseMatrix::fill(double value) {
     std::fill(data_.get(), data_.get() + size(), value);
 }
+
+} // namespace apan

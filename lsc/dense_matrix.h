@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <memory>
 
+namespace apan {
+
 class denseMatrix {
 public:
     denseMatrix() = default;
@@ -41,3 +43,5 @@ private:
     std::uint32_t rows_ = 0;
     std::uint32_t columns_ = 0;
 };
+
+} // namespace apan

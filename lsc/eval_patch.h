@@ -4,6 +4,8 @@
 
 #include <cstdint>
 
+namespace lsc {
+
 inline constexpr std::uint32_t kGridStride = 10; // control points per grid row
 
 // Patch start index in the grid: 30 * patch row + 3 * patch column.
@@ -59,3 +61,5 @@ inline float evalPatch(const float* grid, std::uint32_t start, float u, float v)
     const float u2 = u * u;
     return evalPatchCubics(patchCubics(grid, start), u, u2, u2 * u, weights);
 }
+
+} // namespace lsc

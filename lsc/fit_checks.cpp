@@ -7,6 +7,8 @@
 
 #include "lsc/lsc_messages.h"
 
+namespace lsc {
+
 namespace {
 
 // Numbers for people, the same in every locale. The buffer holds any double
@@ -71,3 +73,5 @@ void checkControlPoints(const float grids[kChannels][kGridPoints], float maxGain
             throwGainAbove(k, largest, maxGain);
     }
 }
+
+} // namespace lsc

@@ -10,6 +10,8 @@
 
 #include "lsc/shading_sample.h"
 
+namespace lsc {
+
 // The largest and the RMS deviation of one channel (see sample_deviation.h).
 struct FitDeviation {
     double max = 0.0;
@@ -36,3 +38,5 @@ void checkDeviationBounds(const float rms[kChannels], const float max[kChannels]
 void checkGainSamples(const std::vector<shadingSample>& samples, std::uint32_t width,
                       std::uint32_t height, float maxGain);
 void checkControlPoints(const float grids[kChannels][kGridPoints], float maxGain);
+
+} // namespace lsc

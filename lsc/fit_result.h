@@ -5,6 +5,8 @@
 #include "lsc/shading_sample.h"
 #include "lsc/shading_settings.h"
 
+namespace lsc {
+
 // Everything the correction of an image needs besides the black level.
 struct ShadingCorrection {
     PatchLayout layout;
@@ -25,3 +27,5 @@ struct FitDeviations {
     float max[kChannels] = {0, 0, 0, 0};
     float rms[kChannels] = {0, 0, 0, 0};
 };
+
+} // namespace lsc

@@ -1,4 +1,7 @@
 #pragma once
+
+namespace lsc {
+
 // One constraint of a surface fit: a position in pixels and the value (or
 // derivative) the surface should have there.
 
@@ -12,3 +15,5 @@ struct fitSample {
     double value;
     double weight = static_cast<float>(1e-7); // carried along, not read by any fit
 };
+
+} // namespace lsc

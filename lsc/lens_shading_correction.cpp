@@ -10,6 +10,8 @@
 #include "lsc/patch_geometry.h"
 #include "lsc/working_image.h"
 
+namespace lsc {
+
 BayerImage applyLensShading(const BayerImage& image, const ShadingCorrection& correction,
                             float blackLevel, unsigned applyStep) {
     const WorkingImage in = workingImage(image);
@@ -83,3 +85,5 @@ BayerImage applyLensShading(const BayerImage& image, const ShadingCorrection& co
     }
     return corrected;
 }
+
+} // namespace lsc

@@ -4,6 +4,8 @@
 #include "image/bayer_image.h"
 #include "lsc/fit_result.h"
 
+namespace lsc {
+
 // Returns gain x (pixel - black level) for every pixel of every
 // applyStep-th 2x2 block of `image` as a new REAL32 Bayer image of
 // (W div applyStep) x (H div applyStep) rounded down to even, with the
@@ -15,3 +17,5 @@
 // cannot be allocated ("Unable to allocate image memory.").
 BayerImage applyLensShading(const BayerImage& image, const ShadingCorrection& correction,
                             float blackLevel, unsigned applyStep);
+
+} // namespace lsc

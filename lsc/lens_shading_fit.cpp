@@ -22,6 +22,8 @@
 #include "lsc/sample_deviation.h"
 #include "lsc/working_image.h"
 
+namespace lsc {
+
 namespace {
 
 constexpr double kTargetTolerance = 1e-7;
@@ -265,3 +267,5 @@ FitResult fitTrialChannel(const SampleSet& samples, const BayerImage& levelled,
     FitDeviations unused;
     return fitChannels(samples, {levelled, true}, quiet, ignored, unused, channel);
 }
+
+} // namespace lsc

@@ -9,6 +9,8 @@
 #include "lsc/shading_sample.h"
 #include "lsc/shading_settings.h"
 
+namespace lsc {
+
 // The image the samples were measured on, which the deviation check
 // (sample_deviation.h) reads again: the levelled image they were taken from,
 // or, for samples read from a file (they may come from another capture), the
@@ -41,3 +43,5 @@ FitResult fitLensShading(const SampleSet& samples, const SampleOrigin& origin,
 // result is that channel's. Throws as fitLensShading.
 FitResult fitTrialChannel(const SampleSet& samples, const BayerImage& levelled,
                           const ShadingSettings& settings, int channel);
+
+} // namespace lsc

@@ -6,6 +6,8 @@
 
 #include "lsc/lsc_messages.h"
 
+namespace lsc {
+
 namespace {
 
 // Truncates toward zero into 0..limit; NaN and negative products give 0, so a
@@ -99,3 +101,5 @@ PatchBreakpoints usablePatchBreakpoints(std::uint32_t width, std::uint32_t heigh
         throw std::runtime_error(lsc::msg::kBadPatchGeometry);
     return breaks;
 }
+
+} // namespace lsc

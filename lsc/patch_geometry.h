@@ -4,6 +4,8 @@
 
 #include <cstdint>
 
+namespace lsc {
+
 // Breakpoints (0, L, L + Cw, W) and (0, T, T + M, H) used by the fit and the
 // correction: the left width and top height truncate, the centre width and
 // middle height round.
@@ -57,3 +59,5 @@ bool patchGeometryUsable(const PatchBreakpoints& breaks);
 PatchBreakpoints usablePatchBreakpoints(std::uint32_t width, std::uint32_t height,
                                         double leftFraction, double centerFraction,
                                         double topFraction, double middleFraction);
+
+} // namespace lsc

@@ -10,6 +10,8 @@
 #include "lsc/patch_geometry.h"
 #include "lsc/sample_collection.h"
 
+namespace lsc {
+
 namespace {
 
 constexpr double kOuterFactors[] = {0.2, 0.3, 0.35, 0.4};
@@ -114,3 +116,5 @@ LayoutChoice chooseLayout(const BayerImage& prepared, const ShadingSettings& set
     }
     return choice;
 }
+
+} // namespace lsc

@@ -10,6 +10,8 @@
 #include "image/bayer_image.h"
 #include "lsc/shading_settings.h"
 
+namespace lsc {
+
 // The configured layout first, then the symmetric layouts
 // whose outer patches take 0.2, 0.3, 0.35 and 0.4 of each side, leaving out
 // repeats of the configured one and any that leaves a patch without pixels on
@@ -37,3 +39,5 @@ struct LayoutChoice {
 // fails is skipped, and when all fail the configured layout stays (the run's own fit then reports
 // why). The first of equally flat candidates wins.
 LayoutChoice chooseLayout(const BayerImage& prepared, const ShadingSettings& settings);
+
+} // namespace lsc

@@ -11,6 +11,10 @@
 #include "lsc/linear_least_squares.h"
 #include "lsc/lsc_messages.h"
 
+namespace lsc {
+
+using apan::denseMatrix;
+
 namespace {
 
 enum ConstraintKind { kValue, kXDerivative, kYDerivative };
@@ -191,3 +195,5 @@ PatchIndex findPatch(const patchSurface& surface, double x, double y, std::ostre
              << std::endl;
     return {nearestInterval(surface.yBreaks(), y), nearestInterval(surface.xBreaks(), x)};
 }
+
+} // namespace lsc

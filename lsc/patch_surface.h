@@ -10,9 +10,11 @@
 #include "lsc/dense_matrix.h"
 #include "lsc/fit_sample.h"
 
+namespace lsc {
+
 // One bicubic patch over [x0, x1] x [y0, y1] pixels.
 struct surfacePatch {
-    denseMatrix controlPoints; // 4 x 4, rows along y
+    apan::denseMatrix controlPoints; // 4 x 4, rows along y
     double x0, x1, y0, y1;
     double inverseWidth;  // 1 / (x1 - x0)
     double inverseHeight; // 1 / (y1 - y0)
@@ -75,7 +77,7 @@ private:
         return patches_[row * patchColumns_ + column];
     }
     // Fills row `equation` of the design matrix; returns the patch holding the sample.
-    const surfacePatch& addDesignRow(denseMatrix& a, std::uint32_t equation,
+    const surfacePatch& addDesignRow(apan::denseMatrix& a, std::uint32_t equation,
                                      const fitSample& sample, int kind,
                                      std::ostream& messages) const;
 
@@ -100,3 +102,5 @@ private:
 // and gets the nearest patch in each direction (the first on a tie), so the
 // result is always a valid index.
 PatchIndex findPatch(const patchSurface& surface, double x, double y, std::ostream& messages);
+
+} // namespace lsc

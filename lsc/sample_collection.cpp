@@ -15,6 +15,8 @@
 #include "lsc/target_levels.h"
 #include "lsc/working_image.h"
 
+namespace lsc {
+
 namespace {
 
 constexpr float kDegreesToRadians = 0.017453292f;
@@ -162,3 +164,5 @@ SampleSet collectSamples(const BayerImage& levelled, const ShadingSettings& sett
         messages << lsc::msg::kSampleCount << set.samples.size() << std::endl;
     return set;
 }
+
+} // namespace lsc

@@ -7,6 +7,8 @@
 #include "lsc/shading_sample.h"
 #include "lsc/shading_settings.h"
 
+namespace lsc {
+
 // The prepared image with the black level taken out of every pixel, clamped
 // to 0..1: what the samples and their target levels are measured on. Throws
 // std::runtime_error for a missing or non-float image.
@@ -24,3 +26,5 @@ BayerImage levelledImage(const BayerImage& prepared, float blackLevel);
 // that is even or outside 1..15).
 SampleSet collectSamples(const BayerImage& levelled, const ShadingSettings& settings,
                          std::ostream& messages);
+
+} // namespace lsc

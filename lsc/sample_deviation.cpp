@@ -8,6 +8,8 @@
 #include "image/bayer_phase.h"
 #include "lsc/sample_window.h"
 
+namespace lsc {
+
 namespace {
 
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
@@ -135,3 +137,5 @@ void measureSampleDeviations(const WorkingImage& image, const std::vector<shadin
         for (int k = 0; k < kChannels; ++k)
             deviations[k].rms = std::sqrt(sumOfSquares[k] / static_cast<double>(count));
 }
+
+} // namespace lsc

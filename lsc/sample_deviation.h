@@ -11,6 +11,8 @@
 #include "lsc/shading_sample.h"
 #include "lsc/working_image.h"
 
+namespace lsc {
+
 // Side, in Bayer blocks, of the median window of the robust gains: at least
 // this, or the run's own sample window when that is larger.
 inline constexpr int kCheckWindow = 5;
@@ -40,3 +42,5 @@ inline constexpr int kCheckWindow = 5;
 void measureSampleDeviations(const WorkingImage& image, const std::vector<shadingSample>& samples,
                              int sampleWindow, bool samplesFromImage, float blackLevel,
                              FitDeviation deviations[kChannels]);
+
+} // namespace lsc

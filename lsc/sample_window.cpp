@@ -6,6 +6,8 @@
 
 #include "image/bayer_phase.h"
 
+namespace lsc {
+
 namespace {
 
 // Orders NaN after every number, so that the selection below always sees a
@@ -71,3 +73,5 @@ void windowMedians(const WorkingImage& image, int phase, std::uint32_t blockX, s
         medians[k] = medianOf(values, count);
     }
 }
+
+} // namespace lsc

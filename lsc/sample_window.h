@@ -7,6 +7,8 @@
 #include "lsc/shading_sample.h"
 #include "lsc/working_image.h"
 
+namespace lsc {
+
 // Window sizes collectSamples accepts: odd, 1 to 15 blocks per side.
 inline constexpr int kMaxSampleWindow = 15;
 bool sampleWindowUsable(int window);
@@ -18,3 +20,5 @@ bool sampleWindowUsable(int window);
 // values. `window` must be sampleWindowUsable; no memory is allocated.
 void windowMedians(const WorkingImage& image, int phase, std::uint32_t blockX, std::uint32_t blockY,
                    int window, float medians[kChannels]);
+
+} // namespace lsc

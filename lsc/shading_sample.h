@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <vector>
 
+namespace lsc {
+
 inline constexpr int kChannels = 4;     // red, green/red, green/blue, blue
 inline constexpr int kGridPoints = 100; // 10 x 10 control points per channel
 
@@ -24,3 +26,5 @@ struct SampleSet {
     std::vector<shadingSample> samples; // measured levels, black level taken out
     float targetLevels[kChannels] = {0, 0, 0, 0};
 };
+
+} // namespace lsc

@@ -5,6 +5,8 @@
 
 #include "lsc/shading_sample.h"
 
+namespace lsc {
+
 // Patch breakpoints as fractions of the image's width and height.
 struct PatchLayout {
     double left = 0.25, center = 0.5; // of the width
@@ -41,3 +43,5 @@ struct ShadingSettings {
     int deltaAbBlocks[2] = {0, 0}; // horizontal, vertical
     float ccm[3][3] = {{1, 0, 0}, {0, 1, 0}, {0, 0, 1}};
 };
+
+} // namespace lsc

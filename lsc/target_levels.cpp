@@ -6,6 +6,8 @@
 
 #include "image/bayer_phase.h"
 
+namespace lsc {
+
 namespace {
 
 // Plane of one channel read in place: pixel (px, py) of the plane is image
@@ -76,3 +78,5 @@ void targetLevelsOf(const WorkingImage& image, int windowSize, float levels[4]) 
                 largestBoxMean(plane, radius, columnSums);
         }
 }
+
+} // namespace lsc

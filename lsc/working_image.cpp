@@ -4,6 +4,8 @@
 
 #include "lsc/lsc_messages.h"
 
+namespace lsc {
+
 WorkingImage workingImage(const BayerImage& image) {
     if (image.empty())
         throw std::runtime_error(lsc::msg::kNoWorkingImage);
@@ -14,3 +16,5 @@ WorkingImage workingImage(const BayerImage& image) {
     return {static_cast<std::uint32_t>(buffer->width), static_cast<std::uint32_t>(buffer->height),
             buffer->cfa[1], static_cast<float*>(buffer->data)};
 }
+
+} // namespace lsc

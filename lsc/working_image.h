@@ -6,6 +6,8 @@
 
 #include "image/bayer_image.h"
 
+namespace lsc {
+
 struct WorkingImage {
     std::uint32_t width;
     std::uint32_t height;
@@ -17,3 +19,5 @@ struct WorkingImage {
 // REAL32 image with pixel data. The view reads the image; only the owner of
 // an image it made itself writes through it (levelledImage).
 WorkingImage workingImage(const BayerImage& image);
+
+} // namespace lsc

@@ -1,5 +1,7 @@
 #include "lsc/xtest_surface.h"
 
+namespace lsc {
+
 namespace {
 
 // Red (and blue) control points in units of 1/4096, row by row; green is
@@ -36,3 +38,5 @@ void applyXTestSurface(ShadingCorrection& correction) {
         correction.controlGrids[3][i] = red;
     }
 }
+
+} // namespace lsc

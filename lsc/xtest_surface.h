@@ -4,8 +4,12 @@
 
 #include "lsc/fit_result.h"
 
+namespace lsc {
+
 // Overwrites the control grids with the fixed X-test grids: red and blue
 // identical, the two greens identical, red + green = 1 at every point, and
 // large alternating values only in the 2x2 groups on the diagonals next to
 // the corners.
 void applyXTestSurface(ShadingCorrection& correction);
+
+} // namespace lsc

@@ -7,12 +7,14 @@
 #include <vector>
 
 #include "image/bayer_phase.h"
+#include "lsc/shading_sample.h"
 #include "prep/prep_image.h"
 
 namespace prep {
-namespace {
 
-constexpr const char* kChannelNames[4] = {"red", "green/red", "green/blue", "blue"};
+using lsc::kChannelNames;
+
+namespace {
 
 // Blocks of 16 x 16 sensor pixels (8 x 8 of each channel); at most this many
 // along each axis are measured, spread evenly, so the cost does not grow with

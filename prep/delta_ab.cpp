@@ -10,6 +10,9 @@
 #include "prep/prep_messages.h"
 
 namespace prep {
+
+using lsc::kChannels;
+using lsc::ShadingSettings;
 namespace {
 
 constexpr float kGamma = 0.45454544f; // 1 / 2.2

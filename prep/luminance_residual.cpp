@@ -12,6 +12,8 @@
 
 namespace prep {
 
+using lsc::ShadingSettings;
+
 namespace {
 
 // Rec. 709 luminance weights of linear R, G, B.

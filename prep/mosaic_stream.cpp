@@ -16,6 +16,7 @@
 #include "prep/window_mirror.h"
 
 namespace prep {
+
 namespace {
 
 constexpr int kChannels = 4;     // of a 2 x 2 pattern

@@ -15,6 +15,10 @@
 #include "prep/prep_messages.h"
 
 namespace prep {
+
+using lsc::kChannels;
+using lsc::SampleSet;
+using lsc::shadingSample;
 namespace {
 
 // min(trunc(0.5 + v * S), S), with anything below zero (or not a number) as 0.

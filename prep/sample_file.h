@@ -33,27 +33,27 @@ struct SampleFileScale {
 };
 
 // The text of a sample file for a prepared image of width x height pixels.
-std::string formatSampleFile(const float (&targetLevels)[kChannels],
-                             const std::vector<shadingSample>& samples, std::int32_t width,
+std::string formatSampleFile(const float (&targetLevels)[lsc::kChannels],
+                             const std::vector<lsc::shadingSample>& samples, std::int32_t width,
                              std::int32_t height, const SampleFileScale& scale);
 
 // Parses a sample file for a prepared image of width x height pixels. Throws
 // std::runtime_error with the message of the first problem; blank lines are
 // skipped, blanks before a number and at the end of a line are allowed.
-SampleSet parseSampleFile(std::string_view text, std::int32_t width, std::int32_t height,
-                          const SampleFileScale& scale);
+lsc::SampleSet parseSampleFile(std::string_view text, std::int32_t width, std::int32_t height,
+                               const SampleFileScale& scale);
 
 // The target levels and samples of `set` for `image` (the image they were
 // taken from; its size is written). Written through OutputFile; throws
 // std::runtime_error "Cannot open sample output file: " + path, or a write
 // error naming the path.
-void writeSampleFile(const std::string& path, const SampleSet& set, const BayerImage& image,
+void writeSampleFile(const std::string& path, const lsc::SampleSet& set, const BayerImage& image,
                      const SampleFileScale& scale);
 
 // The target levels and samples of the file, for the prepared `image`.
 // Throws std::runtime_error "Cannot open input sample file: " + path, or the
 // parser's message.
-SampleSet readSampleFile(const std::string& path, const BayerImage& image,
-                         const SampleFileScale& scale);
+lsc::SampleSet readSampleFile(const std::string& path, const BayerImage& image,
+                              const SampleFileScale& scale);
 
 } // namespace prep

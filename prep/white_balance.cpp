@@ -10,6 +10,10 @@
 #include "prep/prep_messages.h"
 
 namespace prep {
+
+using lsc::kChannels;
+using lsc::targetLevelsOf;
+using lsc::WorkingImage;
 namespace {
 
 void requireBayerImage(const BayerImage& image) {

@@ -11,6 +11,15 @@
 
 namespace report {
 
+using lsc::AxisPosition;
+using lsc::axisPosition;
+using lsc::evalPatch;
+using lsc::kChannels;
+using lsc::kGridPoints;
+using lsc::PatchBreakpoints;
+using lsc::patchStart;
+using lsc::usablePatchBreakpoints;
+
 namespace {
 
 // Pixel at fraction (index + offset) / count of a size, inside 0..size - 1.

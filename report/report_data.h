@@ -62,14 +62,14 @@ struct GainSurface {
 
 // Gain of the control grid at pixel (x, y) of a width x height image, with
 // the patch choice and local coordinates of the correction.
-float gainAt(const float (&grid)[kGridPoints], const PatchBreakpoints& breaks, std::uint32_t x,
-             std::uint32_t y);
+float gainAt(const float (&grid)[lsc::kGridPoints], const lsc::PatchBreakpoints& breaks,
+             std::uint32_t x, std::uint32_t y);
 
 // Samples a control grid as the correction applies it to a width x height
 // image with patch fractions (left, centre, top, middle). Throws
 // std::runtime_error for an empty image, no cells, or fractions that leave a
 // patch without pixels.
-GainSurface sampleGainSurface(const float (&grid)[kGridPoints], std::uint32_t width,
+GainSurface sampleGainSurface(const float (&grid)[lsc::kGridPoints], std::uint32_t width,
                               std::uint32_t height, const double (&fractions)[4], int columns,
                               int rows);
 

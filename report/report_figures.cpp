@@ -6,6 +6,10 @@
 
 namespace report {
 
+using lsc::kChannelNames;
+using lsc::kChannels;
+using lsc::PatchBreakpoints;
+
 namespace {
 
 constexpr double kFigureWidth = 400.0;  // user units across a figure in a column

@@ -27,7 +27,7 @@ samplePointsDefinition(const std::vector<std::pair<std::uint32_t, std::uint32_t>
 // patch borders and, when `withSamples`, the points of samplePointsDefinition.
 std::string gainSurfaceFigure(const GainSurface& surface, const ColourScale& scale,
                               const std::vector<ScaleTick>& ticks, std::uint32_t width,
-                              std::uint32_t height, const PatchBreakpoints& breaks,
+                              std::uint32_t height, const lsc::PatchBreakpoints& breaks,
                               bool withSamples, const std::string& label);
 
 // The four channels' block maps side by side on one colour scale.

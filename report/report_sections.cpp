@@ -11,6 +11,12 @@
 
 namespace report {
 
+using lsc::kChannelNames;
+using lsc::kChannels;
+using lsc::PatchBreakpoints;
+using lsc::patchBreakpoints;
+using lsc::patchGeometryUsable;
+
 namespace {
 
 constexpr int kSurfaceCells = 64; // gain surface cells along the longer side

@@ -16,7 +16,7 @@ namespace report {
 struct ChannelBlockMeans {
     int columns = 0;
     int rows = 0;
-    std::vector<float> mean[kChannels];
+    std::vector<float> mean[lsc::kChannels];
 };
 
 struct RunReport {
@@ -47,7 +47,7 @@ struct RunReport {
     std::string bayerOrder; // "RGGB", ...
     int bitDepth = 0;
     float exposureTime = 0.0f;
-    float gains[kChannels] = {0, 0, 0, 0};
+    float gains[lsc::kChannels] = {0, 0, 0, 0};
 
     // The prepared image: shading before correction, relative to each channel's peak
     bool havePrepared = false;
@@ -57,12 +57,12 @@ struct RunReport {
     // The fit
     bool haveFit = false;
     double fractions[4] = {0.25, 0.5, 0.25, 0.5}; // left, centre, top, middle
-    float controlGrids[kChannels][kGridPoints] = {};
+    float controlGrids[lsc::kChannels][lsc::kGridPoints] = {};
     std::vector<std::pair<std::uint32_t, std::uint32_t>> samplePoints; // prepared-image pixels
-    float targetLevels[kChannels] = {0, 0, 0, 0};
+    float targetLevels[lsc::kChannels] = {0, 0, 0, 0};
     bool haveFitError = false;
-    float deviationMax[kChannels] = {0, 0, 0, 0};
-    float deviationRms[kChannels] = {0, 0, 0, 0};
+    float deviationMax[lsc::kChannels] = {0, 0, 0, 0};
+    float deviationRms[lsc::kChannels] = {0, 0, 0, 0};
     float maxRmsBound = 0.0f, maxErrorBound = 0.0f, maxGain = 0.0f;
 
     // After the correction and white balance

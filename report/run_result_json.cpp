@@ -11,6 +11,8 @@
 
 namespace report {
 
+using lsc::kChannels;
+
 namespace {
 
 using nlohmann::ordered_json;

@@ -6,6 +6,15 @@
 
 namespace report {
 
+using lsc::FitDeviations;
+using lsc::kChannels;
+using lsc::kGridPoints;
+using lsc::PatchLayout;
+using lsc::SampleSet;
+using lsc::ShadingCorrection;
+using lsc::shadingSample;
+using lsc::ShadingSettings;
+
 namespace {
 
 // The report's block grid: 16 blocks along the longer side, about square.

@@ -25,16 +25,16 @@ void recordInput(RunReport& report, const BayerImage& input, const std::string& 
 void recordPrepared(RunReport& report, const BayerImage& prepared, float blackLevel, bool shading);
 
 // The sample points the fit used, in prepared-image pixels.
-void recordSamples(RunReport& report, const SampleSet& samples);
+void recordSamples(RunReport& report, const lsc::SampleSet& samples);
 
 // A correction the run holds: the fit's, or the one the binary data stored.
-void recordFit(RunReport& report, const ShadingCorrection& correction,
-               const float (&targetLevels)[kChannels]);
+void recordFit(RunReport& report, const lsc::ShadingCorrection& correction,
+               const float (&targetLevels)[lsc::kChannels]);
 
 // The fit's deviations and the bounds they were judged by; also for a fit a
 // bound ended.
-void recordDeviations(RunReport& report, const FitDeviations& deviations,
-                      const ShadingSettings& settings);
+void recordDeviations(RunReport& report, const lsc::FitDeviations& deviations,
+                      const lsc::ShadingSettings& settings);
 
 // R/G and B/G of the target levels.
 void recordMeasuredRatios(RunReport& report, float red, float blue);

@@ -9,6 +9,8 @@
 #include "config/parameter_table.h"
 
 namespace config {
+
+using lsc::ShadingSettings;
 namespace {
 
 BayerImage imageOf(std::int32_t width, std::int32_t height, std::uint16_t bits = 10) {

@@ -9,6 +9,8 @@
 #include "config/patch_geometry_check.h"
 
 namespace config {
+
+using lsc::ShadingCorrection;
 namespace {
 
 class PatchGeometryCheckTest : public ::testing::Test {

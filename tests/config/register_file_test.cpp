@@ -13,6 +13,10 @@
 #include "tests/support/temp_dir.h"
 
 namespace config {
+
+using lsc::FitResult;
+using lsc::kChannels;
+using lsc::kGridPoints;
 namespace {
 
 class RegisterFileTest : public ::testing::Test {

@@ -18,6 +18,19 @@
 #include "tests/support/module_shading.h"
 
 namespace e2e {
+
+using lsc::applyLensShading;
+using lsc::candidateLayouts;
+using lsc::chooseLayout;
+using lsc::collectSamples;
+using lsc::FitDeviations;
+using lsc::fitLensShading;
+using lsc::FitResult;
+using lsc::LayoutChoice;
+using lsc::levelledImage;
+using lsc::PatchLayout;
+using lsc::SampleSet;
+using lsc::ShadingSettings;
 namespace {
 
 struct Module {

@@ -5,6 +5,7 @@
 #include "lsc/bernstein.h"
 #include "lsc/bernstein_surface.h"
 
+namespace lsc {
 namespace {
 
 TEST(Bernstein, SumsToOneForEveryDegreeAndPosition) {
@@ -69,3 +70,4 @@ TEST(BernsteinSurface, FewerSamplesThanControlPointsThrow220) {
 }
 
 } // namespace
+} // namespace lsc

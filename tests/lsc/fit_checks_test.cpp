@@ -14,6 +14,7 @@
 #include "lsc/sample_collection.h"
 #include "lsc_test_image.h"
 
+namespace lsc {
 namespace {
 
 using lsc_test::channelLevels;
@@ -223,3 +224,4 @@ TEST_F(FitChecks, ControlPointsThatOvershootTheSampledGainsMeetTheCeilingToo) {
 }
 
 } // namespace
+} // namespace lsc

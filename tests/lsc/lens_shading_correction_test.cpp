@@ -6,6 +6,7 @@
 #include "lsc/lens_shading_correction.h"
 #include "lsc_test_image.h"
 
+namespace lsc {
 namespace {
 
 using lsc_test::makeImage;
@@ -157,3 +158,4 @@ TEST(LensShadingCorrection, RefusesAMissingImage) {
 }
 
 } // namespace
+} // namespace lsc

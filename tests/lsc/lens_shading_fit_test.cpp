@@ -11,6 +11,7 @@
 #include "lsc/sample_collection.h"
 #include "lsc_test_image.h"
 
+namespace lsc {
 namespace {
 
 using lsc_test::channelLevels;
@@ -183,3 +184,4 @@ TEST_F(LensShadingFit, SamplesOutsideTheImageAreNotFitted) {
 }
 
 } // namespace
+} // namespace lsc

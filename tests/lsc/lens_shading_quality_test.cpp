@@ -15,6 +15,7 @@
 #include "lsc_test_image.h"
 #include "tests/support/flat_field.h"
 
+namespace lsc {
 namespace {
 
 using testing_support::FlatField;
@@ -123,3 +124,4 @@ INSTANTIATE_TEST_SUITE_P(BayerOrdersAndDepths, CorrectedFlatField,
                                            std::make_tuple(kCfaBggr, 14, 1024)));
 
 } // namespace
+} // namespace lsc

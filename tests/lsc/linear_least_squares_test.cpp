@@ -13,6 +13,9 @@
 #include "lsc/dense_matrix.h"
 #include "lsc/linear_least_squares.h"
 
+namespace lsc {
+
+using apan::denseMatrix;
 namespace {
 
 using lsc_test::caught;
@@ -201,3 +204,4 @@ TEST(LinearLeastSquares, KeepsEveryBitOfTheColumnWalk) {
 }
 
 } // namespace
+} // namespace lsc

@@ -9,6 +9,9 @@
 #include "lsc/dense_matrix.h"
 #include "lsc/linear_system.h"
 
+namespace lsc {
+
+using apan::denseMatrix;
 namespace {
 
 using lsc_test::caught;
@@ -130,3 +133,4 @@ TEST(LinearSystem, ZeroToleranceNeverDividesByAZeroPivot) {
 }
 
 } // namespace
+} // namespace lsc

@@ -5,6 +5,7 @@
 
 #include "lsc/patch_geometry.h"
 
+namespace lsc {
 namespace {
 
 TEST(PatchBreakpoints, LeftTruncatesAndCentreRounds) {
@@ -95,3 +96,4 @@ TEST(PatchStep, SizesWithoutAFiniteStepGiveZeroRegisters) {
 }
 
 } // namespace
+} // namespace lsc

@@ -10,6 +10,7 @@
 #include "lsc/eval_patch.h"
 #include "lsc/patch_surface.h"
 
+namespace lsc {
 namespace {
 
 const std::vector<double> kXBreaks = {0, 250, 750, 1000};
@@ -207,3 +208,4 @@ TEST(EvalPatch, BothEvaluationPathsGiveTheBitsOfThePowerForm) {
 }
 
 } // namespace
+} // namespace lsc

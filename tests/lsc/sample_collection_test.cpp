@@ -7,6 +7,7 @@
 #include "lsc/sample_collection.h"
 #include "lsc_test_image.h"
 
+namespace lsc {
 namespace {
 
 using lsc_test::channelLevels;
@@ -210,3 +211,4 @@ TEST(TargetLevels, WindowLargerThanThePlaneAveragesTheWholePlane) {
 }
 
 } // namespace
+} // namespace lsc

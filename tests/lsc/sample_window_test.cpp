@@ -8,6 +8,7 @@
 #include "image/image_buffer.h"
 #include "lsc/sample_window.h"
 
+namespace lsc {
 namespace {
 
 // A width x height RGGB working image over its own pixel store, every pixel
@@ -111,3 +112,4 @@ TEST(SampleWindow, OnlyOddSizesFromOneToFifteenAreUsable) {
 }
 
 } // namespace
+} // namespace lsc

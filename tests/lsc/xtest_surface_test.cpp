@@ -4,6 +4,7 @@
 
 #include "lsc/xtest_surface.h"
 
+namespace lsc {
 namespace {
 
 class XTestSurface : public ::testing::Test {
@@ -69,3 +70,4 @@ TEST_F(XTestSurface, FirstRowsAreTheEstablishedOnes) {
 }
 
 } // namespace
+} // namespace lsc

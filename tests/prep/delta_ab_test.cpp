@@ -9,6 +9,8 @@
 
 using prep_test::makeImage;
 
+using lsc::ShadingSettings;
+
 namespace {
 
 constexpr float kGamma = 0.45454544f;

@@ -7,6 +7,8 @@
 #include "prep/luminance_residual.h"
 #include "test_images.h"
 
+using lsc::ShadingSettings;
+
 namespace {
 
 // A 16 x 8 grey mosaic, 2 x 2 delta-ab blocks of 4 x 2 RGB pixels; the pixel

@@ -9,6 +9,9 @@
 
 using testing_support::TempDir;
 
+using lsc::SampleSet;
+using lsc::shadingSample;
+
 namespace {
 
 std::string parseError(const std::string& text, std::int32_t width = 648, std::int32_t height = 486,

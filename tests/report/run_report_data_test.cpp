@@ -11,6 +11,14 @@
 #include "report/report_data.h"
 
 namespace report {
+
+using lsc::evalPatch;
+using lsc::kChannelNames;
+using lsc::kChannels;
+using lsc::kGridPoints;
+using lsc::PatchBreakpoints;
+using lsc::patchBreakpoints;
+using lsc::patchStart;
 namespace {
 
 BayerImage makeMosaic(int width, int height, std::uint32_t cfa,

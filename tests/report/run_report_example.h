@@ -16,7 +16,7 @@ inline ChannelBlockMeans exampleBlocks(int columns, int rows,
     ChannelBlockMeans means;
     means.columns = columns;
     means.rows = rows;
-    for (int k = 0; k < kChannels; ++k)
+    for (int k = 0; k < lsc::kChannels; ++k)
         for (int r = 0; r < rows; ++r)
             for (int c = 0; c < columns; ++c)
                 means.mean[k].push_back(value(k, (c + 0.5) / columns, (r + 0.5) / rows));
@@ -50,7 +50,7 @@ inline RunReport exampleRunReport() {
     });
 
     report.haveFit = true;
-    for (int k = 0; k < kChannels; ++k)
+    for (int k = 0; k < lsc::kChannels; ++k)
         for (int r = 0; r < 10; ++r)
             for (int c = 0; c < 10; ++c)
                 report.controlGrids[k][r * 10 + c] = static_cast<float>(
