@@ -19,6 +19,10 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
+using img::BayerImage;
+using img::ImagePtr;
+using img::rawRead;
+
 namespace {
 
 constexpr int kWidth = 4000;

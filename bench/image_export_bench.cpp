@@ -13,6 +13,15 @@
 
 #include <unistd.h>
 
+using img::demosaicToRgb8;
+using img::imageCreate;
+using img::ImagePtr;
+using img::imageSave;
+using img::kBufferRawCfa;
+using img::kCfaRggb;
+using img::kDataReal32;
+using img::kPixelRaw;
+
 namespace {
 
 constexpr std::int32_t kWidth = 4000;

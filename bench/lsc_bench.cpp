@@ -30,6 +30,13 @@ using lsc::ShadingCorrection;
 using lsc::shadingSample;
 using lsc::ShadingSettings;
 
+using img::BayerImage;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kCfaRggb;
+using img::kDataReal32;
+using img::kPixelRaw;
+
 namespace {
 
 // A lens-like flat field: each channel falls to about half at the corners.

@@ -50,6 +50,8 @@ using lsc::levelledImage;
 using lsc::SampleSet;
 using lsc::ShadingSettings;
 
+using img::BayerImage;
+
 namespace {
 
 using testing_support::FlatField;

@@ -48,6 +48,8 @@
 using lsc::applyLensShading;
 using lsc::ShadingCorrection;
 
+using img::BayerImage;
+
 namespace {
 
 using testing_support::FlatField;

@@ -15,6 +15,13 @@
 
 #include <unistd.h>
 
+using img::BayerImage;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kCfaRggb;
+using img::kDataReal32;
+using img::kPixelRaw;
+
 namespace {
 
 constexpr std::int32_t kWidth = 4000;

@@ -12,6 +12,13 @@
 #include "prep/median_filter.h"
 #include "prep/mosaic_preparation.h"
 
+using img::BayerImage;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kCfaRggb;
+using img::kDataReal32;
+using img::kPixelRaw;
+
 namespace {
 
 constexpr std::int32_t kWidth = 4000;

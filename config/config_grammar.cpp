@@ -26,6 +26,9 @@
 
 namespace config {
 
+using img::DetailedError;
+using img::systemReason;
+
 namespace {
 
 namespace qi = boost::spirit::qi;

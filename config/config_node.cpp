@@ -15,6 +15,8 @@
 
 namespace config {
 
+using img::DetailedError;
+
 namespace {
 
 // Indices above this are refused: an index is a small list position, and a

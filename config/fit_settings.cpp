@@ -10,6 +10,8 @@
 
 namespace config {
 
+using img::BayerImage;
+
 using lsc::PatchLayout;
 using lsc::ShadingSettings;
 

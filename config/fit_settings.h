@@ -13,6 +13,6 @@ namespace config {
 // Throws the getters' errors, std::range_error for delta-ab block counts that
 // leave a block empty, std::runtime_error for an image without bit depth.
 // The quiet flag stays false (it comes from the command line).
-lsc::ShadingSettings load_fit_settings(const config_node& config, const BayerImage& image);
+lsc::ShadingSettings load_fit_settings(const config_node& config, const img::BayerImage& image);
 
 } // namespace config

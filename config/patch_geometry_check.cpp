@@ -8,6 +8,8 @@
 
 namespace config {
 
+using img::BayerImage;
+
 using lsc::kChannels;
 using lsc::kGridPoints;
 using lsc::PatchLayout;

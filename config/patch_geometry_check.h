@@ -24,6 +24,7 @@ struct StoredCalibration {
 // Throws std::range_error when the sensor size does not match,
 // std::runtime_error for the other mismatches.
 StoredCalibration readConfigParam(const config_node& root, const config_node& data,
-                                  const BayerImage& image, const lsc::ShadingCorrection& fitted);
+                                  const img::BayerImage& image,
+                                  const lsc::ShadingCorrection& fitted);
 
 } // namespace config

@@ -14,6 +14,9 @@
 
 namespace config {
 
+using img::BayerImage;
+using img::OutputFile;
+
 using lsc::ExportedPatchSizes;
 using lsc::exportedPatchSizes;
 using lsc::FitResult;

@@ -25,12 +25,12 @@ namespace config {
 std::string write_register_file(const std::string& path, const config_node& config,
                                 const std::string& blockName, const std::string& controlPointInfix,
                                 const std::string& commandLineText, const lsc::FitResult& fit,
-                                const BayerImage& image);
+                                const img::BayerImage& image);
 
 // The text alone (same checks, nothing written).
 std::string register_file_text(const config_node& config, const std::string& blockName,
                                const std::string& controlPointInfix,
                                const std::string& commandLineText, const lsc::FitResult& fit,
-                               const BayerImage& image);
+                               const img::BayerImage& image);
 
 } // namespace config

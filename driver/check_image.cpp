@@ -13,6 +13,16 @@
 
 namespace driver {
 
+using img::BayerImage;
+using img::DetailedError;
+using img::imageCreate;
+using img::ImagePtr;
+using img::kBufferRawCfa;
+using img::kDataUint16;
+using img::kPixelRaw;
+using img::systemReason;
+using img::tiffWrite;
+
 using lsc::applyLensShading;
 using lsc::kChannels;
 using lsc::ShadingCorrection;

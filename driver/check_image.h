@@ -18,7 +18,7 @@ namespace driver {
 // and renamed into place. The capture's samples are released on the way (only
 // its size and Bayer order are needed afterwards). Throws std::runtime_error
 // "Cannot store check image: <path>" when it cannot be written.
-void writeCheckImage(const std::string& path, BayerImage capture,
+void writeCheckImage(const std::string& path, img::BayerImage capture,
                      const lsc::ShadingCorrection& correction, float blackLevel,
                      const float (&targetLevels)[lsc::kChannels]);
 

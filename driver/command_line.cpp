@@ -14,6 +14,8 @@
 
 namespace driver {
 
+using img::DetailedError;
+
 namespace po = boost::program_options;
 
 namespace {

@@ -10,6 +10,8 @@
 
 namespace driver {
 
+using img::ErrorDetail;
+
 namespace {
 
 FailureText error(const std::string& text) {

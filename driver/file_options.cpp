@@ -13,6 +13,8 @@
 
 namespace driver {
 
+using img::standardStreamDescriptor;
+
 namespace {
 
 constexpr const char* kInputOptions[] = {"config", "input", "raw", "samples", "autofocus"};

@@ -22,6 +22,12 @@
 
 namespace driver {
 
+using img::BayerImage;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+
 using config::strip_comments;
 
 namespace po = boost::program_options;

@@ -36,10 +36,10 @@ HeaderlessRawDetails parseHeaderlessDetails(std::istream& text, std::uint16_t de
 // is true; `inputStatistics`, if given, then receives the statistics of the
 // input samples, and `rows`, if given, every row of the streamed samples. Throws apan::exception
 // 202, 210, 262, 263, 264.
-bool loadHeaderlessRaw(BayerImage& target, const std::string& rawPath, std::uint16_t defaultBits,
-                       const std::string& detailsPath, bool fixedHeader,
+bool loadHeaderlessRaw(img::BayerImage& target, const std::string& rawPath,
+                       std::uint16_t defaultBits, const std::string& detailsPath, bool fixedHeader,
                        const prep::MosaicPreparation* preparation = nullptr,
-                       BayerImage* prepared = nullptr,
+                       img::BayerImage* prepared = nullptr,
                        prep::SampleStatistics* inputStatistics = nullptr,
                        img::MosaicRowSink* rows = nullptr);
 

@@ -10,6 +10,8 @@
 
 namespace driver {
 
+using img::BayerImage;
+
 namespace {
 
 prep::FrameShape shapeOf(const BayerImage& image) {

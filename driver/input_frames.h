@@ -19,10 +19,10 @@ namespace driver {
 // streaming average's. One frame at a time is held beside a sum of 32-bit
 // integers. Throws std::runtime_error naming the frame when a frame differs
 // from the first in size, Bayer order or bit depth (prep::frameDifference).
-void readAveragedFrames(BayerImage& image, const std::vector<std::string>& paths,
-                        const std::function<void(BayerImage&, const std::string&)>& read);
+void readAveragedFrames(img::BayerImage& image, const std::vector<std::string>& paths,
+                        const std::function<void(img::BayerImage&, const std::string&)>& read);
 
 // Hands the rows of a whole image to `sink` as whole samples of its depth.
-void feedRows(const BayerImage& image, img::MosaicRowSink& sink);
+void feedRows(const img::BayerImage& image, img::MosaicRowSink& sink);
 
 } // namespace driver

@@ -6,6 +6,8 @@
 
 #include <unistd.h>
 
+using img::standardStreamDescriptor;
+
 outputStream messageStream;
 
 outputStream::outputStream() : std::ostream(nullptr) {

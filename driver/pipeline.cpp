@@ -50,6 +50,10 @@
 
 namespace driver {
 
+using img::BayerImage;
+using img::cfaPatternName;
+using img::writeWholeFile;
+
 using lsc::applyLensShading;
 using lsc::applyXTestSurface;
 using lsc::chooseLayout;

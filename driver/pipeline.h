@@ -60,7 +60,7 @@ private:
     // they were taken from, or (empty) the prepared image for a sample file.
     struct SamplesTaken {
         lsc::SampleSet set;
-        BayerImage measuredOn;
+        img::BayerImage measuredOn;
         bool fromImage = false;
     };
     SamplesTaken obtainSamples();
@@ -69,12 +69,12 @@ private:
     void writeRegisterFile(const lsc::FitResult& fit);
     // Returns the correction as the binary data store it.
     lsc::ShadingCorrection writeBinaryData(const lsc::FitResult& fit);
-    BayerImage correct(const lsc::ShadingCorrection& correction);
-    void balanceWhite(BayerImage& flattened, const lsc::FitResult& fit);
-    std::optional<float> measureLuminance(const BayerImage& balanced);
+    img::BayerImage correct(const lsc::ShadingCorrection& correction);
+    void balanceWhite(img::BayerImage& flattened, const lsc::FitResult& fit);
+    std::optional<float> measureLuminance(const img::BayerImage& balanced);
     // Turns the flattened image into display values (see evaluateDeltaAb).
-    void measureColourError(BayerImage& flattened);
-    void writeFlattenedImages(BayerImage flattened);
+    void measureColourError(img::BayerImage& flattened);
+    void writeFlattenedImages(img::BayerImage flattened);
     void writeCheck(const lsc::ShadingCorrection& correction, const lsc::FitResult& fit);
     void finish();
     // When `path` is set: the message line, store(path), the timer line.
@@ -94,8 +94,8 @@ private:
 
     int depth_ = 0;               // bit depth of the run
     std::uint32_t fullScale_ = 0; // 2^depth - 1
-    BayerImage input_;
-    BayerImage prepared_;
+    img::BayerImage input_;
+    img::BayerImage prepared_;
     // The capture went through the preparation as it was read: input_ holds
     // its header and capture data only.
     bool preparedWhileLoading_ = false;

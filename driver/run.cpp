@@ -13,6 +13,8 @@
 
 namespace driver {
 
+using img::removeLiveTemporaries;
+
 namespace {
 
 // An operator's Ctrl-C, a station's kill or a closed terminal ends the run

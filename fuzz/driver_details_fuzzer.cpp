@@ -20,6 +20,11 @@
 
 using config::strip_comments;
 
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+
 namespace {
 
 using driver::HeaderlessRawDetails;

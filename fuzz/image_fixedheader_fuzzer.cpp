@@ -12,6 +12,14 @@
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
 
+using img::ImageBuffer;
+using img::imageRelease;
+using img::kKqRawFixedHeaderSize;
+using img::KqRawContainer;
+using img::kqrawContainerRelease;
+using img::kqrawFixedRead;
+using img::kqrawFixedToContainer;
+
 namespace {
 
 constexpr std::size_t kFieldBytes = 112;

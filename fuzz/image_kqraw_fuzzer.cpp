@@ -10,6 +10,13 @@
 #include "image/byte_source.h"
 #include "image/kqraw_container.h"
 
+using img::KqRawContainer;
+using img::kqrawContainerCopyBlocks;
+using img::kqrawContainerCreate;
+using img::kqrawContainerParse;
+using img::KqRawContainerPtr;
+using img::kqrawContainerWriteStream;
+
 namespace {
 
 // The container as a file, or false when the writer refuses it.

@@ -12,6 +12,9 @@
 #include "image/raw_reader.h"
 #include "image/raw_samples.h"
 
+using img::ImageBuffer;
+using img::imageRelease;
+
 namespace {
 
 constexpr std::size_t kAnswerBytes = 1 + 28;

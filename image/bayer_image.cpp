@@ -21,6 +21,8 @@
 
 #include <sys/stat.h>
 
+namespace img {
+
 namespace {
 
 [[noreturn]] void fail(const char* text) {
@@ -267,3 +269,5 @@ bool BayerImage::samePixels(const BayerImage& other) const {
             return false;
     return true;
 }
+
+} // namespace img

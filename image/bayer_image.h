@@ -9,6 +9,8 @@
 #include "image/image_buffer.h"
 #include "image/image_result.h"
 
+namespace img {
+
 // Throws "Cannot read kqraw image." (or the image-too-large message for that
 // result) with a detail line naming `path` and the reason: the system's when
 // the file does not open or read, else what the raw reader's `result` says.
@@ -88,3 +90,5 @@ public:
 private:
     ImagePtr buffer_;
 };
+
+} // namespace img

@@ -5,6 +5,8 @@
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
 
+namespace img {
+
 namespace {
 
 const KqRawContainer* containerOf(const ImageBuffer* image) {
@@ -81,3 +83,5 @@ void BayerImage::setSensorGuid(const std::string& guidHex) {
     kqrawFixedSet64(static_cast<KqRawFixedHeader*>(buffer_->rawHeader), img::kqfix::kSensorGuid,
                     img::parseHex64(guidHex.c_str()));
 }
+
+} // namespace img

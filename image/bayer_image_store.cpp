@@ -12,6 +12,8 @@
 #include "image/raw_writer.h"
 #include "image/sample_scaling.h"
 
+namespace img {
+
 namespace {
 
 [[noreturn]] void fail(const char* text) {
@@ -69,3 +71,5 @@ void BayerImage::storeBmp(const std::string& path) const {
     if (imageSave(path.c_str(), rgb.get(), img::kFormatBmp, nullptr, 0) != img::kOk)
         fail(img::msg::kCannotStoreBmp);
 }
+
+} // namespace img

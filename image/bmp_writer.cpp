@@ -8,6 +8,8 @@
 #include "image/image_result.h"
 #include "image/output_file.h"
 
+namespace img {
+
 namespace {
 
 constexpr std::uint32_t kFileHeaderSize = 14;
@@ -109,3 +111,5 @@ int bmpWrite(const char* path, const ImageBuffer* image) noexcept {
         return img::kIoError;
     return file.commit() ? img::kOk : img::kIoError;
 }
+
+} // namespace img

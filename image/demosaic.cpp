@@ -6,6 +6,8 @@
 #include "image/bayer_phase.h"
 #include "image/image_result.h"
 
+namespace img {
+
 namespace {
 
 // Colour of a pixel within its 2x2 cell.
@@ -135,3 +137,5 @@ ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept {
     *result = img::kOk;
     return rgb;
 }
+
+} // namespace img

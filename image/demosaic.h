@@ -3,6 +3,8 @@
 
 #include "image/image_buffer.h"
 
+namespace img {
+
 // Bilinear demosaic of a RAW, RAW_CFA, REAL32 image with one sample a pixel
 // (1.0 is full scale) into a new RGB, INTERLEAVED, UINT8 image of the same
 // size with the plain 0..256 levels; pixels only, no metadata. Of a record
@@ -12,3 +14,5 @@
 // -5 (img::kSizeMismatch) for a source without samples; -3 (img::kNoMemory).
 // The caller releases the image.
 ImageBuffer* demosaicToRgb8(const ImageBuffer* source, int* result) noexcept;
+
+} // namespace img

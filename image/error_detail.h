@@ -7,6 +7,8 @@
 #include <string>
 #include <utility>
 
+namespace img {
+
 class ErrorDetail {
 public:
     explicit ErrorDetail(std::string detail) : detail_(std::move(detail)) {}
@@ -27,3 +29,5 @@ public:
 
 // "<path>: <the system's text for errno>".
 std::string systemReason(const std::string& path, int error);
+
+} // namespace img

@@ -10,7 +10,9 @@
 
 #include "image/image_buffer.h"
 
-namespace img::exportText {
+namespace img {
+
+namespace exportText {
 
 // One metadata entry as a JPEG comment or a PNM header block: key, length of
 // the value, value, key.
@@ -110,4 +112,6 @@ inline void appendMetadataBlock(std::string& text, const MetadataEntry& entry) {
                     entry.value, entry.key);
 }
 
-} // namespace img::exportText
+} // namespace exportText
+
+} // namespace img

@@ -9,6 +9,8 @@
 
 #include <strings.h>
 
+namespace img {
+
 namespace {
 
 // Planes 1 and 2 of the YUV 4:2:2 and 4:2:0 types are narrower (and, for
@@ -397,3 +399,5 @@ int streamWriteFloat(std::FILE* file, bool bigEndian, float value) noexcept {
     std::memcpy(&bits, &value, sizeof bits);
     return writeBytes(file, 4, bigEndian, bits);
 }
+
+} // namespace img

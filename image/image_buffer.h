@@ -7,6 +7,8 @@
 #include <cstdio>
 #include <memory>
 
+namespace img {
+
 enum PixelType : std::uint32_t {
     kPixelNone = 0,
     kPixelOther = 1,
@@ -148,3 +150,5 @@ int streamWrite16(std::FILE* file, bool bigEndian, std::uint16_t value) noexcept
 int streamWrite32(std::FILE* file, bool bigEndian, std::uint32_t value) noexcept;
 int streamWrite64(std::FILE* file, bool bigEndian, std::uint64_t value) noexcept;
 [[nodiscard]] int streamWriteFloat(std::FILE* file, bool bigEndian, float value) noexcept;
+
+} // namespace img

@@ -1,7 +1,10 @@
 #pragma once
+
+namespace img {
+
 // The fixed texts of the image library and the Bayer image object.
 
-namespace img::msg {
+namespace msg {
 
 // Bayer image object: the texts of its runtime errors.
 inline constexpr char kCannotReadKqraw[] = "Cannot read kqraw image.";
@@ -45,4 +48,6 @@ inline constexpr char kPromptImages[] = "Number of Images = ";
 inline constexpr char kPromptHeaderSize[] = "Header Size = ";
 inline constexpr char kPromptNoAnswer[] = "ERROR: No answer on standard input.\n";
 
-} // namespace img::msg
+} // namespace msg
+
+} // namespace img

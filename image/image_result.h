@@ -1,8 +1,9 @@
 #pragma once
-// Result codes of the image library. Every procedural function returns one of
-// these (or reports it through an out parameter); none of them throws.
 
 namespace img {
+
+// Result codes of the image library. Every procedural function returns one of
+// these (or reports it through an out parameter); none of them throws.
 
 constexpr int kOk = 0;
 constexpr int kBadArgument = -1; // bad argument, or the file cannot be opened

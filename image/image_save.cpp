@@ -7,6 +7,8 @@
 #include "image/raw_writer.h"
 #include "image/tiff_writer.h"
 
+namespace img {
+
 int imageSave(const char* path, const ImageBuffer* image, int format, const int* parameters,
               int parameterCount) noexcept {
     if (!image || !image->data || imageTotalSamples(image, -1) == 0)
@@ -37,3 +39,5 @@ int imageSave(const char* path, const ImageBuffer* image, int format, const int*
         return img::kWrongFormat;
     }
 }
+
+} // namespace img

@@ -18,8 +18,6 @@ constexpr int kFormatPnm = 9; // binary PPM (three samples) or PGM (one sample)
 
 constexpr int kDefaultJpegQuality = 90;
 
-} // namespace img
-
 // Writes `image` to `path` in `format`. parameters may be null; JPEG takes
 // parameters[0] as its quality (0-100), 90 when parameterCount is 0.
 // Returns 0; -5 for a null image or one without samples; -6 when BMP or JPEG
@@ -28,3 +26,5 @@ constexpr int kDefaultJpegQuality = 90;
 // -2 write error, -3 no memory).
 [[nodiscard]] int imageSave(const char* path, const ImageBuffer* image, int format,
                             const int* parameters, int parameterCount) noexcept;
+
+} // namespace img

@@ -13,6 +13,8 @@
 #include "image/image_result.h"
 #include "image/output_file.h"
 
+namespace img {
+
 namespace {
 
 // libjpeg's error exit must not return: it jumps back into compress().
@@ -120,3 +122,5 @@ int jpegWrite(const char* path, const ImageBuffer* image, int quality) noexcept 
         return result;
     return file.commit() ? img::kOk : img::kIoError;
 }
+
+} // namespace img

@@ -14,6 +14,8 @@
 
 #include <sys/time.h>
 
+namespace img {
+
 namespace {
 
 KqRawBlock* allocateBlock(const char* tag, KqRawForm form) {
@@ -420,3 +422,5 @@ bool kqrawBlockWrite(const KqRawBlock* block, std::FILE* file) noexcept {
     }
     return false;
 }
+
+} // namespace img

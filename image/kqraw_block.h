@@ -12,29 +12,31 @@
 
 #include "image/byte_source.h"
 
+namespace img {
+
 constexpr std::size_t kKqRawTagSize = 16;
 constexpr std::size_t kKqRawBlockHeaderSize = 36;
 constexpr std::uint32_t kKqRawFileHeaderPayloadSize = 36;
 constexpr std::uint32_t kKqRawCapturePayloadSize = 56;
 constexpr std::uint32_t kKqRawPixelLeadSize = 8; // the two words before the samples
 
-namespace img::kqtag {
+namespace kqtag {
 inline constexpr char kFileHeader[] = "KQRAWFILE_111107";
 inline constexpr char kPixels[] = "PIXELDATA_111107";
 inline constexpr char kCapture[] = "CAPTURE___120118";
 inline constexpr char kSensorInfo[] = "SENSORINFO120131";
 inline constexpr char kComment[] = "COMMENT___120131";
 inline constexpr char kMakerNote[] = "MAKERNOTE_120131";
-} // namespace img::kqtag
+} // namespace kqtag
 
 // Payload offsets of the file header block.
-namespace img::kqhdr {
+namespace kqhdr {
 constexpr std::uint32_t kWidth = 0, kHeight = 4, kBayerCode = 8, kBitsPerSample = 12,
                         kSamplesPerPixel = 16, kNumberOfImages = 20, kSeconds = 24,
                         kMicroseconds = 28;
 }
 // Payload offsets of the capture block.
-namespace img::kqcap {
+namespace kqcap {
 constexpr std::uint32_t kVersion = 0, kExposureTime = 4, kSecondValue = 8, kCarried1 = 12,
                         kCarried2 = 16, kGain0 = 28;
 }
@@ -108,3 +110,5 @@ void kqrawHeaderStamp(KqRawBlock* header) noexcept;
 
 // Writes the block; false when a write fails.
 [[nodiscard]] bool kqrawBlockWrite(const KqRawBlock* block, std::FILE* file) noexcept;
+
+} // namespace img

@@ -11,6 +11,8 @@
 #include "image/kqraw_fixed_header.h"
 #include "image/output_file.h"
 
+namespace img {
+
 namespace {
 
 bool isHeaderBlock(const KqRawBlock* block) {
@@ -237,3 +239,5 @@ bool kqrawContainerWrite(const KqRawContainer* container, const char* path) noex
     }
     return output.commit();
 }
+
+} // namespace img

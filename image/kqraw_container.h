@@ -9,6 +9,8 @@
 #include "image/byte_source.h"
 #include "image/kqraw_block.h"
 
+namespace img {
+
 constexpr int kKqRawMaxBlocks = 100;
 
 struct KqRawContainer {
@@ -62,3 +64,5 @@ int kqrawContainerFindLast(const KqRawContainer* container, const char* tag) noe
                                              const KqRawBlock* pixels = nullptr) noexcept;
 // Writes a container file through a temporary beside the target.
 [[nodiscard]] bool kqrawContainerWrite(const KqRawContainer* container, const char* path) noexcept;
+
+} // namespace img

@@ -13,6 +13,8 @@
 #include "image/raw_samples.h"
 #include "image/sample_memory.h"
 
+namespace img {
+
 namespace {
 
 using HeaderPtr = img::MallocPtr<KqRawFixedHeader>;
@@ -187,3 +189,5 @@ int kqrawFixedToContainer(img::ByteSource& source, KqRawContainer** out) noexcep
     *out = container.release();
     return img::kOk;
 }
+
+} // namespace img

@@ -9,11 +9,13 @@
 #include "image/image_buffer.h"
 #include "image/kqraw_container.h"
 
+namespace img {
+
 struct KqRawFixedHeader {
     std::uint8_t bytes[kKqRawFixedHeaderSize];
 };
 
-namespace img::kqfix {
+namespace kqfix {
 constexpr std::uint32_t kVersion = 0, kRevision = 4, kWidth = 8, kHeight = 12, kBayerCode = 16,
                         kSensorGuid = 24, kExposureFixed = 32, kExposureFloat = 36,
                         kSecondValue = 40, kWord48 = 48, kGain0 = 68, kSerial = 88,
@@ -23,7 +25,7 @@ constexpr std::uint32_t kMagicValue = 0xDEADBEEF;
 constexpr std::uint32_t kEndMarkerValue = 0xCAFEFEED;
 // Revisions from 2 on hold the exposure time as 16.16 fixed point only.
 constexpr std::uint32_t kFirstFixedPointRevision = 2;
-} // namespace img::kqfix
+} // namespace kqfix
 
 // A fresh header (malloc'd, released with std::free): zeros, the magic word,
 // version 1, revision 1 and the end marker. Null when out of memory.
@@ -53,3 +55,5 @@ void kqrawFixedSetFloat(KqRawFixedHeader* header, std::uint32_t offset, float va
 // of 0, or pixels that run past the end of the data; -3; -2.
 [[nodiscard]] int kqrawFixedToContainer(img::ByteSource& source,
                                         KqRawContainer** container) noexcept;
+
+} // namespace img

@@ -10,6 +10,8 @@
 #include "image/malloc_ptr.h"
 #include "image/raw_samples.h"
 
+namespace img {
+
 int nkrawRead(img::ByteSource& source, ImageBuffer** out) noexcept {
     *out = nullptr;
     if (source.size() < kNkRawHeaderSize)
@@ -53,3 +55,5 @@ void nkrawCaptureToFixedHeader(const std::uint8_t* nk, KqRawFixedHeader* header)
     for (std::uint32_t c = 0; c < 4; ++c)
         kqrawFixedSetFloat(header, img::kqfix::kGain0 + 4 * c, gain);
 }
+
+} // namespace img

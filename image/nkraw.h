@@ -20,12 +20,14 @@
 #include "image/image_buffer.h"
 #include "image/kqraw_fixed_header.h"
 
-namespace img::nkraw {
+namespace img {
+
+namespace nkraw {
 inline constexpr char kMagic[] = "NKRAWHDR";
 constexpr std::uint32_t kMagicSize = 8, kWidth = 8, kHeight = 12, kBayerCode = 16,
                         kExposureMicroseconds = 20, kGainStep = 24, kGainNumerator = 28,
                         kGainDenominator = 32;
-} // namespace img::nkraw
+} // namespace nkraw
 
 // Result: 0 and a RAW, RAW_CFA, UINT16 image of file type NKRAW carrying the
 // header (bit depth from the largest sample, as for the other raw files); -4
@@ -37,3 +39,5 @@ constexpr std::uint32_t kMagicSize = 8, kWidth = 8, kHeight = 12, kBayerCode = 1
 // exposure time as 16.16 fixed point at +32, (g - 8) * 16384 at +40 and the
 // gain quotient as all four channel gains (0 when the denominator is 0).
 void nkrawCaptureToFixedHeader(const std::uint8_t* nkrawHeader, KqRawFixedHeader* header) noexcept;
+
+} // namespace img

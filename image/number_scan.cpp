@@ -5,6 +5,7 @@
 #include <system_error>
 
 namespace img {
+
 namespace {
 
 bool isDigit(char c) {

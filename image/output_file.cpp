@@ -9,6 +9,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+namespace img {
+
 namespace {
 
 #ifndef NAME_MAX
@@ -203,3 +205,5 @@ bool writeWholeFile(const std::string& path, const void* data, std::size_t size)
     }
     return file.commit();
 }
+
+} // namespace img

@@ -14,6 +14,8 @@
 #include <cstdio>
 #include <string>
 
+namespace img {
+
 class OutputFile {
 public:
     OutputFile() = default;
@@ -54,3 +56,5 @@ int standardStreamDescriptor(const std::string& path);
 
 // Writes a whole byte block to `path` through OutputFile. False on any failure.
 [[nodiscard]] bool writeWholeFile(const std::string& path, const void* data, std::size_t size);
+
+} // namespace img

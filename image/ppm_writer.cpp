@@ -11,6 +11,8 @@
 #include "image/image_result.h"
 #include "image/output_file.h"
 
+namespace img {
+
 namespace {
 
 namespace text = img::exportText;
@@ -166,3 +168,5 @@ int ppmWrite(const char* path, const ImageBuffer* image) noexcept {
         return img::kIoError;
     return file.commit() ? img::kOk : img::kIoError;
 }
+
+} // namespace img

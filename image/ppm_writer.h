@@ -3,6 +3,8 @@
 
 #include "image/image_buffer.h"
 
+namespace img {
+
 // Writes the first image of the record as binary PGM (one sample a pixel) or
 // PPM (three), with the image's properties, levels and metadata as header
 // comments. Integer samples keep their values, clipped to 2^bits - 1 (at most
@@ -12,3 +14,5 @@
 // samples; -6 any other sample count, sub-sampled YUV planes or an unknown
 // data type.
 [[nodiscard]] int ppmWrite(const char* path, const ImageBuffer* image) noexcept;
+
+} // namespace img

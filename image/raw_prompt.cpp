@@ -7,6 +7,7 @@
 #include "image/image_result.h"
 
 namespace img {
+
 namespace {
 
 class Console {

@@ -13,6 +13,7 @@
 #include "image/sample_memory.h"
 
 namespace img {
+
 namespace {
 
 // The image of a container: the pixel block hands its samples over rather
@@ -163,8 +164,6 @@ ImageBuffer* rawReadMemory(const std::uint8_t* data, std::size_t size, const cha
     return rawReadSource(source, nullptr, nullptr, result);
 }
 
-} // namespace img
-
 ImageBuffer* rawRead(const char* path, int* result) noexcept {
     int ignored;
     if (!result)
@@ -174,3 +173,5 @@ ImageBuffer* rawRead(const char* path, int* result) noexcept {
         return nullptr;
     return img::rawReadSource(*source, img::askOnConsole, nullptr, result);
 }
+
+} // namespace img

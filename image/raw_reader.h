@@ -9,6 +9,8 @@
 #include "image/byte_source.h"
 #include "image/image_buffer.h"
 
+namespace img {
+
 // Returns a RAW/RAW_CFA/UINT16 image (or, for a raw dump, what its layout
 // holds), or null with *result set: -1 the file cannot be opened; -2 read
 // error, or no answer on the console; -3 no memory; -4 not a raw file of any
@@ -17,8 +19,6 @@
 // file of the wrong size; -22 an NKRAW file of the wrong size; -23 the layout
 // given on the console does not match the file.
 [[nodiscard]] ImageBuffer* rawRead(const char* path, int* result) noexcept;
-
-namespace img {
 
 struct RawLayout;
 // Supplies the layout of a file of no known type: 0 or a negative result code.

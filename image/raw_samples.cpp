@@ -71,10 +71,6 @@ void applySampleDepth(ImageBuffer* image, std::uint16_t bits) noexcept {
     }
 }
 
-} // namespace img
-
-namespace img {
-
 bool samplesFit(std::uint64_t size, std::uint64_t offset, std::uint32_t width,
                 std::uint32_t height) noexcept {
     // Each factor is below 2^32, so the product cannot wrap in 64 bits;

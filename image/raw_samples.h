@@ -30,10 +30,6 @@ void applyLargestSampleDepth(ImageBuffer* image) noexcept;
 // The same for a depth already known.
 void applySampleDepth(ImageBuffer* image, std::uint16_t bits) noexcept;
 
-} // namespace img
-
-namespace img {
-
 // Makes a RAW, RAW_CFA, UINT16 image of width x height (one sample a pixel,
 // one image) and fills it with the samples at `offset` of the source; the bit
 // depth comes from the largest sample. Result: 0; -5 when a dimension is 0 or

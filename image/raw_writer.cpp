@@ -14,6 +14,8 @@
 #include "image/output_file.h"
 #include "image/raw_samples.h"
 
+namespace img {
+
 namespace {
 
 // RAW, RAW_CFA, UINT16, no black level or lower clip, and one white level
@@ -128,3 +130,5 @@ int rawWrite(const char* path, const ImageBuffer* image, std::uint32_t fileType)
     }
     return output.commit() ? img::kOk : img::kIoError;
 }
+
+} // namespace img

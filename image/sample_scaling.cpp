@@ -7,6 +7,7 @@
 #include "image/sample_memory.h"
 
 namespace img {
+
 namespace {
 
 template <typename Sample>

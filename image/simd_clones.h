@@ -1,4 +1,7 @@
 #pragma once
+
+namespace img {
+
 // A hot kernel marked LSC_VECTOR_CLONES is built a second time for AVX2 and
 // picked at load time where the processor has it. The wider vectors do the
 // same operations on each element (there is no contraction into fused
@@ -20,3 +23,5 @@
 #else
 #define LSC_VECTOR_CLONES
 #endif
+
+} // namespace img

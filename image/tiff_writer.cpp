@@ -17,6 +17,8 @@
 #include <sys/stat.h>
 #include <sys/types.h>
 
+namespace img {
+
 namespace {
 
 // libtiff talks to the OutputFile's stream through these; the stream stays
@@ -218,3 +220,5 @@ int tiffWrite(const char* path, const ImageBuffer* image) noexcept {
         return img::kIoError;
     return file.commit() ? img::kOk : img::kIoError;
 }
+
+} // namespace img

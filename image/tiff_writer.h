@@ -3,6 +3,8 @@
 
 #include "image/image_buffer.h"
 
+namespace img {
+
 // Writes one uncompressed image (the first, when the record holds several)
 // with the image's properties, levels and metadata in the ImageDescription
 // tag. Samples are stored at the width of their data type (8, 16 or 32 bits;
@@ -10,3 +12,5 @@
 // opened; -2 libtiff or a write, flush or close failed; -3 no memory; -5 no
 // samples; -6 sub-sampled YUV planes or a data type without a sample width.
 [[nodiscard]] int tiffWrite(const char* path, const ImageBuffer* image) noexcept;
+
+} // namespace img

@@ -12,6 +12,13 @@
 
 namespace lsc {
 
+using img::BayerImage;
+using img::ImageBuffer;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kDataReal32;
+using img::kPixelRaw;
+
 BayerImage applyLensShading(const BayerImage& image, const ShadingCorrection& correction,
                             float blackLevel, unsigned applyStep) {
     const WorkingImage in = workingImage(image);

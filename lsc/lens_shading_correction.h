@@ -15,7 +15,7 @@ namespace lsc {
 // below 1, an image smaller than 2 x applyStep in either direction, a patch
 // geometry that leaves a patch without pixels, and when the output image
 // cannot be allocated ("Unable to allocate image memory.").
-BayerImage applyLensShading(const BayerImage& image, const ShadingCorrection& correction,
-                            float blackLevel, unsigned applyStep);
+img::BayerImage applyLensShading(const img::BayerImage& image, const ShadingCorrection& correction,
+                                 float blackLevel, unsigned applyStep);
 
 } // namespace lsc

@@ -24,6 +24,8 @@
 
 namespace lsc {
 
+using img::BayerImage;
+
 namespace {
 
 constexpr double kTargetTolerance = 1e-7;

@@ -16,7 +16,7 @@ namespace lsc {
 // or, for samples read from a file (they may come from another capture), the
 // prepared image with the black level still in.
 struct SampleOrigin {
-    const BayerImage& image;
+    const img::BayerImage& image;
     bool fromImage;
 };
 
@@ -41,7 +41,7 @@ FitResult fitLensShading(const SampleSet& samples, const SampleOrigin& origin,
 // The automatic layout's trial fit: `channel` alone, quietly, without the
 // deviation check (which does not depend on the layout); every grid of the
 // result is that channel's. Throws as fitLensShading.
-FitResult fitTrialChannel(const SampleSet& samples, const BayerImage& levelled,
+FitResult fitTrialChannel(const SampleSet& samples, const img::BayerImage& levelled,
                           const ShadingSettings& settings, int channel);
 
 } // namespace lsc

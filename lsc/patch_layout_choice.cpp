@@ -12,6 +12,8 @@
 
 namespace lsc {
 
+using img::BayerImage;
+
 namespace {
 
 constexpr double kOuterFactors[] = {0.2, 0.3, 0.35, 0.4};

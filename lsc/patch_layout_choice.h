@@ -23,7 +23,7 @@ std::vector<PatchLayout> candidateLayouts(const PatchLayout& configured, std::ui
 // mean / channel mean - 1| of `channel` (blocks wholly inside the image), or
 // over the four channels for -1. Blocks that large keep the noise of one
 // capture small against what the layouts change.
-double correctedFlatness(const BayerImage& corrected, int channel = -1);
+double correctedFlatness(const img::BayerImage& corrected, int channel = -1);
 
 struct LayoutChoice {
     PatchLayout layout;
@@ -38,6 +38,6 @@ struct LayoutChoice {
 // for green/red alone, and picks the one that leaves green/red flattest; a candidate whose fit
 // fails is skipped, and when all fail the configured layout stays (the run's own fit then reports
 // why). The first of equally flat candidates wins.
-LayoutChoice chooseLayout(const BayerImage& prepared, const ShadingSettings& settings);
+LayoutChoice chooseLayout(const img::BayerImage& prepared, const ShadingSettings& settings);
 
 } // namespace lsc

@@ -17,6 +17,8 @@
 
 namespace lsc {
 
+using img::BayerImage;
+
 namespace {
 
 constexpr float kDegreesToRadians = 0.017453292f;

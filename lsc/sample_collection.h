@@ -12,7 +12,7 @@ namespace lsc {
 // The prepared image with the black level taken out of every pixel, clamped
 // to 0..1: what the samples and their target levels are measured on. Throws
 // std::runtime_error for a missing or non-float image.
-BayerImage levelledImage(const BayerImage& prepared, float blackLevel);
+img::BayerImage levelledImage(const img::BayerImage& prepared, float blackLevel);
 
 // Takes 2x2 Bayer samples of the levelled image on a sine-spaced grid
 // (densest at the borders) and along the patch borders of settings.layout
@@ -24,7 +24,7 @@ BayerImage levelledImage(const BayerImage& prepared, float blackLevel);
 // non-float image and for settings the sampling cannot use (angle step below
 // 1, negative margin, preparation sampling factor below 1, a sample window
 // that is even or outside 1..15).
-SampleSet collectSamples(const BayerImage& levelled, const ShadingSettings& settings,
+SampleSet collectSamples(const img::BayerImage& levelled, const ShadingSettings& settings,
                          std::ostream& messages);
 
 } // namespace lsc

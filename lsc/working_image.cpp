@@ -6,6 +6,10 @@
 
 namespace lsc {
 
+using img::BayerImage;
+using img::ImageBuffer;
+using img::kDataReal32;
+
 WorkingImage workingImage(const BayerImage& image) {
     if (image.empty())
         throw std::runtime_error(lsc::msg::kNoWorkingImage);

@@ -18,6 +18,6 @@ struct WorkingImage {
 // Throws std::runtime_error when the image is empty or not a single-plane
 // REAL32 image with pixel data. The view reads the image; only the owner of
 // an image it made itself writes through it (levelledImage).
-WorkingImage workingImage(const BayerImage& image);
+WorkingImage workingImage(const img::BayerImage& image);
 
 } // namespace lsc

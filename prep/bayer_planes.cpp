@@ -8,6 +8,13 @@
 #include "prep/prep_messages.h"
 
 namespace prep {
+
+using img::BayerImage;
+using img::ImageBuffer;
+using img::kBufferInterleaved;
+using img::kBufferRawCfa;
+using img::kPixelOther;
+using img::kPixelRaw;
 namespace {
 
 // The common case, a single-channel 2 x 2 pattern, with two row pointers.

@@ -24,16 +24,16 @@ std::int32_t downsampledSize(std::int32_t size, int factor);
 
 // The plane image of a mosaic (first channel of the mosaic; the channels of a
 // multi-channel mosaic beyond the first p * p are zero).
-BayerImage split(const BayerImage& mosaic);
+img::BayerImage split(const img::BayerImage& mosaic);
 
 // Plain decimation: target(x, y, k) = planes(factor * x, factor * y, k). The
 // target is (re)created here with the down-sampled size and the same channels.
-void downsample(const BayerImage& planes, int factor, BayerImage& target);
+void downsample(const img::BayerImage& planes, int factor, img::BayerImage& target);
 
 // The mosaic of a plane image with p * p channels: width and height times p,
 // one channel, pixel type RAW with the given cfa words. Throws
 // std::invalid_argument for a plane image of another channel count or cfa
 // words of another pattern size.
-BayerImage weave(const BayerImage& planes, int p, std::uint32_t cfa0, std::uint32_t cfa1);
+img::BayerImage weave(const img::BayerImage& planes, int p, std::uint32_t cfa0, std::uint32_t cfa1);
 
 } // namespace prep

@@ -12,6 +12,8 @@
 
 namespace prep {
 
+using img::BayerImage;
+
 using lsc::kChannelNames;
 
 namespace {

@@ -22,7 +22,7 @@ struct CentreLevels {
     double level[4] = {0, 0, 0, 0};
     bool valid = false;
 };
-CentreLevels centreLevels(const BayerImage& mosaic, float blackLevel);
+CentreLevels centreLevels(const img::BayerImage& mosaic, float blackLevel);
 
 // Why the declared order `orderName` looks wrong, empty when it does not:
 // the two greens of the centre differ by more than kGreenMismatch, or red or

@@ -15,6 +15,12 @@
 #include "prep/mosaic_stream.h"
 
 namespace prep {
+
+using img::throwCannotReadCapture;
+
+using img::BayerImage;
+using img::ImageBuffer;
+using img::ImagePtr;
 namespace {
 
 // A read that stops before the samples the header declares: the file is

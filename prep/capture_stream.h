@@ -31,7 +31,7 @@ enum class CaptureLoad {
 // twice: the depth that converts them is known after the last one).
 // `rows`, if given, also receives every row of a prepared capture.
 [[nodiscard]] CaptureLoad loadPrepared(const std::string& path, const MosaicPreparation& settings,
-                                       BayerImage& input, BayerImage& prepared,
+                                       img::BayerImage& input, img::BayerImage& prepared,
                                        SampleStatistics* inputStatistics = nullptr,
                                        img::MosaicRowSink* rows = nullptr);
 
@@ -44,8 +44,8 @@ enum class CaptureLoad {
 // (the depth that each frame's largest sample sets), and as loadPrepared for
 // a frame that cannot be read.
 [[nodiscard]] CaptureLoad loadAveragedPrepared(const std::vector<std::string>& paths,
-                                               const MosaicPreparation& settings, BayerImage& input,
-                                               BayerImage& prepared,
+                                               const MosaicPreparation& settings,
+                                               img::BayerImage& input, img::BayerImage& prepared,
                                                img::MosaicRowSink* rows = nullptr);
 
 } // namespace prep

@@ -27,6 +27,6 @@ struct DeltaAbResult {
 // from it so).
 // Throws std::runtime_error for block counts below 1, an image too small for
 // one pixel per block, and an image without any green signal.
-DeltaAbResult evaluateDeltaAb(BayerImage& balanced, const lsc::ShadingSettings& settings);
+DeltaAbResult evaluateDeltaAb(img::BayerImage& balanced, const lsc::ShadingSettings& settings);
 
 } // namespace prep

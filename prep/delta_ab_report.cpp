@@ -10,6 +10,8 @@
 #include "prep/prep_messages.h"
 
 namespace prep {
+
+using img::OutputFile;
 namespace {
 
 // Report files read the same in every locale.

@@ -6,6 +6,8 @@
 
 namespace prep {
 
+using img::cfaPatternName;
+
 std::string frameDifference(const FrameShape& frame, const FrameShape& first) {
     std::string text;
     const auto add = [&](const std::string& part) { text += (text.empty() ? "" : ", ") + part; };

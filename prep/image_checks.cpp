@@ -13,6 +13,9 @@
 #include "prep/prep_messages.h"
 
 namespace prep {
+
+using img::BayerImage;
+using img::DetailedError;
 namespace {
 
 double roundHalfUp(double x) {

@@ -21,7 +21,7 @@ std::uint32_t fullScale(int depth);
 // whole units of full scale) and "Average pixel value = " (two decimals) into
 // `out`, the first two ended with std::endl, the last left open for the caller
 // to end. The stream stays in fixed notation with precision 2.
-void writeStatistics(const BayerImage& image, int depth, std::ostream& out);
+void writeStatistics(const img::BayerImage& image, int depth, std::ostream& out);
 
 // The figures behind those lines: extremes and the sum (in double, sample
 // after sample in storage order) of the float samples.
@@ -31,7 +31,7 @@ struct SampleStatistics {
     double sum = 0.0;
     std::size_t count = 0;
 };
-SampleStatistics sampleStatistics(const BayerImage& image);
+SampleStatistics sampleStatistics(const img::BayerImage& image);
 void writeStatistics(const SampleStatistics& statistics, int depth, std::ostream& out);
 
 // Position of an out-of-range sample; row -1 when there is none.
@@ -44,10 +44,10 @@ struct OutOfRangePosition {
 // Visits rows, then columns, then channels and returns the last sample below
 // `low` or above `high` (a sample equal to a limit is inside). A sample that
 // is not a number is outside.
-OutOfRangePosition scanRange(const BayerImage& image, float low, float high);
+OutOfRangePosition scanRange(const img::BayerImage& image, float low, float high);
 
 // Largest sample of the whole image.
-float peakSample(const BayerImage& image);
+float peakSample(const img::BayerImage& image);
 
 // A sample as a whole number of full-scale units, sample * M + 0.5 truncated,
 // kept within 0..M.
@@ -73,12 +73,12 @@ std::int64_t sensorCoordinate(std::int32_t reduced, int factor);
 // explanation (every line ended by '\n'); a failed range check carries an
 // ErrorDetail: which side, the share of pixels beyond it and where the worst
 // one lies on the sensor.
-void checkPixelRange(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
-                     std::ostream& out);
-void checkPeakLevel(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
-                    std::ostream& out);
+void checkPixelRange(const img::BayerImage& image, const PixelLimits& limits,
+                     std::uint32_t fullScale, std::ostream& out);
+void checkPeakLevel(const img::BayerImage& image, const PixelLimits& limits,
+                    std::uint32_t fullScale, std::ostream& out);
 // Both, in that order.
-void checkPixels(const BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
+void checkPixels(const img::BayerImage& image, const PixelLimits& limits, std::uint32_t fullScale,
                  std::ostream& out);
 
 } // namespace prep

@@ -17,7 +17,7 @@ namespace prep {
 // mean of the two greens) after the colour matrix settings.ccm. Nothing when
 // the grid does not fit the image (no blocks, or blocks of no pixel) or the
 // image holds no light.
-std::optional<float> luminanceResidual(const BayerImage& balanced,
+std::optional<float> luminanceResidual(const img::BayerImage& balanced,
                                        const lsc::ShadingSettings& settings);
 
 // Throws std::range_error "Maximum luminance residual is greater than

@@ -12,6 +12,10 @@
 #include "prep/window_mirror.h"
 
 namespace prep {
+
+using img::BayerImage;
+using img::kBufferInterleaved;
+using img::kPixelOther;
 namespace {
 
 constexpr std::size_t kTreeChannels = 4; // channels filtered side by side

@@ -15,6 +15,7 @@ inline constexpr int kMaxMedianSize = 10;
 
 // Creates `target` with the down-sampled size of `planes` and fills it.
 // Throws std::invalid_argument for a size outside 1..10 or a factor below 1.
-void medianFilterDownsample(const BayerImage& planes, int size, int factor, BayerImage& target);
+void medianFilterDownsample(const img::BayerImage& planes, int size, int factor,
+                            img::BayerImage& target);
 
 } // namespace prep

@@ -13,6 +13,11 @@
 #include "prep/window_mirror.h"
 
 namespace prep {
+
+using img::BayerImage;
+using img::ImageBuffer;
+using img::kBufferRawCfa;
+using img::kPixelRaw;
 namespace {
 
 // The three steps one after the other, for the patterns the one-pass form

@@ -23,6 +23,6 @@ struct MosaicPreparation {
 // is not copied. Throws std::invalid_argument as the three steps do (not a
 // float image, a window size outside 1..10, a factor below 1, an image smaller
 // than its pattern, a multi-channel mosaic that cannot be woven back).
-BayerImage prepareMosaic(const BayerImage& mosaic, const MosaicPreparation& settings);
+img::BayerImage prepareMosaic(const img::BayerImage& mosaic, const MosaicPreparation& settings);
 
 } // namespace prep

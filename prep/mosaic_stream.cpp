@@ -17,6 +17,10 @@
 
 namespace prep {
 
+using img::BayerImage;
+using img::kBufferRawCfa;
+using img::kPixelRaw;
+
 namespace {
 
 constexpr int kChannels = 4;     // of a 2 x 2 pattern

@@ -46,7 +46,7 @@ public:
 
     // After the last row: the prepared mosaic (REAL32, one channel, pixel
     // type RAW with the cfa words), samples converted at `bits` bits.
-    BayerImage finish(std::uint16_t bits, std::uint32_t cfa0, std::uint32_t cfa1);
+    img::BayerImage finish(std::uint16_t bits, std::uint32_t cfa0, std::uint32_t cfa1);
 
 private:
     void emitReadyRows();

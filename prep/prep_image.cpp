@@ -9,6 +9,13 @@
 #include <sys/mman.h>
 
 namespace prep {
+
+using img::BayerImage;
+using img::ImageBuffer;
+using img::imageCreate;
+using img::kDataReal32;
+using img::kPixelYuv420;
+using img::kPixelYuv422;
 namespace {
 
 // Large images are first written right after allocation; asking for huge pages

@@ -10,15 +10,16 @@
 
 namespace prep {
 
-BayerImage createFloatImage(std::int32_t width, std::int32_t height, std::uint16_t bitsPerSample,
-                            std::uint16_t channels, std::uint32_t cfa0, std::uint32_t cfa1,
-                            std::uint32_t pixelType, std::uint32_t bufferType);
+img::BayerImage createFloatImage(std::int32_t width, std::int32_t height,
+                                 std::uint16_t bitsPerSample, std::uint16_t channels,
+                                 std::uint32_t cfa0, std::uint32_t cfa1, std::uint32_t pixelType,
+                                 std::uint32_t bufferType);
 
 // Throws std::invalid_argument unless the image holds REAL32 samples with a
 // positive size and one image in its block.
-void requireFloatImage(const BayerImage& image);
+void requireFloatImage(const img::BayerImage& image);
 
 // width x height x channels of a checked float image.
-std::size_t sampleCount(const BayerImage& image);
+std::size_t sampleCount(const img::BayerImage& image);
 
 } // namespace prep

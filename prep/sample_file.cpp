@@ -16,6 +16,9 @@
 
 namespace prep {
 
+using img::BayerImage;
+using img::OutputFile;
+
 using lsc::kChannels;
 using lsc::SampleSet;
 using lsc::shadingSample;

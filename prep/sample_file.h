@@ -47,13 +47,13 @@ lsc::SampleSet parseSampleFile(std::string_view text, std::int32_t width, std::i
 // taken from; its size is written). Written through OutputFile; throws
 // std::runtime_error "Cannot open sample output file: " + path, or a write
 // error naming the path.
-void writeSampleFile(const std::string& path, const lsc::SampleSet& set, const BayerImage& image,
-                     const SampleFileScale& scale);
+void writeSampleFile(const std::string& path, const lsc::SampleSet& set,
+                     const img::BayerImage& image, const SampleFileScale& scale);
 
 // The target levels and samples of the file, for the prepared `image`.
 // Throws std::runtime_error "Cannot open input sample file: " + path, or the
 // parser's message.
-lsc::SampleSet readSampleFile(const std::string& path, const BayerImage& image,
+lsc::SampleSet readSampleFile(const std::string& path, const img::BayerImage& image,
                               const SampleFileScale& scale);
 
 } // namespace prep

@@ -11,6 +11,8 @@
 
 namespace prep {
 
+using img::BayerImage;
+
 using lsc::kChannels;
 using lsc::targetLevelsOf;
 using lsc::WorkingImage;

@@ -19,19 +19,19 @@ CentreWindow centreWindow(std::int32_t width, std::int32_t height);
 
 // Mean of each channel over the centre window. Throws std::runtime_error
 // when the window misses a channel.
-void centreLevels(const BayerImage& image, float (&levels)[lsc::kChannels]);
+void centreLevels(const img::BayerImage& image, float (&levels)[lsc::kChannels]);
 
 // The levels the flattened image is balanced to: the fit's target levels, or,
 // when the red one is 0 (a sample file may hold that), the channel means
 // over the image's centre window.
-void balanceLevels(const float (&targetLevels)[lsc::kChannels], const BayerImage& image,
+void balanceLevels(const float (&targetLevels)[lsc::kChannels], const img::BayerImage& image,
                    float (&levels)[lsc::kChannels]);
 
 // Scales the channels of the flattened Bayer image to a common level: each
 // channel is multiplied by (largest level / its level). Throws
 // std::runtime_error when a level is not positive, leaving the image as it
 // was.
-void whiteBalance(BayerImage& image, const float (&levels)[lsc::kChannels]);
+void whiteBalance(img::BayerImage& image, const float (&levels)[lsc::kChannels]);
 
 // Odd box side for a filter size given in full-resolution pixels, on planes of
 // an image prepared with `samplingFactor`: k = filterSize / (2 * factor), made
@@ -43,7 +43,7 @@ int boxSide(int filterSize, int samplingFactor);
 // preparation sampling factor, shrinking at the borders), its largest value;
 // the rule of the fit's target levels. Throws std::runtime_error for an image
 // smaller than 2 x 2.
-void measureLevels(float (&levels)[lsc::kChannels], const BayerImage& image, int awbFilterSize,
+void measureLevels(float (&levels)[lsc::kChannels], const img::BayerImage& image, int awbFilterSize,
                    int samplingFactor);
 
 } // namespace prep

@@ -11,6 +11,10 @@
 
 namespace report {
 
+using img::BayerImage;
+using img::ImageBuffer;
+using img::kDataReal32;
+
 using lsc::AxisPosition;
 using lsc::axisPosition;
 using lsc::evalPatch;

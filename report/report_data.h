@@ -28,7 +28,7 @@ BlockGrid blockGridFor(std::int64_t width, std::int64_t height, int longSide);
 // reduced to one cell per block. One pass over the pixels.
 // Throws std::runtime_error for an image that is not a single-plane float
 // Bayer image of at least 2 x 2 pixels, and for fewer than one block.
-ChannelBlockMeans blockMeans(const BayerImage& mosaic, int columns, int rows);
+ChannelBlockMeans blockMeans(const img::BayerImage& mosaic, int columns, int rows);
 
 // Shading relative to each channel's peak: the black level (a fraction of
 // full scale) taken off every block, clamped at 0 as the fit does, then every

@@ -10,6 +10,8 @@
 
 namespace report {
 
+using img::OutputFile;
+
 namespace {
 
 // Sizes in mm and pt so print and screen agree; colours that print well in

@@ -11,6 +11,8 @@
 
 namespace report {
 
+using img::writeWholeFile;
+
 using lsc::kChannels;
 
 namespace {

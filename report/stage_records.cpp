@@ -6,6 +6,9 @@
 
 namespace report {
 
+using img::BayerImage;
+using img::cfaPatternName;
+
 using lsc::FitDeviations;
 using lsc::kChannels;
 using lsc::kGridPoints;

@@ -17,12 +17,13 @@ namespace report {
 // The input image as the run reads it: `depth` is the run's bit depth,
 // `frames` the number averaged; with `fixedNotation` the inspection lines
 // were printed after the debug statistics.
-void recordInput(RunReport& report, const BayerImage& input, const std::string& path, int depth,
-                 int frames, bool fixedNotation);
+void recordInput(RunReport& report, const img::BayerImage& input, const std::string& path,
+                 int depth, int frames, bool fixedNotation);
 
 // The prepared image; with `shading`, also its block means relative to each
 // channel's peak, the black level taken out (the report's shading map).
-void recordPrepared(RunReport& report, const BayerImage& prepared, float blackLevel, bool shading);
+void recordPrepared(RunReport& report, const img::BayerImage& prepared, float blackLevel,
+                    bool shading);
 
 // The sample points the fit used, in prepared-image pixels.
 void recordSamples(RunReport& report, const lsc::SampleSet& samples);
@@ -41,7 +42,7 @@ void recordMeasuredRatios(RunReport& report, float red, float blue);
 
 // R/G and B/G after the white balance; with `residual`, the balanced image's
 // block means as deviations from each channel's mean.
-void recordWhiteBalance(RunReport& report, float red, float blue, const BayerImage& balanced,
+void recordWhiteBalance(RunReport& report, float red, float blue, const img::BayerImage& balanced,
                         bool residual);
 
 void recordLuminance(RunReport& report, std::optional<float> residual, float boundPercent);

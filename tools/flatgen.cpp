@@ -17,6 +17,8 @@
 
 using namespace testing_support;
 
+using img::writeWholeFile;
+
 namespace {
 
 const char kHelp[] =

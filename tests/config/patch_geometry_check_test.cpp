@@ -10,6 +10,13 @@
 
 namespace config {
 
+using img::BayerImage;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kCfaRggb;
+using img::kDataNone;
+using img::kPixelRaw;
+
 using lsc::ShadingCorrection;
 namespace {
 

@@ -14,6 +14,9 @@
 
 namespace config {
 
+using img::BayerImage;
+using img::kCfaRggb;
+
 using lsc::FitResult;
 using lsc::kChannels;
 using lsc::kGridPoints;

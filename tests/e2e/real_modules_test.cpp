@@ -19,6 +19,8 @@
 
 namespace e2e {
 
+using img::BayerImage;
+
 using lsc::applyLensShading;
 using lsc::candidateLayouts;
 using lsc::chooseLayout;

@@ -9,6 +9,7 @@
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::KqRawBuilder;
@@ -255,3 +256,4 @@ TEST_F(BayerImageTest, StoresJpegAndBmp) {
 }
 
 } // namespace
+} // namespace img

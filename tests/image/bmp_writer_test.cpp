@@ -8,6 +8,7 @@
 #include "image/image_buffer.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::TempDir;
@@ -106,3 +107,4 @@ TEST(BmpWriter, ReportsAWriteThatFails) {
 }
 
 } // namespace
+} // namespace img

@@ -15,6 +15,7 @@
 
 using namespace testing_support;
 
+namespace img {
 namespace {
 
 constexpr std::uint64_t kTailOffset = std::uint64_t{3} << 30; // 3 GiB
@@ -57,3 +58,4 @@ TEST(FileSource, ReadsBothEndsOfAFileLargerThanTwoGibibytes) {
 }
 
 } // namespace
+} // namespace img

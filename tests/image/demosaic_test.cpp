@@ -7,6 +7,7 @@
 #include "image/demosaic.h"
 #include "image/image_buffer.h"
 
+namespace img {
 namespace {
 
 ImagePtr bayerImage(std::int32_t width, std::int32_t height, std::uint32_t cfa1,
@@ -158,3 +159,4 @@ TEST(Demosaic, RefusesPatternsOtherThanTheFourBayerOrders) {
 }
 
 } // namespace
+} // namespace img

@@ -7,12 +7,12 @@
 
 #include "image/image_buffer.h"
 
-inline ImagePtr makeImage(std::int32_t width, std::int32_t height, std::uint16_t bits,
-                          std::uint16_t samples, std::uint32_t cfa1, std::uint32_t pixelType,
-                          std::uint32_t bufferType, std::uint32_t dataType) {
+inline img::ImagePtr makeImage(std::int32_t width, std::int32_t height, std::uint16_t bits,
+                               std::uint16_t samples, std::uint32_t cfa1, std::uint32_t pixelType,
+                               std::uint32_t bufferType, std::uint32_t dataType) {
     int result = 0;
-    ImagePtr image(imageCreate(width, height, bits, samples, 1, 0, cfa1, pixelType, bufferType,
-                               dataType, &result));
+    img::ImagePtr image(img::imageCreate(width, height, bits, samples, 1, 0, cfa1, pixelType,
+                                         bufferType, dataType, &result));
     EXPECT_EQ(result, 0);
     return image;
 }

@@ -6,6 +6,7 @@
 #include "image/image_buffer.h"
 #include "image/image_result.h"
 
+namespace img {
 namespace {
 
 ImagePtr create(std::int32_t w, std::int32_t h, std::uint16_t bits, std::uint16_t spp,
@@ -219,3 +220,4 @@ TEST(ImageStreamIo, ScalarsRoundTripInBothByteOrders) {
 }
 
 } // namespace
+} // namespace img

@@ -7,6 +7,7 @@
 #include "image/image_save.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::TempDir;
@@ -108,3 +109,4 @@ TEST(ImageSave, RefusesUnknownFormats) {
 }
 
 } // namespace
+} // namespace img

@@ -11,6 +11,7 @@
 #include "image/jpeg_writer.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::TempDir;
@@ -172,3 +173,4 @@ TEST(JpegWriter, RefusesImagesWithoutEightBitSamples) {
 }
 
 } // namespace
+} // namespace img

@@ -9,6 +9,7 @@
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::KqRawBuilder;
@@ -286,3 +287,4 @@ TEST(KqRawContainerWrite, RefusesAContainerWithoutHeaderOrPixels) {
 }
 
 } // namespace
+} // namespace img

@@ -7,6 +7,7 @@
 
 #include "image/kqraw_block.h"
 
+namespace img {
 namespace {
 
 TEST(KqRawHeaderStamp, RecordsTheSystemClock) {
@@ -32,3 +33,4 @@ TEST(KqRawHeaderStamp, ClockReachesPastJanuary2038) {
 }
 
 } // namespace
+} // namespace img

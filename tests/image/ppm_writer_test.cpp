@@ -10,6 +10,7 @@
 #include "tests/image/export_test_image.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::TempDir;
@@ -87,3 +88,4 @@ TEST(PpmWriter, ReportsAWriteThatFails) {
 }
 
 } // namespace
+} // namespace img

@@ -6,6 +6,7 @@
 #include "image/image_buffer.h"
 #include "image/raw_prompt.h"
 
+namespace img {
 namespace {
 
 // Runs the questions over a given input; returns what was written to the console.
@@ -89,3 +90,4 @@ TEST(RawPrompt, AnswersThatAreNotNumbersAreAskedAgain) {
 }
 
 } // namespace
+} // namespace img

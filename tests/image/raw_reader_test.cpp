@@ -10,6 +10,7 @@
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using rawtest::readBytes;
@@ -272,3 +273,4 @@ TEST(RawReadLayout, ConsoleIsAskedOnlyAfterEveryKnownType) {
 }
 
 } // namespace
+} // namespace img

@@ -82,14 +82,14 @@ inline std::string nkrawFile(std::uint32_t width, std::uint32_t height,
     return bytes + samplesLE(samples);
 }
 
-inline ImagePtr readBytes(const std::string& bytes, int* result) {
-    return ImagePtr(img::rawReadMemory(reinterpret_cast<const std::uint8_t*>(bytes.data()),
-                                       bytes.size(), "test.raw", result));
+inline img::ImagePtr readBytes(const std::string& bytes, int* result) {
+    return img::ImagePtr(img::rawReadMemory(reinterpret_cast<const std::uint8_t*>(bytes.data()),
+                                            bytes.size(), "test.raw", result));
 }
 
-inline std::vector<std::uint16_t> samplesOf(const ImageBuffer* image) {
+inline std::vector<std::uint16_t> samplesOf(const img::ImageBuffer* image) {
     const auto* p = static_cast<const std::uint16_t*>(image->data);
-    return std::vector<std::uint16_t>(p, p + imageTotalSamples(image, -1));
+    return std::vector<std::uint16_t>(p, p + img::imageTotalSamples(image, -1));
 }
 
 inline std::vector<std::uint16_t> ramp(std::size_t count, std::uint16_t top) {

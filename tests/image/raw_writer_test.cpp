@@ -7,6 +7,7 @@
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::KqRawBuilder;
@@ -149,3 +150,4 @@ TEST(RawWritePreconditions, EachRefusalHasItsCode) {
 }
 
 } // namespace
+} // namespace img

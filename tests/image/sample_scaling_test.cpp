@@ -11,6 +11,7 @@
 #include "image/sample_memory.h"
 #include "image/sample_scaling.h"
 
+namespace img {
 namespace {
 
 // A raw image; with `room`, its block is the kind the raw readers allocate.
@@ -84,3 +85,4 @@ TEST(WidenSamplesToFloat, RefusesOtherDataTypesAndLeavesThemAlone) {
 }
 
 } // namespace
+} // namespace img

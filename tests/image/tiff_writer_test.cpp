@@ -14,6 +14,7 @@
 #include "tests/image/export_test_image.h"
 #include "tests/support/temp_dir.h"
 
+namespace img {
 namespace {
 
 using testing_support::TempDir;
@@ -146,3 +147,4 @@ TEST(TiffWriter, ReportsOpenAndWriteFailures) {
 }
 
 } // namespace
+} // namespace img

@@ -7,6 +7,13 @@
 #include "lsc_test_image.h"
 
 namespace lsc {
+
+using img::BayerImage;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+using img::kDataReal32;
 namespace {
 
 using lsc_test::makeImage;

@@ -12,6 +12,9 @@
 #include "lsc_test_image.h"
 
 namespace lsc {
+
+using img::BayerImage;
+using img::kCfaRggb;
 namespace {
 
 using lsc_test::channelLevels;

@@ -16,6 +16,12 @@
 #include "tests/support/flat_field.h"
 
 namespace lsc {
+
+using img::BayerImage;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
 namespace {
 
 using testing_support::FlatField;

@@ -15,11 +15,11 @@ namespace lsc_test {
 
 // Gives `image` a width x height REAL32 Bayer image of pattern `cfa` whose
 // pixel (x, y) is value(x, y).
-inline void makeImage(BayerImage& image, int width, int height, std::uint32_t cfa,
+inline void makeImage(img::BayerImage& image, int width, int height, std::uint32_t cfa,
                       const std::function<float(int, int)>& value, std::uint16_t bits = 10) {
     int rc = 0;
-    image.reset(
-        imageCreate(width, height, bits, 1, 1, 0, cfa, kPixelRaw, kBufferRawCfa, kDataReal32, &rc));
+    image.reset(img::imageCreate(width, height, bits, 1, 1, 0, cfa, img::kPixelRaw,
+                                 img::kBufferRawCfa, img::kDataReal32, &rc));
     ASSERT_NE(image.buffer(), nullptr) << rc;
     float* p = image.pixels();
     for (int y = 0; y < height; ++y)
@@ -29,7 +29,10 @@ inline void makeImage(BayerImage& image, int width, int height, std::uint32_t cf
 
 // Pixel value of a flat field whose channels (in channel order) sit at levels[k].
 inline std::function<float(int, int)> channelLevels(std::uint32_t cfa, const float levels[4]) {
-    const int phase = cfa == kCfaGrbg ? 1 : cfa == kCfaGbrg ? 2 : cfa == kCfaBggr ? 3 : 0;
+    const int phase = cfa == img::kCfaGrbg   ? 1
+                      : cfa == img::kCfaGbrg ? 2
+                      : cfa == img::kCfaBggr ? 3
+                                             : 0;
     const float l0 = levels[0], l1 = levels[1], l2 = levels[2], l3 = levels[3];
     return [=](int x, int y) {
         const int k = ((x + phase) & 1) + ((y + (phase >> 1)) & 1) * 2;

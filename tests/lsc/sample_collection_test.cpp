@@ -8,6 +8,12 @@
 #include "lsc_test_image.h"
 
 namespace lsc {
+
+using img::BayerImage;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
 namespace {
 
 using lsc_test::channelLevels;

@@ -9,6 +9,11 @@
 #include "lsc/sample_window.h"
 
 namespace lsc {
+
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
 namespace {
 
 // A width x height RGGB working image over its own pixel store, every pixel

@@ -9,6 +9,17 @@ using prep_test::fillRamp;
 using prep_test::makeImage;
 using prep_test::samplesOf;
 
+using img::BayerImage;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+using img::kDataUint16;
+using img::kPixelOther;
+using img::kPixelRaw;
+
 namespace {
 
 TEST(PatternSize, TwoByTwoBayerOrders) {

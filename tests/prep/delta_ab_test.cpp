@@ -11,6 +11,10 @@ using prep_test::makeImage;
 
 using lsc::ShadingSettings;
 
+using img::BayerImage;
+using img::kCfaGbrg;
+using img::kCfaRggb;
+
 namespace {
 
 constexpr float kGamma = 0.45454544f;

@@ -12,6 +12,8 @@
 using prep_test::fill;
 using prep_test::makeImage;
 
+using img::BayerImage;
+
 namespace {
 
 const std::string kCauses =

@@ -9,6 +9,8 @@
 
 using lsc::ShadingSettings;
 
+using img::BayerImage;
+
 namespace {
 
 // A 16 x 8 grey mosaic, 2 x 2 delta-ab blocks of 4 x 2 RGB pixels; the pixel

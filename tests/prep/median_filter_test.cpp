@@ -10,6 +10,8 @@ using prep_test::fillRamp;
 using prep_test::makeImage;
 using prep_test::samplesOf;
 
+using img::BayerImage;
+
 namespace {
 
 float medianOf(std::initializer_list<float> values) {

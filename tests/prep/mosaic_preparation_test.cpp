@@ -13,6 +13,13 @@
 #include "prep/mosaic_preparation.h"
 #include "tests/prep/test_images.h"
 
+using img::BayerImage;
+using img::ImageBuffer;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+
 namespace {
 
 using prep::MosaicPreparation;

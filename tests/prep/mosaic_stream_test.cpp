@@ -9,6 +9,9 @@
 #include "prep/mosaic_stream.h"
 #include "tests/prep/test_images.h"
 
+using img::BayerImage;
+using img::kCfaGrbg;
+
 namespace {
 
 using prep::MosaicPreparation;

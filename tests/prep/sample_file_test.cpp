@@ -12,6 +12,8 @@ using testing_support::TempDir;
 using lsc::SampleSet;
 using lsc::shadingSample;
 
+using img::BayerImage;
+
 namespace {
 
 std::string parseError(const std::string& text, std::int32_t width = 648, std::int32_t height = 486,

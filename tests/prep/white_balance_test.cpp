@@ -7,6 +7,12 @@
 
 using prep_test::makeImage;
 
+using img::BayerImage;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+
 namespace {
 
 // The run's white balance: to the fit's target levels, or to the centre's

@@ -12,6 +12,16 @@
 
 namespace report {
 
+using img::BayerImage;
+using img::imageCreate;
+using img::kBufferRawCfa;
+using img::kCfaBggr;
+using img::kCfaGbrg;
+using img::kCfaGrbg;
+using img::kCfaRggb;
+using img::kDataReal32;
+using img::kPixelRaw;
+
 using lsc::evalPatch;
 using lsc::kChannelNames;
 using lsc::kChannels;
