@@ -9,16 +9,16 @@ namespace {
 
 class XTestSurface : public ::testing::Test {
 protected:
-    void SetUp() override { applyXTestSurface(context); }
-    const float* red() const { return context.controlGrids[0]; }
-    const float* green() const { return context.controlGrids[1]; }
-    ShadingCorrection context;
+    void SetUp() override { applyXTestSurface(correction); }
+    const float* red() const { return correction.controlGrids[0]; }
+    const float* green() const { return correction.controlGrids[1]; }
+    ShadingCorrection correction;
 };
 
 TEST_F(XTestSurface, RedEqualsBlueAndTheGreensAreEqual) {
     for (int i = 0; i < 100; ++i) {
-        EXPECT_EQ(context.controlGrids[3][i], red()[i]) << i;
-        EXPECT_EQ(context.controlGrids[2][i], green()[i]) << i;
+        EXPECT_EQ(correction.controlGrids[3][i], red()[i]) << i;
+        EXPECT_EQ(correction.controlGrids[2][i], green()[i]) << i;
     }
 }
 
@@ -30,7 +30,7 @@ TEST_F(XTestSurface, RedPlusGreenIsOneEverywhere) {
 TEST_F(XTestSurface, ValuesAreMultiplesOf4096thsWithinTheRange) {
     for (int k = 0; k < 4; ++k)
         for (int i = 0; i < 100; ++i) {
-            const float v = context.controlGrids[k][i];
+            const float v = correction.controlGrids[k][i];
             EXPECT_EQ(v * 4096.0f, std::round(v * 4096.0f)) << k << ", " << i;
             EXPECT_GE(v, -3.2775879f);
             EXPECT_LE(v, 4.2775879f);
@@ -42,7 +42,7 @@ TEST_F(XTestSurface, LargeValuesAlternateOnlyInTheGroupsNextToTheCorners) {
     for (int k = 0; k < 4; ++k)
         for (int row = 0; row < 10; ++row)
             for (int column = 0; column < 10; ++column) {
-                const float v = context.controlGrids[k][row * 10 + column];
+                const float v = correction.controlGrids[k][row * 10 + column];
                 if (!inGroup(row) || !inGroup(column)) {
                     EXPECT_LE(std::fabs(v), 2.0f) << k << ": " << row << ", " << column;
                     continue;
@@ -50,10 +50,10 @@ TEST_F(XTestSurface, LargeValuesAlternateOnlyInTheGroupsNextToTheCorners) {
                 EXPECT_GT(std::fabs(v), 2.0f) << k << ": " << row << ", " << column;
                 // Horizontal and vertical neighbours inside a group have opposite signs.
                 if (column == 1 || column == 7) {
-                    EXPECT_LT(v * context.controlGrids[k][row * 10 + column + 1], 0.0f);
+                    EXPECT_LT(v * correction.controlGrids[k][row * 10 + column + 1], 0.0f);
                 }
                 if (row == 1 || row == 7) {
-                    EXPECT_LT(v * context.controlGrids[k][(row + 1) * 10 + column], 0.0f);
+                    EXPECT_LT(v * correction.controlGrids[k][(row + 1) * 10 + column], 0.0f);
                 }
             }
 }

@@ -17,14 +17,14 @@ const std::string kCauses =
     "sensor being used.";
 
 prep::DeltaAbResult results() {
-    prep::DeltaAbResult context;
-    context.columns = 3;
-    context.rows = 2;
-    context.deltaImage = {0.5f, 1.25f, 2.0f, 0.000004f, 10.123456f, 0.0f};
-    context.meanChroma = 1.5f;
-    context.maxDelta = 2.25f;
-    context.deltaStdDev = 1.0f / 3.0f;
-    return context;
+    prep::DeltaAbResult result;
+    result.columns = 3;
+    result.rows = 2;
+    result.deltaImage = {0.5f, 1.25f, 2.0f, 0.000004f, 10.123456f, 0.0f};
+    result.meanChroma = 1.5f;
+    result.maxDelta = 2.25f;
+    result.deltaStdDev = 1.0f / 3.0f;
+    return result;
 }
 
 template <typename Write> std::string stringThrown(Write write) {
@@ -43,11 +43,11 @@ TEST(DeltaFile, RowsOfFiveDecimalValuesEachFollowedByComma) {
 }
 
 TEST(DeltaFile, SingleRowGrid) {
-    prep::DeltaAbResult context;
-    context.columns = 3;
-    context.rows = 1;
-    context.deltaImage = {1.0f, 2.0f, 3.0f};
-    EXPECT_EQ(prep::formatDeltaFile(context), "1.00000,2.00000,3.00000,\n\n");
+    prep::DeltaAbResult result;
+    result.columns = 3;
+    result.rows = 1;
+    result.deltaImage = {1.0f, 2.0f, 3.0f};
+    EXPECT_EQ(prep::formatDeltaFile(result), "1.00000,2.00000,3.00000,\n\n");
 }
 
 TEST(DeltaFile, WrittenByteForByte) {

@@ -33,11 +33,11 @@ struct Samples {
     prep::SampleFileScale scale;
 };
 
-Samples contextWithImage(std::int32_t width, std::int32_t height, int factor) {
-    Samples context;
-    context.image = prep_test::makeImage(width, height);
-    context.scale = {1023, factor};
-    return context;
+Samples samplesFor(std::int32_t width, std::int32_t height, int factor) {
+    Samples run;
+    run.image = prep_test::makeImage(width, height);
+    run.scale = {1023, factor};
+    return run;
 }
 
 TEST(SampleFullScale, KeptToSixteenBits) {
@@ -144,13 +144,13 @@ TEST(SampleFileParse, SampleCountIsCapped) {
 
 TEST(SampleFile, WrittenFileReadsBackWithSamplingFactor) {
     TempDir dir;
-    Samples written = contextWithImage(648, 486, 4);
+    Samples written = samplesFor(648, 486, 4);
     const float levels[4] = {0.5f, 0.75f, 0.7f, 0.25f};
     std::copy(levels, levels + 4, written.set.targetLevels);
     written.set.samples = {{0, 0, {0.4f, 0.6f, 0.6f, 0.2f}}, {646, 484, {0.1f, 0.3f, 0.3f, 0.05f}}};
     prep::writeSampleFile(dir.file("samples.txt"), written.set, written.image, written.scale);
 
-    Samples read = contextWithImage(648, 486, 4);
+    Samples read = samplesFor(648, 486, 4);
     read.set = prep::readSampleFile(dir.file("samples.txt"), read.image, read.scale);
     ASSERT_EQ(read.set.samples.size(), 2u);
     for (int k = 0; k < 4; ++k)
@@ -165,10 +165,10 @@ TEST(SampleFile, WrittenFileReadsBackWithSamplingFactor) {
 
 TEST(SampleFile, MissingInputNamesThePath) {
     TempDir dir;
-    Samples context = contextWithImage(8, 8, 1);
+    Samples run = samplesFor(8, 8, 1);
     const std::string path = dir.file("none.txt");
     try {
-        context.set = prep::readSampleFile(path, context.image, context.scale);
+        run.set = prep::readSampleFile(path, run.image, run.scale);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_EQ(std::string(e.what()), "Cannot open input sample file: " + path);
@@ -178,17 +178,17 @@ TEST(SampleFile, MissingInputNamesThePath) {
 TEST(SampleFile, AFileWithABadLineIsRefused) {
     TempDir dir;
     testing_support::writeFile(dir.file("bad.txt"), "1,2,3,4\n8,8,4\n0,0,1,2,3,4\n0,0,x\n");
-    const Samples context = contextWithImage(8, 8, 1);
-    EXPECT_THROW((void)prep::readSampleFile(dir.file("bad.txt"), context.image, context.scale),
+    const Samples run = samplesFor(8, 8, 1);
+    EXPECT_THROW((void)prep::readSampleFile(dir.file("bad.txt"), run.image, run.scale),
                  std::runtime_error);
 }
 
 TEST(SampleFile, UnwritableOutputNamesThePath) {
     TempDir dir;
-    const Samples context = contextWithImage(8, 8, 1);
+    const Samples run = samplesFor(8, 8, 1);
     const std::string path = dir.file("missing/samples.txt");
     try {
-        prep::writeSampleFile(path, context.set, context.image, context.scale);
+        prep::writeSampleFile(path, run.set, run.image, run.scale);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_EQ(std::string(e.what()), "Cannot open sample output file: " + path);
@@ -196,9 +196,9 @@ TEST(SampleFile, UnwritableOutputNamesThePath) {
 }
 
 TEST(SampleFile, FullDeviceIsAWriteError) {
-    const Samples context = contextWithImage(8, 8, 1);
+    const Samples run = samplesFor(8, 8, 1);
     try {
-        prep::writeSampleFile("/dev/full", context.set, context.image, context.scale);
+        prep::writeSampleFile("/dev/full", run.set, run.image, run.scale);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_EQ(std::string(e.what()), "Cannot write sample output file: /dev/full");

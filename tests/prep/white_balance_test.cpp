@@ -71,12 +71,12 @@ TEST(CentreWindow, MixedBounds) {
 class WhiteBalance : public ::testing::TestWithParam<std::uint32_t> {};
 
 TEST_P(WhiteBalance, TargetLevelsGiveGainsPerChannel) {
-    Balance context;
-    context.corrected = makeImage(4, 4, 1, GetParam());
-    prep_test::fill(context.corrected, 1.0f);
+    Balance run;
+    run.corrected = makeImage(4, 4, 1, GetParam());
+    prep_test::fill(run.corrected, 1.0f);
     const float levels[4] = {1.0f, 2.0f, 2.0f, 0.5f};
-    std::copy(levels, levels + 4, context.targetLevels);
-    balance(context);
+    std::copy(levels, levels + 4, run.targetLevels);
+    balance(run);
     const float gains[4] = {2.0f, 1.0f, 1.0f, 4.0f};
     // Channel k of (x, y) for the pattern under test.
     const int phase = GetParam() == kCfaGrbg   ? 1
@@ -86,7 +86,7 @@ TEST_P(WhiteBalance, TargetLevelsGiveGainsPerChannel) {
     for (int y = 0; y < 4; ++y)
         for (int x = 0; x < 4; ++x) {
             const int channel = ((x + phase) & 1) + ((y + (phase >> 1)) & 1) * 2;
-            EXPECT_EQ(context.corrected.pixels()[y * 4 + x], gains[channel]) << x << "," << y;
+            EXPECT_EQ(run.corrected.pixels()[y * 4 + x], gains[channel]) << x << "," << y;
         }
 }
 
@@ -94,30 +94,30 @@ INSTANTIATE_TEST_SUITE_P(BayerOrders, WhiteBalance,
                          ::testing::Values(kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr));
 
 TEST(WhiteBalanceCentre, MeasuredLevelsBalanceTheChannels) {
-    Balance context;
-    context.corrected = channelImage(150, 150, {0.5f, 0.25f, 0.25f, 0.125f});
-    balance(context);
-    for (float v : prep_test::samplesOf(context.corrected))
+    Balance run;
+    run.corrected = channelImage(150, 150, {0.5f, 0.25f, 0.25f, 0.125f});
+    balance(run);
+    for (float v : prep_test::samplesOf(run.corrected))
         ASSERT_EQ(v, 0.5f);
 }
 
 TEST(WhiteBalanceCentre, OnlyTheCentreWindowCounts) {
-    Balance context;
-    context.corrected = channelImage(640, 480, {0.5f, 0.5f, 0.5f, 0.5f});
+    Balance run;
+    run.corrected = channelImage(640, 480, {0.5f, 0.5f, 0.5f, 0.5f});
     // Red outside the window (x < 220) is darker; the gains must ignore it.
     for (int y = 0; y < 480; y += 2)
-        context.corrected.pixels()[y * 640] = 0.1f;
-    balance(context);
-    EXPECT_EQ(context.corrected.pixels()[2 * 640 + 2], 0.5f);
-    EXPECT_EQ(context.corrected.pixels()[0], 0.1f);
+        run.corrected.pixels()[y * 640] = 0.1f;
+    balance(run);
+    EXPECT_EQ(run.corrected.pixels()[2 * 640 + 2], 0.5f);
+    EXPECT_EQ(run.corrected.pixels()[0], 0.1f);
 }
 
 TEST(WhiteBalanceCentre, RefusesWindowWithoutEveryChannel) {
-    Balance context;
-    context.corrected = makeImage(1, 8, 1, kCfaRggb);
-    prep_test::fill(context.corrected, 0.5f);
+    Balance run;
+    run.corrected = makeImage(1, 8, 1, kCfaRggb);
+    prep_test::fill(run.corrected, 0.5f);
     try {
-        balance(context);
+        balance(run);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_STREQ(e.what(),
@@ -127,16 +127,16 @@ TEST(WhiteBalanceCentre, RefusesWindowWithoutEveryChannel) {
 }
 
 TEST(WhiteBalanceCentre, RefusesZeroLevelAndLeavesImage) {
-    Balance context;
-    context.corrected = channelImage(8, 8, {0.5f, 0.5f, 0.0f, 0.5f});
+    Balance run;
+    run.corrected = channelImage(8, 8, {0.5f, 0.5f, 0.0f, 0.5f});
     try {
-        balance(context);
+        balance(run);
         FAIL();
     } catch (const std::runtime_error& e) {
         EXPECT_STREQ(e.what(), "A colour channel of the flattened image has no positive level; "
                                "it cannot be white balanced.");
     }
-    EXPECT_EQ(context.corrected.pixels()[0], 0.5f);
+    EXPECT_EQ(run.corrected.pixels()[0], 0.5f);
 }
 
 TEST(BoxSide, OddSideFromFilterSizeAndSamplingFactor) {
@@ -147,12 +147,11 @@ TEST(BoxSide, OddSideFromFilterSizeAndSamplingFactor) {
 }
 
 TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
-    Balance context;
-    context.corrected = channelImage(20, 16, {0.5f, 0.25f, 0.75f, 0.125f});
-    context.awbFilterSize = 6;
+    Balance run;
+    run.corrected = channelImage(20, 16, {0.5f, 0.25f, 0.75f, 0.125f});
+    run.awbFilterSize = 6;
     float levels[4];
-    prep::measureLevels(levels, context.corrected, context.awbFilterSize,
-                        context.procSamplingFactor);
+    prep::measureLevels(levels, run.corrected, run.awbFilterSize, run.procSamplingFactor);
     EXPECT_FLOAT_EQ(levels[0], 0.5f);
     EXPECT_FLOAT_EQ(levels[1], 0.25f);
     EXPECT_FLOAT_EQ(levels[2], 0.75f);
@@ -160,28 +159,26 @@ TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
 }
 
 TEST(MeasureLevels, BoxMeanShrinksAtBorders) {
-    Balance context;
-    context.corrected = channelImage(10, 10, {0, 0, 0, 0}); // 5 x 5 planes
-    context.awbFilterSize = 6;                              // side 3
-    context.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;  // red plane (2, 2)
-    context.corrected.pixels()[0 * 10 + 1] = 9.0f;          // green/red plane (0, 0)
+    Balance run;
+    run.corrected = channelImage(10, 10, {0, 0, 0, 0}); // 5 x 5 planes
+    run.awbFilterSize = 6;                              // side 3
+    run.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;  // red plane (2, 2)
+    run.corrected.pixels()[0 * 10 + 1] = 9.0f;          // green/red plane (0, 0)
     float levels[4];
-    prep::measureLevels(levels, context.corrected, context.awbFilterSize,
-                        context.procSamplingFactor);
+    prep::measureLevels(levels, run.corrected, run.awbFilterSize, run.procSamplingFactor);
     EXPECT_FLOAT_EQ(levels[0], 1.0f);  // 9 over a full 3 x 3 window
     EXPECT_FLOAT_EQ(levels[1], 2.25f); // 9 over the 2 x 2 corner window
     EXPECT_FLOAT_EQ(levels[2], 0.0f);
 }
 
 TEST(MeasureLevels, RefusesImageBelowTwoByTwo) {
-    Balance context;
-    context.corrected = makeImage(1, 5);
-    prep_test::fill(context.corrected, 0.5f);
+    Balance run;
+    run.corrected = makeImage(1, 5);
+    prep_test::fill(run.corrected, 0.5f);
     EXPECT_THROW(
         {
             float levels[4];
-            prep::measureLevels(levels, context.corrected, context.awbFilterSize,
-                                context.procSamplingFactor);
+            prep::measureLevels(levels, run.corrected, run.awbFilterSize, run.procSamplingFactor);
         },
         std::runtime_error);
 }
