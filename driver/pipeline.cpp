@@ -174,14 +174,7 @@ void Pipeline::runStages() {
     beginStage(msg::kStageCheckingTheInputImage);
     decideBitDepth();
     checkSettingsAgainstImage();
-    if (!settings_.sensorGuid.empty()) {
-        // Stored only in a fixed header, as a 64-bit number: a text that is
-        // not one would be stored as 0.
-        if (input_.hasFixedHeader() && !img::isHexGuid(settings_.sensorGuid))
-            throw std::invalid_argument(msg::kBadSensorGuidPrefix + settings_.sensorGuid +
-                                        msg::kBadSensorGuidSuffix);
-        input_.setSensorGuid(settings_.sensorGuid);
-    }
+    applySensorGuid();
     inspectInput();
     beginStage(msg::kStagePreparingTheImage);
     prepareImage();
@@ -432,6 +425,17 @@ void Pipeline::checkSettingsAgainstImage() {
                                  std::to_string(height) + msg::kDimensionsMiddle +
                                  std::to_string(sensorWidth.as_int()) + "x" +
                                  std::to_string(sensorHeight.as_int()) + ").");
+}
+
+void Pipeline::applySensorGuid() {
+    if (settings_.sensorGuid.empty())
+        return;
+    // Stored only in a fixed header, as a 64-bit number: a text that is not
+    // one would be stored as 0.
+    if (input_.hasFixedHeader() && !img::isHexGuid(settings_.sensorGuid))
+        throw std::invalid_argument(msg::kBadSensorGuidPrefix + settings_.sensorGuid +
+                                    msg::kBadSensorGuidSuffix);
+    input_.setSensorGuid(settings_.sensorGuid);
 }
 
 void Pipeline::inspectInput() {

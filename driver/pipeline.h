@@ -47,6 +47,7 @@ private:
     prep::MosaicPreparation preparation() const;
     void decideBitDepth();
     void checkSettingsAgainstImage();
+    void applySensorGuid();
     void inspectInput();
     void prepareImage();
     void checkPreparedImage();
@@ -56,8 +57,9 @@ private:
     void writePreparedImage();
     lsc::ShadingSettings readShadingSettings();
     lsc::PatchLayout choosePatchLayout();
-    // The samples and the image they were measured on: the levelled image
-    // they were taken from, or (empty) the prepared image for a sample file.
+    // The samples and, when they were taken from the image, the levelled
+    // image they were measured on (empty for a sample file: the fit then
+    // measures on the prepared image).
     struct SamplesTaken {
         lsc::SampleSet set;
         img::BayerImage measuredOn;
