@@ -8,6 +8,7 @@
 #include "image/bayer_phase.h"
 #include "image/error_detail.h"
 #include "image/image_buffer.h"
+#include "image/image_messages.h"
 #include "image/tiff_writer.h"
 #include "lsc/lens_shading_correction.h"
 
@@ -42,7 +43,7 @@ void writeCheckImage(const std::string& path, BayerImage capture,
     ImagePtr out(imageCreate(corrected.width(), corrected.height(), 16, 1, 1, 0, corrected.cfa(),
                              kPixelRaw, kBufferRawCfa, kDataUint16, &rc));
     if (!out)
-        throw std::runtime_error("Unable to allocate image memory.");
+        throw std::runtime_error(img::msg::kCannotAllocateImage);
     const int phase = img::bayerPhase(corrected.cfa());
     const float* in = corrected.pixels();
     auto* samples = static_cast<std::uint16_t*>(out->data);

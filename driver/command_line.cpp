@@ -166,9 +166,9 @@ CommandLine CommandLine::parse(int argc, const char* const argv[], std::ostream&
         throw notice(msg::kUseHelp);
     const std::size_t frames = line.values("input").size();
     if (frames > kMaxInputFrames)
-        throw std::runtime_error("At most " + std::to_string(kMaxInputFrames) +
-                                 " input frames can be averaged; --input is given " +
-                                 std::to_string(frames) + " times.");
+        throw std::runtime_error(msg::kTooManyFramesPrefix + std::to_string(kMaxInputFrames) +
+                                 msg::kTooManyFramesMiddle + std::to_string(frames) +
+                                 msg::kTooManyFramesSuffix);
     return line;
 }
 

@@ -15,6 +15,9 @@ inline constexpr char kNeedInputForOutSamples[] =
 inline constexpr char kNeedCalibrateOrOutSamples[] =
     "ERROR: Must specify either an output calibration register file or output sample file.";
 inline constexpr char kUseHelp[] = "Use --help to print out all the options.";
+inline constexpr char kTooManyFramesPrefix[] = "At most ";
+inline constexpr char kTooManyFramesMiddle[] = " input frames can be averaged; --input is given ";
+inline constexpr char kTooManyFramesSuffix[] = " times.";
 // The second line of the help text, naming what every calibration run needs.
 inline constexpr char kUsageLine[] =
     "Usage: lsc --config FILE --input FILE --calibrate FILE [options]";
