@@ -9,6 +9,7 @@
 
 #include <benchmark/benchmark.h>
 
+#include "bench/bench_captures.h"
 #include "image/image_buffer.h"
 #include "lsc/fit_result.h"
 #include "lsc/lens_shading_correction.h"
@@ -31,11 +32,6 @@ using lsc::shadingSample;
 using lsc::ShadingSettings;
 
 using img::BayerImage;
-using img::imageCreate;
-using img::kBufferRawCfa;
-using img::kCfaRggb;
-using img::kDataReal32;
-using img::kPixelRaw;
 
 namespace {
 
@@ -49,10 +45,7 @@ float flatField(int x, int y, int width, int height) {
 }
 
 BayerImage makeFlatImage(int width, int height) {
-    int rc = 0;
-    BayerImage image;
-    image.reset(imageCreate(width, height, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
-                            kDataReal32, &rc));
+    BayerImage image = bench::tenBitMosaic(width, height);
     float* p = image.pixels();
     for (int y = 0; y < height; ++y)
         for (int x = 0; x < width; ++x)

@@ -8,6 +8,7 @@
 
 #include <benchmark/benchmark.h>
 
+#include "bench/bench_captures.h"
 #include "image/image_buffer.h"
 #include "prep/bayer_planes.h"
 #include "prep/median_filter.h"
@@ -16,11 +17,7 @@
 #include <unistd.h>
 
 using img::BayerImage;
-using img::imageCreate;
-using img::kBufferRawCfa;
 using img::kCfaRggb;
-using img::kDataReal32;
-using img::kPixelRaw;
 
 namespace {
 
@@ -30,19 +27,13 @@ constexpr std::int32_t kHeight = 3000;
 // Flat field with some noise, so the median trees see distinct values.
 std::vector<std::uint16_t> sensorSamples() {
     std::vector<std::uint16_t> samples(static_cast<std::size_t>(kWidth) * kHeight);
-    std::uint32_t state = 12345;
-    for (auto& s : samples) {
-        state = state * 1664525u + 1013904223u;
-        s = static_cast<std::uint16_t>(600 + (state >> 24) % 64);
-    }
+    bench::noisyFlatCodes(samples.size(),
+                          [&](std::size_t i, std::uint16_t code) { samples[i] = code; });
     return samples;
 }
 
 BayerImage mosaicOf(const std::vector<std::uint16_t>& samples) {
-    int result = 0;
-    BayerImage image;
-    image.reset(imageCreate(kWidth, kHeight, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
-                            kDataReal32, &result));
+    BayerImage image = bench::tenBitMosaic(kWidth, kHeight);
     for (std::size_t i = 0; i < samples.size(); ++i)
         image.pixels()[i] = static_cast<float>(samples[i] & 1023) / 1023.0f;
     return image;

@@ -7,17 +7,14 @@
 
 #include <benchmark/benchmark.h>
 
+#include "bench/bench_captures.h"
 #include "image/image_buffer.h"
 #include "prep/bayer_planes.h"
 #include "prep/median_filter.h"
 #include "prep/mosaic_preparation.h"
 
 using img::BayerImage;
-using img::imageCreate;
-using img::kBufferRawCfa;
 using img::kCfaRggb;
-using img::kDataReal32;
-using img::kPixelRaw;
 
 namespace {
 
@@ -26,15 +23,10 @@ constexpr std::int32_t kHeight = 3000;
 
 // A flat field with some noise, so the windows hold distinct values.
 BayerImage noisyCapture() {
-    int result = 0;
-    BayerImage image;
-    image.reset(imageCreate(kWidth, kHeight, 10, 1, 1, 0, kCfaRggb, kPixelRaw, kBufferRawCfa,
-                            kDataReal32, &result));
-    std::uint32_t state = 12345;
-    for (std::size_t i = 0; i < std::size_t{kWidth} * kHeight; ++i) {
-        state = state * 1664525u + 1013904223u;
-        image.pixels()[i] = static_cast<float>(600 + (state >> 24) % 64) / 1023.0f;
-    }
+    BayerImage image = bench::tenBitMosaic(kWidth, kHeight);
+    bench::noisyFlatCodes(std::size_t{kWidth} * kHeight, [&](std::size_t i, std::uint16_t code) {
+        image.pixels()[i] = static_cast<float>(code) / 1023.0f;
+    });
     return image;
 }
 
