@@ -1,13 +1,12 @@
+// The delta ab files and threshold.
+
 #include <cmath>
 #include <stdexcept>
 #include <string>
 
-#include <gtest/gtest.h>
-
 #include "prep/delta_ab_report.h"
+#include "tests/prep/test_images.h"
 #include "tests/support/temp_dir.h"
-
-using testing_support::TempDir;
 
 namespace {
 
@@ -16,7 +15,7 @@ const std::string kCauses =
     "poor quality flat field input image, damaged sensor, or invalid configuration for the "
     "sensor being used.";
 
-prep::DeltaAbResult results() {
+TEST(DeltaAbReport, FilesHoldTheGridAndStatistics) {
     prep::DeltaAbResult result;
     result.columns = 3;
     result.rows = 2;
@@ -24,78 +23,32 @@ prep::DeltaAbResult results() {
     result.meanChroma = 1.5f;
     result.maxDelta = 2.25f;
     result.deltaStdDev = 1.0f / 3.0f;
-    return result;
-}
-
-template <typename Write> std::string stringThrown(Write write) {
-    try {
-        write();
-    } catch (const std::string& text) {
-        return text;
-    }
-    return "(nothing thrown)";
-}
-
-TEST(DeltaFile, RowsOfFiveDecimalValuesEachFollowedByComma) {
-    EXPECT_EQ(prep::formatDeltaFile(results()), "0.50000,1.25000,2.00000,\n"
-                                                "0.00000,10.12346,0.00000,\n"
-                                                "\n");
-}
-
-TEST(DeltaFile, SingleRowGrid) {
-    prep::DeltaAbResult result;
-    result.columns = 3;
+    testing_support::TempDir dir;
+    prep::writeDeltaFile(dir.file("delta.csv"), result);
+    prep::writeStatsFile(dir.file("stats.csv"), result);
+    case_data::expectGolden("prep/delta.csv", testing_support::readFile(dir.file("delta.csv")));
+    case_data::expectGolden("prep/stats.csv", testing_support::readFile(dir.file("stats.csv")));
+    EXPECT_EQ(prep::formatDeltaFile(result), testing_support::readFile(dir.file("delta.csv")));
+    EXPECT_EQ(prep::formatStatsFile(result), testing_support::readFile(dir.file("stats.csv")));
     result.rows = 1;
-    result.deltaImage = {1.0f, 2.0f, 3.0f};
-    EXPECT_EQ(prep::formatDeltaFile(result), "1.00000,2.00000,3.00000,\n\n");
-}
+    result.deltaImage.resize(3);
+    EXPECT_EQ(prep::formatDeltaFile(result), "0.50000,1.25000,2.00000,\n\n");
 
-TEST(DeltaFile, WrittenByteForByte) {
-    TempDir dir;
-    prep::writeDeltaFile(dir.file("delta.csv"), results());
-    EXPECT_EQ(testing_support::readFile(dir.file("delta.csv")),
-              "0.50000,1.25000,2.00000,\n0.00000,10.12346,0.00000,\n\n");
-}
-
-TEST(DeltaFile, UnopenablePathThrowsString) {
-    TempDir dir;
-    const std::string path = dir.file("no/such/dir/delta.csv");
-    EXPECT_EQ(stringThrown([&] { prep::writeDeltaFile(path, results()); }),
-              "Cannot open file : " + path);
-}
-
-TEST(DeltaFile, FullDeviceThrowsWriteError) {
-    EXPECT_EQ(stringThrown([&] { prep::writeDeltaFile("/dev/full", results()); }),
+    const std::string missing = dir.file("no/such/dir/delta.csv");
+    EXPECT_EQ(case_data::errorOf([&] { prep::writeDeltaFile(missing, result); }),
+              "Cannot open file : " + missing);
+    EXPECT_EQ(case_data::errorOf([&] { prep::writeStatsFile(missing, result); }),
+              "Cannot open file : " + missing);
+    EXPECT_EQ(case_data::errorOf([&] { prep::writeDeltaFile("/dev/full", result); }),
               "Cannot write file : /dev/full");
 }
 
-TEST(StatsFile, ThreeValuesCommaBlankSeparated) {
-    EXPECT_EQ(prep::formatStatsFile(results()), "1.5, 2.25, 0.333333\n");
-}
-
-TEST(StatsFile, UnopenablePathThrowsString) {
-    TempDir dir;
-    const std::string path = dir.file("no/stats.csv");
-    EXPECT_EQ(stringThrown([&] { prep::writeStatsFile(path, results()); }),
-              "Cannot open file : " + path);
-}
-
-TEST(DeltaThreshold, EqualPasses) {
+TEST(DeltaAbReport, ThresholdFailsAboveOrOnNotANumber) {
     EXPECT_NO_THROW(prep::checkDeltaThreshold(10.0f, 10.0f));
     EXPECT_NO_THROW(prep::checkDeltaThreshold(0.0f, 0.0f));
-}
-
-TEST(DeltaThreshold, LargerFailsWithTwoLines) {
-    try {
-        prep::checkDeltaThreshold(10.5f, 10.0f);
-        FAIL();
-    } catch (const std::range_error& e) {
-        EXPECT_EQ(std::string(e.what()),
-                  "Maximum delta ab is greater than threshold of 10\n" + kCauses);
-    }
-}
-
-TEST(DeltaThreshold, NotANumberFails) {
+    EXPECT_EQ(case_data::errorOf([] { prep::checkDeltaThreshold(10.5f, 10.0f); }),
+              "Maximum delta ab is greater than threshold of 10\n" + kCauses);
+    EXPECT_THROW(prep::checkDeltaThreshold(10.5f, 10.0f), std::range_error);
     EXPECT_THROW(prep::checkDeltaThreshold(std::nanf(""), 10.0f), std::range_error);
 }
 

@@ -1,140 +1,76 @@
-#include <stdexcept>
+// The median of a window and the median filter over colour planes.
 
-#include <gtest/gtest.h>
+#include <stdexcept>
 
 #include "prep/median_filter.h"
 #include "prep/median_tree.h"
-#include "test_images.h"
-
-using prep_test::fillRamp;
-using prep_test::makeImage;
-using prep_test::samplesOf;
-
-using img::BayerImage;
+#include "tests/prep/test_images.h"
 
 namespace {
 
-float medianOf(std::initializer_list<float> values) {
+using img::BayerImage;
+using prep_test::makeImage;
+using prep_test::samplesOf;
+
+TEST(MedianTree, MiddleValueOrMeanOfTheMiddleTwo) {
+    const struct {
+        std::vector<float> values;
+        float median;
+    } cases[] = {{{5, 1, 9, 3, 7}, 5}, {{4, 1, 10, 2}, 3}, {{1, 1, 1, 9, 9}, 1},
+                 {{2, 2, 8, 8}, 5},    {{7, 7, 7, 7}, 7},  {prep_test::counting(100), 49.5f}};
     prep::MedianTree tree;
-    tree.clear();
-    for (float v : values)
-        tree.insert(v);
-    return tree.median();
+    for (const auto& c : cases) {
+        tree.clear(); // each case a fresh window
+        for (float v : c.values)
+            tree.insert(v);
+        EXPECT_EQ(tree.valueCount(), static_cast<int>(c.values.size()));
+        EXPECT_EQ(tree.median(), c.median);
+    }
 }
 
-TEST(MedianTree, OddCountGivesMiddleValue) {
-    EXPECT_EQ(medianOf({5, 1, 9, 3, 7}), 5.0f);
+// Filter size s and factor f on single-channel planes: the expected output.
+TEST(MedianFilter, WindowsMirrorAtTheBordersAndDownSample) {
+    const struct {
+        std::int32_t width, height;
+        std::vector<float> planes;
+        int size, factor;
+        std::vector<float> expected;
+    } cases[] = {
+        // s = 2 at (x, y) covers x - 1..x and y - 1..y: at (1, 1) 1 2 4 10.
+        {3, 3, {1, 10, 0, 4, 2, 0, 0, 0, 0}, 2, 1, {1, 5.5f, 5, 2.5f, 3, 1, 2, 1, 0}},
+        // The window of 3 at x = 0 reads 0 0 1: the edge sample repeats.
+        {7, 1, {0, 1, 2, 3, 4, 5, 6}, 3, 1, {0, 1, 2, 3, 4, 5, 6}},
+        // Window of 10 on 2 rows: rows -5..4 mirror to 0 0 1 1 0 0 1 1 0 0.
+        {1, 2, {2, 4}, 10, 1, {2, 3}},
+        {9, 5, prep_test::counting(45), 1, 4, {0, 4, 8, 36, 40, 44}},
+        {5,
+         5,
+         {0, 0, 0, 0, 0, 0, 9, 0, 0, 0, 0, 0, 9, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0},
+         3,
+         1,
+         std::vector<float>(25, 0.0f)},
+    };
+    for (const auto& c : cases) {
+        BayerImage target;
+        prep::medianFilterDownsample(makeImage(c.width, c.height, 1, 0, c.planes), c.size, c.factor,
+                                     target);
+        EXPECT_EQ(samplesOf(target), c.expected)
+            << c.width << "x" << c.height << " size " << c.size;
+    }
 }
 
-TEST(MedianTree, EvenCountGivesMeanOfMiddleTwo) {
-    EXPECT_EQ(medianOf({4, 1, 10, 2}), 3.0f);
-}
-
-TEST(MedianTree, RepeatsCountAsSeparateValues) {
-    EXPECT_EQ(medianOf({1, 1, 1, 9, 9}), 1.0f);
-    EXPECT_EQ(medianOf({2, 2, 8, 8}), 5.0f);
-    EXPECT_EQ(medianOf({7, 7, 7, 7}), 7.0f);
-}
-
-TEST(MedianTree, SortedInputFillsTheWholePool) {
-    prep::MedianTree tree;
-    tree.clear();
-    for (int i = 0; i < 100; ++i)
-        tree.insert(static_cast<float>(i));
-    EXPECT_EQ(tree.valueCount(), 100);
-    EXPECT_EQ(tree.median(), 49.5f);
-}
-
-TEST(MedianTree, ClearStartsAFreshWindow) {
-    prep::MedianTree tree;
-    tree.clear();
-    tree.insert(100.0f);
-    tree.clear();
-    tree.insert(1.0f);
-    EXPECT_EQ(tree.median(), 1.0f);
-}
-
-TEST(MedianFilter, SizeOneReturnsEverySample) {
-    BayerImage planes = makeImage(7, 5, 4);
-    fillRamp(planes);
-    BayerImage target;
-    prep::medianFilterDownsample(planes, 1, 1, target);
-    EXPECT_EQ(samplesOf(target), samplesOf(planes));
-}
-
-TEST(MedianFilter, SizeTwoAveragesMiddleTwoOfFour) {
-    // Window of s = 2 at (1, 1) covers rows and columns 0..1.
-    BayerImage planes = makeImage(3, 3, 1, 0);
-    const float values[9] = {1, 10, 0, 4, 2, 0, 0, 0, 0};
-    std::copy(values, values + 9, planes.pixels());
-    BayerImage target;
-    prep::medianFilterDownsample(planes, 2, 1, target);
-    EXPECT_EQ(target.pixels()[1 * 3 + 1], 3.0f); // sorted 1 2 4 10
-}
-
-TEST(MedianFilter, RemovesASingleDefect) {
-    BayerImage planes = makeImage(5, 5, 4);
-    prep_test::fill(planes, 0.25f);
-    planes.pixels()[(2 * 5 + 2) * 4 + 1] = 1.0f; // hot pixel in channel 1
-    BayerImage target;
-    prep::medianFilterDownsample(planes, 3, 1, target);
-    for (float v : samplesOf(target))
-        EXPECT_EQ(v, 0.25f);
-}
-
-TEST(MedianFilter, ChannelsAreFilteredSeparately) {
-    BayerImage planes = makeImage(4, 4, 6);
-    for (int i = 0; i < 16; ++i)
-        for (int k = 0; k < 6; ++k)
-            planes.pixels()[i * 6 + k] = static_cast<float>(k);
+TEST(MedianFilter, ChannelsAreFilteredSeparatelyAndSizeOneKeepsAll) {
+    BayerImage planes = makeImage(4, 4, 6, 0, prep_test::counting(6)); // channel k holds k
+    planes.pixels()[(1 * 4 + 1) * 6 + 1] = 100.0f;                     // a defect in channel 1
     BayerImage target;
     prep::medianFilterDownsample(planes, 3, 2, target);
-    ASSERT_EQ(target.channels(), 6);
-    for (int i = 0; i < target.width() * target.height(); ++i)
-        for (int k = 0; k < 6; ++k)
-            EXPECT_EQ(target.pixels()[i * 6 + k], static_cast<float>(k));
-}
-
-TEST(MedianFilter, BordersRepeatTheEdgeSample) {
-    // One row 0 1 2 3 4 5 6; window 3 at x = 0 reads 0 0 1 (mirror of -1 is 0).
-    BayerImage planes = makeImage(7, 1, 1, 0);
-    for (int i = 0; i < 7; ++i)
-        planes.pixels()[i] = static_cast<float>(i);
-    BayerImage target;
-    prep::medianFilterDownsample(planes, 3, 1, target);
-    EXPECT_EQ(target.pixels()[0], 0.0f);
-    EXPECT_EQ(target.pixels()[6], 6.0f);
-    EXPECT_EQ(target.pixels()[3], 3.0f);
-}
-
-TEST(MedianFilter, WindowWiderThanImageStaysInside) {
-    BayerImage planes = makeImage(1, 2, 1, 0);
-    planes.pixels()[0] = 2.0f;
-    planes.pixels()[1] = 4.0f;
-    BayerImage target;
-    prep::medianFilterDownsample(planes, 10, 1, target);
-    // Rows -5..4 mirror to 0 0 1 1 0 0 1 1 0 0; rows -4..5 to 0 1 1 0 0 1 1 0 0 1.
-    EXPECT_EQ(target.pixels()[0], 2.0f);
-    EXPECT_EQ(target.pixels()[1], 3.0f);
-}
-
-TEST(MedianFilter, DownsamplesAtFactorPositions) {
-    BayerImage planes = makeImage(9, 5, 1, 0);
-    fillRamp(planes);
-    BayerImage target;
-    prep::medianFilterDownsample(planes, 1, 4, target);
-    ASSERT_EQ(target.width(), 3);
-    ASSERT_EQ(target.height(), 2);
-    EXPECT_EQ(target.pixels()[0 * 3 + 2], planes.pixels()[0 * 9 + 8]);
-    EXPECT_EQ(target.pixels()[1 * 3 + 1], planes.pixels()[4 * 9 + 4]);
-}
-
-TEST(MedianFilter, RefusesSizesOutsideTheTree) {
-    BayerImage planes = makeImage(4, 4, 4);
-    BayerImage target;
-    EXPECT_THROW(prep::medianFilterDownsample(planes, 0, 1, target), std::invalid_argument);
-    EXPECT_THROW(prep::medianFilterDownsample(planes, 11, 1, target), std::invalid_argument);
-    EXPECT_THROW(prep::medianFilterDownsample(planes, 3, 0, target), std::invalid_argument);
+    EXPECT_EQ(samplesOf(target), samplesOf(makeImage(2, 2, 6, 0, prep_test::counting(6))));
+    prep::medianFilterDownsample(planes, 1, 1, target);
+    EXPECT_EQ(samplesOf(target), samplesOf(planes));
+    const int refused[][2] = {{0, 1}, {11, 1}, {3, 0}}; // size, factor
+    for (const auto& r : refused)
+        EXPECT_THROW(prep::medianFilterDownsample(planes, r[0], r[1], target),
+                     std::invalid_argument);
 }
 
 } // namespace

@@ -1,186 +1,110 @@
+// White balance of the flattened mosaic: levels R, GR, GB, B.
+
 #include <stdexcept>
 
-#include <gtest/gtest.h>
-
 #include "prep/white_balance.h"
-#include "test_images.h"
-
-using prep_test::makeImage;
-
-using img::BayerImage;
-using img::kCfaBggr;
-using img::kCfaGbrg;
-using img::kCfaGrbg;
-using img::kCfaRggb;
+#include "tests/prep/test_images.h"
 
 namespace {
 
-// The run's white balance: to the fit's target levels, or to the centre's
-// when the red one is 0.
-struct Balance {
-    BayerImage corrected;
-    float targetLevels[4] = {0, 0, 0, 0};
-    int awbFilterSize = 100;
-    int procSamplingFactor = 1;
-};
+using img::BayerImage;
+using prep_test::makeImage;
 
-void balance(Balance& run) {
+// A mosaic whose 2 x 2 tiles hold `tile` (top left, top right, bottom left,
+// bottom right).
+BayerImage tiled(std::int32_t width, std::int32_t height, const std::vector<float>& tile,
+                 std::uint32_t cfa = img::kCfaRggb) {
+    std::vector<float> rows(2 * static_cast<std::size_t>(width));
+    for (std::int32_t x = 0; x < width; ++x) {
+        rows[static_cast<std::size_t>(x)] = tile[x % 2];
+        rows[static_cast<std::size_t>(width + x)] = tile[2 + x % 2];
+    }
+    return makeImage(width, height, 1, cfa, rows);
+}
+
+void balance(BayerImage& image, const float (&targetLevels)[4]) {
     float levels[4];
-    prep::balanceLevels(run.targetLevels, run.corrected, levels);
-    prep::whiteBalance(run.corrected, levels);
+    prep::balanceLevels(targetLevels, image, levels);
+    prep::whiteBalance(image, levels);
 }
 
-// Channel of (x, y) for RGGB.
-int rggbChannel(int x, int y) {
-    return (x & 1) + (y & 1) * 2;
-}
-
-// Every pixel of channel k holds values[k].
-BayerImage channelImage(std::int32_t width, std::int32_t height, const float (&values)[4]) {
-    BayerImage image = makeImage(width, height, 1, kCfaRggb);
-    for (int y = 0; y < height; ++y)
-        for (int x = 0; x < width; ++x)
-            image.pixels()[y * width + x] = values[rggbChannel(x, y)];
-    return image;
-}
-
-TEST(CentreWindow, SmallImageSpansWholeImage) {
-    const prep::CentreWindow window = prep::centreWindow(150, 150);
-    EXPECT_EQ(window.x0, 0);
-    EXPECT_EQ(window.x1, 149);
-    EXPECT_EQ(window.y0, 0);
-    EXPECT_EQ(window.y1, 149);
-}
-
-TEST(CentreWindow, LargeImageGets201PixelsAroundCentre) {
-    const prep::CentreWindow window = prep::centreWindow(640, 480);
-    EXPECT_EQ(window.x0, 220);
-    EXPECT_EQ(window.x1, 420);
-    EXPECT_EQ(window.y0, 140);
-    EXPECT_EQ(window.y1, 340);
-}
-
-TEST(CentreWindow, MixedBounds) {
-    const prep::CentreWindow window = prep::centreWindow(250, 199);
-    EXPECT_EQ(window.x0, 25);
-    EXPECT_EQ(window.x1, 225);
-    EXPECT_EQ(window.y0, 0);
-    EXPECT_EQ(window.y1, 198);
-}
-
-class WhiteBalance : public ::testing::TestWithParam<std::uint32_t> {};
-
-TEST_P(WhiteBalance, TargetLevelsGiveGainsPerChannel) {
-    Balance run;
-    run.corrected = makeImage(4, 4, 1, GetParam());
-    prep_test::fill(run.corrected, 1.0f);
-    const float levels[4] = {1.0f, 2.0f, 2.0f, 0.5f};
-    std::copy(levels, levels + 4, run.targetLevels);
-    balance(run);
-    const float gains[4] = {2.0f, 1.0f, 1.0f, 4.0f};
-    // Channel k of (x, y) for the pattern under test.
-    const int phase = GetParam() == kCfaGrbg   ? 1
-                      : GetParam() == kCfaGbrg ? 2
-                      : GetParam() == kCfaBggr ? 3
-                                               : 0;
-    for (int y = 0; y < 4; ++y)
-        for (int x = 0; x < 4; ++x) {
-            const int channel = ((x + phase) & 1) + ((y + (phase >> 1)) & 1) * 2;
-            EXPECT_EQ(run.corrected.pixels()[y * 4 + x], gains[channel]) << x << "," << y;
-        }
-}
-
-INSTANTIATE_TEST_SUITE_P(BayerOrders, WhiteBalance,
-                         ::testing::Values(kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr));
-
-TEST(WhiteBalanceCentre, MeasuredLevelsBalanceTheChannels) {
-    Balance run;
-    run.corrected = channelImage(150, 150, {0.5f, 0.25f, 0.25f, 0.125f});
-    balance(run);
-    for (float v : prep_test::samplesOf(run.corrected))
-        ASSERT_EQ(v, 0.5f);
-}
-
-TEST(WhiteBalanceCentre, OnlyTheCentreWindowCounts) {
-    Balance run;
-    run.corrected = channelImage(640, 480, {0.5f, 0.5f, 0.5f, 0.5f});
-    // Red outside the window (x < 220) is darker; the gains must ignore it.
-    for (int y = 0; y < 480; y += 2)
-        run.corrected.pixels()[y * 640] = 0.1f;
-    balance(run);
-    EXPECT_EQ(run.corrected.pixels()[2 * 640 + 2], 0.5f);
-    EXPECT_EQ(run.corrected.pixels()[0], 0.1f);
-}
-
-TEST(WhiteBalanceCentre, RefusesWindowWithoutEveryChannel) {
-    Balance run;
-    run.corrected = makeImage(1, 8, 1, kCfaRggb);
-    prep_test::fill(run.corrected, 0.5f);
-    try {
-        balance(run);
-        FAIL();
-    } catch (const std::runtime_error& e) {
-        EXPECT_STREQ(e.what(),
-                     "The centre of the flattened image does not hold pixels of all four colour "
-                     "channels.");
+TEST(WhiteBalance, CentreWindowIs201PixelsOrTheWholeImage) {
+    const struct {
+        std::int32_t width, height, x0, x1, y0, y1;
+    } cases[] = {
+        {150, 150, 0, 149, 0, 149}, {640, 480, 220, 420, 140, 340}, {250, 199, 25, 225, 0, 198}};
+    for (const auto& c : cases) {
+        const prep::CentreWindow w = prep::centreWindow(c.width, c.height);
+        EXPECT_EQ((std::vector<int>{w.x0, w.x1, w.y0, w.y1}),
+                  (std::vector<int>{c.x0, c.x1, c.y0, c.y1}))
+            << c.width << "x" << c.height;
     }
 }
 
-TEST(WhiteBalanceCentre, RefusesZeroLevelAndLeavesImage) {
-    Balance run;
-    run.corrected = channelImage(8, 8, {0.5f, 0.5f, 0.0f, 0.5f});
-    try {
-        balance(run);
-        FAIL();
-    } catch (const std::runtime_error& e) {
-        EXPECT_STREQ(e.what(), "A colour channel of the flattened image has no positive level; "
-                               "it cannot be white balanced.");
+// Levels 1, 2, 4, 0.5 give gains 4, 2, 1, 8 (the largest level over each).
+TEST(WhiteBalance, TargetLevelsGiveEachBayerPositionItsChannelsGain) {
+    const struct {
+        std::uint32_t cfa;
+        std::vector<float> tile;
+    } orders[] = {{img::kCfaRggb, {4, 2, 1, 8}},
+                  {img::kCfaGrbg, {2, 4, 8, 1}},
+                  {img::kCfaGbrg, {1, 8, 4, 2}},
+                  {img::kCfaBggr, {8, 1, 2, 4}}};
+    for (const auto& order : orders) {
+        BayerImage image = makeImage(4, 4, 1, order.cfa, {1.0f});
+        balance(image, {1.0f, 2.0f, 4.0f, 0.5f});
+        EXPECT_EQ(prep_test::samplesOf(image), prep_test::samplesOf(tiled(4, 4, order.tile)))
+            << order.cfa;
     }
-    EXPECT_EQ(run.corrected.pixels()[0], 0.5f);
 }
 
-TEST(BoxSide, OddSideFromFilterSizeAndSamplingFactor) {
-    EXPECT_EQ(prep::boxSide(100, 1), 51);
-    EXPECT_EQ(prep::boxSide(100, 4), 13);
-    EXPECT_EQ(prep::boxSide(100, 2), 25);
-    EXPECT_EQ(prep::boxSide(1, 1), 1);
+TEST(WhiteBalance, WithoutTargetLevelsTheCentreIsMeasured) {
+    BayerImage image = tiled(150, 150, {0.5f, 0.25f, 0.25f, 0.125f});
+    balance(image, {0, 0, 0, 0});
+    EXPECT_EQ(prep_test::samplesOf(image), std::vector<float>(150 * 150, 0.5f));
+
+    BayerImage large = makeImage(640, 480, 1, img::kCfaRggb, {0.5f});
+    for (int y = 0; y < 480; y += 2) // darker red outside the window (x < 220)
+        large.pixels()[y * 640] = 0.1f;
+    balance(large, {0, 0, 0, 0});
+    EXPECT_EQ(large.pixels()[2 * 640 + 2], 0.5f);
+    EXPECT_EQ(large.pixels()[0], 0.1f);
+
+    BayerImage narrow = makeImage(1, 8, 1, img::kCfaRggb, {0.5f});
+    EXPECT_EQ(case_data::errorOf([&] {
+                  balance(narrow, {0, 0, 0, 0});
+              }),
+              "The centre of the flattened image does not hold pixels of all four colour "
+              "channels.");
+    BayerImage dark = tiled(8, 8, {0.5f, 0.5f, 0.0f, 0.5f});
+    EXPECT_EQ(case_data::errorOf([&] {
+                  balance(dark, {0, 0, 0, 0});
+              }),
+              "A colour channel of the flattened image has no positive level; it cannot be white "
+              "balanced.");
+    EXPECT_THROW(balance(dark, {0, 0, 0, 0}), std::runtime_error);
+    EXPECT_EQ(dark.pixels()[0], 0.5f);
 }
 
-TEST(MeasureLevels, FlatChannelsGiveTheirValues) {
-    Balance run;
-    run.corrected = channelImage(20, 16, {0.5f, 0.25f, 0.75f, 0.125f});
-    run.awbFilterSize = 6;
+TEST(WhiteBalance, LevelsAreBoxMeansOfThePlanes) {
+    const int sides[][3] = {{100, 1, 51}, {100, 4, 13}, {100, 2, 25}, {1, 1, 1}};
+    for (const auto& s : sides)
+        EXPECT_EQ(prep::boxSide(s[0], s[1]), s[2]) << s[0] << " " << s[1];
+
     float levels[4];
-    prep::measureLevels(levels, run.corrected, run.awbFilterSize, run.procSamplingFactor);
-    EXPECT_FLOAT_EQ(levels[0], 0.5f);
-    EXPECT_FLOAT_EQ(levels[1], 0.25f);
-    EXPECT_FLOAT_EQ(levels[2], 0.75f);
-    EXPECT_FLOAT_EQ(levels[3], 0.125f);
-}
+    prep::measureLevels(levels, tiled(20, 16, {0.5f, 0.25f, 0.75f, 0.125f}), 6, 1);
+    EXPECT_EQ((std::vector<float>(levels, levels + 4)),
+              (std::vector<float>{0.5f, 0.25f, 0.75f, 0.125f}));
 
-TEST(MeasureLevels, BoxMeanShrinksAtBorders) {
-    Balance run;
-    run.corrected = channelImage(10, 10, {0, 0, 0, 0}); // 5 x 5 planes
-    run.awbFilterSize = 6;                              // side 3
-    run.corrected.pixels()[2 * 2 * 10 + 2 * 2] = 9.0f;  // red plane (2, 2)
-    run.corrected.pixels()[0 * 10 + 1] = 9.0f;          // green/red plane (0, 0)
-    float levels[4];
-    prep::measureLevels(levels, run.corrected, run.awbFilterSize, run.procSamplingFactor);
-    EXPECT_FLOAT_EQ(levels[0], 1.0f);  // 9 over a full 3 x 3 window
-    EXPECT_FLOAT_EQ(levels[1], 2.25f); // 9 over the 2 x 2 corner window
+    BayerImage spots = makeImage(10, 10); // 5 x 5 planes, box side 3
+    spots.pixels()[4 * 10 + 4] = 9.0f;    // red plane (2, 2): a full 3 x 3 box
+    spots.pixels()[0 * 10 + 1] = 9.0f;    // green/red plane (0, 0): a 2 x 2 corner box
+    prep::measureLevels(levels, spots, 6, 1);
+    EXPECT_FLOAT_EQ(levels[0], 1.0f);
+    EXPECT_FLOAT_EQ(levels[1], 2.25f);
     EXPECT_FLOAT_EQ(levels[2], 0.0f);
-}
-
-TEST(MeasureLevels, RefusesImageBelowTwoByTwo) {
-    Balance run;
-    run.corrected = makeImage(1, 5);
-    prep_test::fill(run.corrected, 0.5f);
-    EXPECT_THROW(
-        {
-            float levels[4];
-            prep::measureLevels(levels, run.corrected, run.awbFilterSize, run.procSamplingFactor);
-        },
-        std::runtime_error);
+    EXPECT_THROW(prep::measureLevels(levels, makeImage(1, 5, 1, img::kCfaRggb, {0.5f}), 100, 1),
+                 std::runtime_error);
 }
 
 } // namespace
