@@ -1,10 +1,12 @@
-// The delta ab files and threshold.
+// The delta ab files and the bounds of delta ab and luminance residual.
 
 #include <cmath>
+#include <optional>
 #include <stdexcept>
 #include <string>
 
 #include "prep/delta_ab_report.h"
+#include "prep/luminance_residual.h"
 #include "tests/prep/test_images.h"
 #include "tests/support/temp_dir.h"
 
@@ -50,6 +52,25 @@ TEST(DeltaAbReport, ThresholdFailsAboveOrOnNotANumber) {
               "Maximum delta ab is greater than threshold of 10\n" + kCauses);
     EXPECT_THROW(prep::checkDeltaThreshold(10.5f, 10.0f), std::range_error);
     EXPECT_THROW(prep::checkDeltaThreshold(std::nanf(""), 10.0f), std::range_error);
+}
+
+TEST(DeltaAbReport, LuminanceBoundInPerCentFailsPastItAndZeroIsOff) {
+    const struct {
+        std::optional<float> residual;
+        float bound;
+        std::string message;
+    } cases[] = {
+        {0.03f, 3.0f, ""},
+        {0.5f, 0.0f, ""},
+        {std::nullopt, 0.0f, ""},
+        {0.031f, 3.0f, "Maximum luminance residual is greater than threshold of 3 %\n" + kCauses},
+        {std::nullopt, 3.0f,
+         "The luminance residual cannot be measured: the flattened image does not fill the delta "
+         "ab block grid or holds no light."},
+    };
+    for (const auto& c : cases)
+        EXPECT_EQ(case_data::errorOf([&] { prep::checkLuminanceResidual(c.residual, c.bound); }),
+                  c.message);
 }
 
 } // namespace

@@ -1,0 +1,209 @@
+// Colour planes, median filter, white balance, pixel checks and delta ab on
+// small images: the cases are in tests/data/prep/prep_cases.json, what each
+// gives (image, values or message) in prep_cases.golden.
+
+#include <algorithm>
+#include <iomanip>
+#include <map>
+#include <sstream>
+#include <stdexcept>
+
+#include "prep/bayer_planes.h"
+#include "prep/delta_ab.h"
+#include "prep/image_checks.h"
+#include "prep/luminance_residual.h"
+#include "prep/median_filter.h"
+#include "prep/median_tree.h"
+#include "prep/white_balance.h"
+#include "tests/prep/test_images.h"
+
+namespace {
+
+using img::BayerImage;
+using nlohmann::json;
+
+const std::map<std::string, std::uint32_t> kOrders = {{"RGGB", img::kCfaRggb},
+                                                      {"GRBG", img::kCfaGrbg},
+                                                      {"GBRG", img::kCfaGbrg},
+                                                      {"BGGR", img::kCfaBggr}};
+
+float number(const json& value) { // JSON has no NaN or infinity: "nan", "inf", "-inf"
+    return value.is_string() ? std::stof(value.get<std::string>()) : value.get<float>();
+}
+
+std::uint32_t cfaOf(const json& cfa) {
+    return cfa.is_string() ? kOrders.at(cfa) : cfa.get<std::uint32_t>();
+}
+
+// "size": [w, h, channels], "cfa": a Bayer order or a number, "samples": values
+// repeated over the image or "count" (0, 1, 2, ...), "tile": 2 x 2 values
+// repeated, "set": [[index, value]], "tint": [x0, y0, x1, y1] RGB pixels whose
+// top left sample becomes 0.9, "integer": 16-bit samples.
+BayerImage imageOf(const json& c) {
+    const json size = c["size"];
+    const std::size_t count =
+        size[0].get<std::size_t>() * size[1].get<std::size_t>() * size[2].get<std::size_t>();
+    std::vector<float> samples;
+    if (c.value("samples", json()) == "count")
+        samples = prep_test::counting(count);
+    else
+        for (const json& v : c.value("samples", json::array()))
+            samples.push_back(number(v));
+    const json cfa = c.value("cfa", json("RGGB"));
+    const std::size_t width = size[0];
+    if (c.contains("tile")) {
+        samples.resize(2 * width);
+        for (std::size_t x = 0; x < width; ++x) {
+            samples[x] = number(c["tile"][x % 2]);
+            samples[width + x] = number(c["tile"][2 + x % 2]);
+        }
+    }
+    BayerImage image = prep_test::makeImage(size[0], size[1], size[2], cfaOf(cfa), samples);
+    if (c.contains("integer")) {
+        int result = 0;
+        image.reset(img::imageCreate(size[0], size[1], 10, 1, 1, 0, img::kCfaRggb, img::kPixelRaw,
+                                     img::kBufferRawCfa, img::kDataUint16, &result));
+    }
+    for (const json& s : c.value("set", json::array()))
+        image.pixels()[s[0].get<std::size_t>()] = number(s[1]);
+    if (c.contains("tint"))
+        for (std::size_t y = c["tint"][1]; y < c["tint"][3]; ++y)
+            for (std::size_t x = c["tint"][0]; x < c["tint"][2]; ++x)
+                image.pixels()[2 * y * width + 2 * x] = 0.9f;
+    return image;
+}
+
+std::string text(const float* values, std::size_t count) {
+    std::ostringstream out;
+    out << std::setprecision(9);
+    for (std::size_t i = 0; i < count; ++i)
+        out << (i ? " " : "") << values[i];
+    return out.str();
+}
+
+std::string text(const BayerImage& image) {
+    const std::vector<float> samples = prep_test::samplesOf(image);
+    std::string name = std::to_string(image.cfa());
+    for (const auto& [order, cfa] : kOrders)
+        if (cfa == image.cfa())
+            name = order;
+    return std::to_string(image.width()) + "x" + std::to_string(image.height()) + "x" +
+           std::to_string(image.channels()) + " " + name +
+           (image.buffer()->pixelType == img::kPixelRaw ? " raw: " : ": ") +
+           (samples.size() <= 64
+                ? text(samples.data(), samples.size())
+                : "min " + text(&*std::min_element(samples.begin(), samples.end()), 1) + " max " +
+                      text(&*std::max_element(samples.begin(), samples.end()), 1));
+}
+
+// What case `c` gives; `out` collects what the checks print, `image` is the
+// case's image.
+std::string run(const json& c, std::ostream& out, BayerImage& image) {
+    const std::string op = c["op"];
+    if (op == "patternSize")
+        return std::to_string(prep::patternSize(c["cfa0"], cfaOf(c["cfa1"])));
+    if (op == "fullScale")
+        return std::to_string(prep::fullScale(c["depth"]));
+    if (op == "sampleUnits")
+        return std::to_string(prep::sampleUnits(c["sample"], c["scale"]));
+    if (op == "medianTree") {
+        prep::MedianTree tree;
+        for (const json& v : c.value("before", json::array())) // gone with clear()
+            tree.insert(v);
+        tree.clear();
+        for (const json& v : c["values"])
+            tree.insert(v);
+        return text(std::vector<float>{tree.median()}.data(), 1) + " of " +
+               std::to_string(tree.valueCount());
+    }
+    if (op == "centreWindow") {
+        const prep::CentreWindow w = prep::centreWindow(c["size"][0], c["size"][1]);
+        return std::to_string(w.x0) + ".." + std::to_string(w.x1) + " x " + std::to_string(w.y0) +
+               ".." + std::to_string(w.y1);
+    }
+    if (op == "boxSide")
+        return std::to_string(prep::boxSide(c["filter"], c["factor"]));
+
+    image = imageOf(c["image"]);
+    BayerImage target;
+    if (op == "split")
+        return text(prep::split(image));
+    if (op == "splitWeave")
+        return text(prep::weave(prep::split(image), 2, 0, image.cfa()));
+    if (op == "weave")
+        return text(prep::weave(image, c["pattern"], 0, cfaOf(c["cfa"])));
+    if (op == "downsample")
+        prep::downsample(image, c["factor"], target);
+    if (op == "median")
+        prep::medianFilterDownsample(image, c["size"], c["factor"], target);
+    if (op == "downsample" || op == "median")
+        return text(target);
+    float levels[4];
+    if (op == "balance") {
+        float targetLevels[4];
+        for (int k = 0; k < 4; ++k)
+            targetLevels[k] = c["levels"][k];
+        prep::balanceLevels(targetLevels, image, levels);
+        prep::whiteBalance(image, levels);
+        return text(image);
+    }
+    if (op == "measureLevels") {
+        prep::measureLevels(levels, image, c["awb"], 1);
+        return text(levels, 4);
+    }
+    if (op == "statistics") {
+        prep::writeStatistics(image, c["depth"], out);
+        out << " then " << 1.0 / 3.0; // the stream is left fixed with two decimals
+        return "";
+    }
+    if (op == "scanRange") {
+        const prep::OutOfRangePosition p = prep::scanRange(image, c["low"], c["high"]);
+        return std::to_string(p.row) + "," + std::to_string(p.column) + "," +
+               std::to_string(p.channel);
+    }
+    const json l = c.value("limits", json::array({0, 0, 0}));
+    const prep::PixelLimits limits{l[0], l[1], l[2]};
+    if (op == "checkPixels")
+        prep::checkPixels(image, limits, 1023, out);
+    if (op == "checkRange")
+        prep::checkPixelRange(image, limits, 1023, out);
+    if (op == "checkPeak")
+        prep::checkPeakLevel(image, limits, 1023, out);
+    if (op.rfind("check", 0) == 0)
+        return "passed";
+    lsc::ShadingSettings settings;
+    settings.deltaAbBlocks[0] = c["blocks"][0];
+    settings.deltaAbBlocks[1] = c["blocks"][1];
+    for (std::size_t i = 0; c.contains("ccm") && i < 9; ++i)
+        settings.ccm[i / 3][i % 3] = c["ccm"][i];
+    if (op == "residual")
+        return text(
+            std::vector<float>{prep::luminanceResidual(image, settings).value_or(-1.0f)}.data(), 1);
+    const prep::DeltaAbResult r = prep::evaluateDeltaAb(image, settings);
+    std::ostringstream result;
+    result << std::setprecision(9) << "deltas " << r.columns << "x" << r.rows << ": "
+           << text(r.deltaImage.data(), r.deltaImage.size()) << "\nmean chroma " << r.meanChroma
+           << " max " << r.maxDelta << " deviation " << r.deltaStdDev << "\ndisplay "
+           << text(image);
+    return result.str();
+}
+
+TEST(PrepCases, EachCaseGivesItsResultOrMessage) {
+    case_data::expectTranscript(
+        "prep/prep_cases.json", "prep/prep_cases.golden", [](const json& c) {
+            std::ostringstream out;
+            std::string result;
+            BayerImage image;
+            try {
+                result = run(c, out, image);
+            } catch (const std::invalid_argument& e) {
+                result = std::string("invalid argument: ") + e.what();
+            } catch (const std::exception& e) {
+                result = std::string("error: ") + e.what();
+            }
+            // "unchanged": the image after a refusal, as it was.
+            return out.str() + result + (c.contains("unchanged") ? "\nimage " + text(image) : "");
+        });
+}
+
+} // namespace
