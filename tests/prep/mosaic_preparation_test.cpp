@@ -6,6 +6,7 @@
 #include <cstring>
 #include <limits>
 #include <random>
+#include <sstream>
 #include <stdexcept>
 #include <string>
 
@@ -54,18 +55,22 @@ BayerImage inSteps(const BayerImage& mosaic, const MosaicPreparation& settings) 
     return prep::weave(reduced, prep::patternSize(cfa[0], cfa[1]), cfa[0], cfa[1]);
 }
 
+// Geometry, types and the bits of every sample.
 void expectSameImage(const BayerImage& actual, const BayerImage& expected) {
-    ASSERT_EQ(actual.width(), expected.width());
-    ASSERT_EQ(actual.height(), expected.height());
-    ASSERT_EQ(actual.channels(), expected.channels());
-    EXPECT_EQ(actual.bitsPerSample(), expected.bitsPerSample());
-    EXPECT_EQ(actual.buffer()->cfa[0], expected.buffer()->cfa[0]);
-    EXPECT_EQ(actual.buffer()->cfa[1], expected.buffer()->cfa[1]);
-    EXPECT_EQ(actual.buffer()->pixelType, expected.buffer()->pixelType);
-    EXPECT_EQ(actual.buffer()->bufferType, expected.buffer()->bufferType);
-    EXPECT_EQ(
-        std::memcmp(actual.pixels(), expected.pixels(), prep_test::samplesOf(actual).size() * 4),
-        0);
+    const auto identity = [](const BayerImage& image) {
+        const img::ImageBuffer& b = *image.buffer();
+        std::ostringstream out;
+        out << image.width() << "x" << image.height() << "x" << image.channels() << " bits "
+            << image.bitsPerSample() << " cfa " << b.cfa[0] << "," << b.cfa[1] << " types "
+            << b.pixelType << "," << b.bufferType << std::hex;
+        for (float v : prep_test::samplesOf(image)) {
+            std::uint32_t bits;
+            std::memcpy(&bits, &v, sizeof bits);
+            out << " " << bits;
+        }
+        return out.str();
+    };
+    EXPECT_EQ(identity(actual), identity(expected));
 }
 
 TEST(MosaicPreparation, MatchesTheStepsForEveryWindowFactorSizeAndOrder) {
@@ -116,40 +121,6 @@ TEST(MosaicPreparation, UnusualSamplesLandAsInTheSteps) {
     for (int size : {2, 3, 4})
         expectSameImage(prep::prepareMosaic(mosaic, {true, size, 1}),
                         inSteps(mosaic, {true, size, 1}));
-}
-
-TEST(MosaicPreparation, RefusesWhatTheStepsRefuseWithTheirMessages) {
-    const BayerImage mosaic = noisyMosaic(16, 16, img::kCfaRggb), none;
-    const BayerImage narrow = noisyMosaic(1, 8, img::kCfaRggb);
-    const BayerImage threeChannels = noisyMosaic(8, 8, img::kCfaRggb, 3);
-    const std::string badSize = "The median filter size must be between 1 and 10.";
-    const std::string badFactor = "The down-sampling factor must be at least 1.";
-    const std::string notFloat = "Image preparation needs a floating-point image.";
-    const struct {
-        const BayerImage* image;
-        MosaicPreparation settings;
-        std::string message;
-    } cases[] = {
-        {&mosaic, {true, 0, 4}, badSize},
-        {&mosaic, {true, 11, 4}, badSize},
-        {&mosaic, {true, 3, 0}, badFactor},
-        {&mosaic, {false, 3, 0}, badFactor},
-        {&narrow, {true, 3, 1}, notFloat},
-        {&none, {true, 3, 1}, notFloat},
-        // Three channels split into 12, which do not weave back.
-        {&threeChannels, {true, 3, 1}, "Invalid image format for Bayer interweaving."},
-    };
-    for (const auto& c : cases) {
-        EXPECT_EQ(case_data::errorOf([&] { prep::prepareMosaic(*c.image, c.settings); }),
-                  c.message);
-        EXPECT_THROW(prep::prepareMosaic(*c.image, c.settings), std::invalid_argument);
-    }
-    EXPECT_FALSE(prep::MosaicStream::accepts(1, 10, {}));
-    EXPECT_FALSE(prep::MosaicStream::accepts(10, 1, {}));
-    EXPECT_FALSE(prep::MosaicStream::accepts(10, 10, {true, 11, 1}));
-    EXPECT_FALSE(prep::MosaicStream::accepts(10, 10, {true, 3, 0}));
-    EXPECT_TRUE(prep::MosaicStream::accepts(10, 10, {false, 11, 1}));
-    EXPECT_THROW(prep::MosaicStream(10, 10, {true, 0, 1}), std::invalid_argument);
 }
 
 // Integer rows: odd and even sizes, images narrower than the window, every

@@ -14,6 +14,9 @@
 #include "prep/luminance_residual.h"
 #include "prep/median_filter.h"
 #include "prep/median_tree.h"
+#include "prep/mosaic_preparation.h"
+#include "prep/mosaic_stream.h"
+#include "prep/number_line.h"
 #include "prep/white_balance.h"
 #include "tests/prep/test_images.h"
 
@@ -102,6 +105,29 @@ std::string run(const json& c, std::ostream& out, BayerImage& image) {
     const std::string op = c["op"];
     if (op == "patternSize")
         return std::to_string(prep::patternSize(c["cfa0"], cfaOf(c["cfa1"])));
+    if (op == "numberLine") {               // "i" an integer, "d" a decimal, else a separator
+        const std::string text = c["text"]; // the line views it
+        prep::NumberLine line(text);
+        std::ostringstream read;
+        read << std::setprecision(9);
+        for (char step : c["steps"].get<std::string>()) {
+            if (step == 'i')
+                read << line.integer() << " ";
+            else if (step == 'd')
+                read << line.decimal() << " ";
+            else
+                line.expect(step);
+        }
+        line.expectEnd();
+        return line.ok() ? read.str() + "ok" : "refused";
+    }
+    if (op == "stream") {
+        const prep::MosaicPreparation settings{c["median"], c["window"], c["factor"]};
+        out << (prep::MosaicStream::accepts(c["size"][0], c["size"][1], settings) ? "accepted; "
+                                                                                  : "refused; ");
+        prep::MosaicStream(c["size"][0], c["size"][1], settings);
+        return "constructed";
+    }
     if (op == "fullScale")
         return std::to_string(prep::fullScale(c["depth"]));
     if (op == "sampleUnits")
@@ -126,6 +152,8 @@ std::string run(const json& c, std::ostream& out, BayerImage& image) {
 
     image = imageOf(c["image"]);
     BayerImage target;
+    if (op == "prepare")
+        return text(prep::prepareMosaic(image, {c["median"], c["window"], c["factor"]}));
     if (op == "split")
         return text(prep::split(image));
     if (op == "splitWeave")
