@@ -5,11 +5,13 @@
 #include <algorithm>
 #include <iomanip>
 #include <map>
+#include <optional>
 #include <sstream>
 #include <stdexcept>
 
 #include "prep/bayer_planes.h"
 #include "prep/delta_ab.h"
+#include "prep/delta_ab_report.h"
 #include "prep/image_checks.h"
 #include "prep/luminance_residual.h"
 #include "prep/median_filter.h"
@@ -17,6 +19,7 @@
 #include "prep/mosaic_preparation.h"
 #include "prep/mosaic_stream.h"
 #include "prep/number_line.h"
+#include "prep/sample_file.h"
 #include "prep/white_balance.h"
 #include "tests/prep/test_images.h"
 
@@ -99,6 +102,13 @@ std::string text(const BayerImage& image) {
                       text(&*std::max_element(samples.begin(), samples.end()), 1));
 }
 
+std::string text(const lsc::SampleSet& set) {
+    std::string result = "levels " + text(set.targetLevels, 4);
+    for (const lsc::shadingSample& s : set.samples)
+        result += "\n" + std::to_string(s.x) + "," + std::to_string(s.y) + ": " + text(s.value, 4);
+    return result;
+}
+
 // What case `c` gives; `out` collects what the checks print, `image` is the
 // case's image.
 std::string run(const json& c, std::ostream& out, BayerImage& image) {
@@ -127,6 +137,38 @@ std::string run(const json& c, std::ostream& out, BayerImage& image) {
                                                                                   : "refused; ");
         prep::MosaicStream(c["size"][0], c["size"][1], settings);
         return "constructed";
+    }
+    if (op == "parseSamples") { // for a 648 x 486 image of sampling factor 4 by default
+        const json size = c.value("size", json::array({648, 486, 4}));
+        return text(prep::parseSampleFile(c["text"].get<std::string>(), size[0], size[1],
+                                          {1023, size[2].get<int>()}));
+    }
+    if (op == "formatSamples") {
+        float levels[4];
+        std::vector<lsc::shadingSample> samples;
+        for (int k = 0; k < 4; ++k)
+            levels[k] = c["levels"][k];
+        for (const json& s : c["samples"])
+            samples.push_back({s[0], s[1], {s[2], s[3], s[4], s[5]}});
+        return prep::formatSampleFile(levels, samples, c["size"][0], c["size"][1],
+                                      {1023, c["factor"]});
+    }
+    if (op == "sampleFullScale")
+        return std::to_string(prep::sampleFullScale(c["bits"]));
+    if (op == "deltaFiles") {
+        prep::DeltaAbResult r{c["columns"], c["rows"], c["deltas"],
+                              c["mean"],    c["max"],  c["deviation"]};
+        return prep::formatDeltaFile(r) + "---\n" + prep::formatStatsFile(r);
+    }
+    if (op == "deltaBound") {
+        prep::checkDeltaThreshold(number(c["max"]), c["bound"]);
+        return "passed";
+    }
+    if (op == "luminanceBound") {
+        prep::checkLuminanceResidual(c["residual"].is_null() ? std::nullopt
+                                                             : std::optional<float>(c["residual"]),
+                                     c["bound"]);
+        return "passed";
     }
     if (op == "fullScale")
         return std::to_string(prep::fullScale(c["depth"]));
@@ -226,6 +268,8 @@ TEST(PrepCases, EachCaseGivesItsResultOrMessage) {
                 result = run(c, out, image);
             } catch (const std::invalid_argument& e) {
                 result = std::string("invalid argument: ") + e.what();
+            } catch (const std::range_error& e) {
+                result = std::string("range error: ") + e.what();
             } catch (const std::exception& e) {
                 result = std::string("error: ") + e.what();
             }
