@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
+#include <stdexcept>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -56,6 +57,21 @@ template <typename Action> std::string errorOf(Action action, const std::string&
         return text;
     }
     return none;
+}
+
+// What `action` returns, or the kind and message of what it throws.
+template <typename Action> std::string outcomeOf(Action action) {
+    try {
+        return action();
+    } catch (const std::invalid_argument& e) {
+        return std::string("invalid argument: ") + e.what();
+    } catch (const std::out_of_range& e) {
+        return std::string("out of range: ") + e.what();
+    } catch (const std::range_error& e) {
+        return std::string("range error: ") + e.what();
+    } catch (const std::exception& e) {
+        return std::string("error: ") + e.what();
+    }
 }
 
 } // namespace case_data

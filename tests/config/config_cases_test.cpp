@@ -57,9 +57,11 @@ std::string values(const config_node& node) {
 // A text parsed into a fresh tree: the tree, or the message and what was kept.
 std::string parsed(const json& text) {
     config_node_impl root("root");
-    const std::string error =
-        case_data::errorOf([&] { parse_config_text(text.get<std::string>(), root); });
-    return (error.empty() ? "" : "error: " + error + "\n") + printed(root);
+    const std::string outcome = case_data::outcomeOf([&] {
+        parse_config_text(text.get<std::string>(), root);
+        return std::string();
+    });
+    return outcome + (outcome.empty() ? "" : "\n") + printed(root);
 }
 
 // On the tree of "text": "find" or "child" of a path: the node's name and
@@ -67,15 +69,14 @@ std::string parsed(const json& text) {
 std::string path(const json& c) {
     config_node_impl root("root");
     parse_config_text(c.value("text", ""), root);
-    std::string result;
-    const std::string error = case_data::errorOf([&] {
+    const std::string outcome = case_data::outcomeOf([&] {
         const config_node& node = c.contains("find")
                                       ? root.find_path(c["find"].get<std::string>())
                                       : root.child_path(c["child"].get<std::string>());
-        result = (node.valid() ? node.name() : "invalid") + " (size " +
-                 std::to_string(node.size()) + ")\n" + values(node);
+        return (node.valid() ? node.name() : "invalid") + " (size " + std::to_string(node.size()) +
+               ")\n" + values(node);
     });
-    return (error.empty() ? result : "error: " + error) + "\n" + printed(root);
+    return outcome + "\n" + printed(root);
 }
 
 std::string value(const json& text) {
@@ -105,14 +106,15 @@ std::string validated(const json& settings) {
     config_node_impl config("config");
     set_defaults(config);
     parse_config_text(settings.get<std::string>(), config);
-    return case_data::errorOf([&] { validate(config); }, "(valid)");
+    return case_data::outcomeOf([&] {
+        validate(config);
+        return "(valid)";
+    });
 }
 
 std::string date(const json& text) {
-    std::string seconds;
-    const std::string error = case_data::errorOf(
-        [&] { seconds = std::to_string(config_date_seconds(text.get<std::string>())); });
-    return error.empty() ? seconds : error;
+    return case_data::outcomeOf(
+        [&] { return std::to_string(config_date_seconds(text.get<std::string>())); });
 }
 
 TEST(ConfigCases, EachTableGivesItsTranscript) {
@@ -124,7 +126,7 @@ TEST(ConfigCases, EachTableGivesItsTranscript) {
     case_data::expectTranscript("config/dates.json", "config/dates.golden", date);
 }
 
-TEST(ConfigCases, NodeInterfaceDetailsAndExceptionTypes) {
+TEST(ConfigCases, NodeInterfaceDetails) {
     config_node_impl config("config");
     config_node& none = config_node_none::instance();
     EXPECT_EQ(&none.child("a"), &none);
@@ -141,15 +143,8 @@ TEST(ConfigCases, NodeInterfaceDetailsAndExceptionTypes) {
     EXPECT_TRUE(quality.initialized() && quality.is_default());
     quality.set("80");
     EXPECT_FALSE(quality.is_default());
-    set_defaults(config);
-    EXPECT_THROW(config.find_path("a..b"), std::invalid_argument);
-    EXPECT_THROW(config.child_path("c[1][65535][65535][65535][65535][65535][65535]"),
-                 std::out_of_range);
     EXPECT_THROW(config.find("missing").as_int(), std::invalid_argument);
     EXPECT_THROW(config.child("unset").as_int(), std::invalid_argument);
-    EXPECT_THROW(config_date_seconds("2012-02-30T10:00"), std::invalid_argument);
-    parse_config_text("shared.bit_res = 3;", config);
-    EXPECT_THROW(validate(config), std::range_error);
     EXPECT_EQ(integerText(-2147483648LL), "-2147483648");
 }
 

@@ -56,10 +56,8 @@ TEST(FitSettings, ConfigurationAndImageGiveTheSettings) {
             config_node_impl config("config");
             set_defaults(config);
             parse_config_text(c["settings"].get<std::string>(), config);
-            std::string result;
-            const std::string error = case_data::errorOf(
-                [&] { result = describe(load_fit_settings(config, imageOf(c["image"]))); });
-            return error.empty() ? result : error;
+            return case_data::outcomeOf(
+                [&] { return describe(load_fit_settings(config, imageOf(c["image"]))); });
         });
 }
 
@@ -78,18 +76,16 @@ TEST(PatchGeometryCheck, StoredDataAgainstConfigurationAndImage) {
             lsc::ShadingCorrection fitted; // what the run had before reading the data
             fitted.layout.left = 0.125;
             fitted.controlGrids[1][5] = 4.0f;
-            StoredCalibration stored;
-            const std::string error =
-                case_data::errorOf([&] { stored = readConfigParam(root, data, image, fitted); });
-            if (!error.empty())
-                return error;
-            std::string grids;
-            for (const auto& grid : stored.correction.controlGrids)
-                grids += " " + number(grid[0]) + " " + number(grid[5]) + " " + number(grid[39]) +
-                         " " + number(grid[99]);
-            return layoutText(stored.correction.layout) + "\ngrids" + grids + "\nlevels " +
-                   number(stored.whiteBalance[0]) + " " + number(stored.whiteBalance[1]) + " " +
-                   number(stored.whiteBalance[2]) + " " + number(stored.whiteBalance[3]);
+            return case_data::outcomeOf([&] {
+                const StoredCalibration stored = readConfigParam(root, data, image, fitted);
+                std::string grids;
+                for (const auto& grid : stored.correction.controlGrids)
+                    grids += " " + number(grid[0]) + " " + number(grid[5]) + " " +
+                             number(grid[39]) + " " + number(grid[99]);
+                return layoutText(stored.correction.layout) + "\ngrids" + grids + "\nlevels " +
+                       number(stored.whiteBalance[0]) + " " + number(stored.whiteBalance[1]) + " " +
+                       number(stored.whiteBalance[2]) + " " + number(stored.whiteBalance[3]);
+            });
         });
 }
 

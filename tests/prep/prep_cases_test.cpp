@@ -262,17 +262,8 @@ TEST(PrepCases, EachCaseGivesItsResultOrMessage) {
     case_data::expectTranscript(
         "prep/prep_cases.json", "prep/prep_cases.golden", [](const json& c) {
             std::ostringstream out;
-            std::string result;
             BayerImage image;
-            try {
-                result = run(c, out, image);
-            } catch (const std::invalid_argument& e) {
-                result = std::string("invalid argument: ") + e.what();
-            } catch (const std::range_error& e) {
-                result = std::string("range error: ") + e.what();
-            } catch (const std::exception& e) {
-                result = std::string("error: ") + e.what();
-            }
+            const std::string result = case_data::outcomeOf([&] { return run(c, out, image); });
             // "unchanged": the image after a refusal, as it was.
             return out.str() + result + (c.contains("unchanged") ? "\nimage " + text(image) : "");
         });
