@@ -36,14 +36,6 @@ std::vector<std::uint16_t> noise(std::size_t count, std::uint32_t mask, unsigned
     return samples;
 }
 
-BayerImage noisyMosaic(std::int32_t width, std::int32_t height, std::uint32_t cfa1,
-                       std::uint16_t channels = 1) {
-    std::vector<float> values;
-    for (std::uint16_t s : noise(static_cast<std::size_t>(width) * height * channels, 1023, 7))
-        values.push_back(static_cast<float>(s) / 1023.0f);
-    return prep_test::makeImage(width, height, channels, cfa1, values);
-}
-
 BayerImage inSteps(const BayerImage& mosaic, const MosaicPreparation& settings) {
     const BayerImage planes = prep::split(mosaic);
     BayerImage reduced;
@@ -73,40 +65,63 @@ void expectSameImage(const BayerImage& actual, const BayerImage& expected) {
     EXPECT_EQ(identity(actual), identity(expected));
 }
 
-TEST(MosaicPreparation, MatchesTheStepsForEveryWindowFactorSizeAndOrder) {
+// A noisy mosaic of `bits` prepared in one pass and in steps; a Bayer mosaic
+// also as integer rows streamed in. Returns the mosaic.
+BayerImage expectSamePreparations(std::int32_t width, std::int32_t height, std::uint32_t cfa1,
+                                  const MosaicPreparation& settings, std::uint16_t bits = 10,
+                                  std::uint32_t cfa0 = 0) {
+    SCOPED_TRACE(::testing::Message()
+                 << width << "x" << height << " cfa " << cfa0 << "," << cfa1 << " median "
+                 << settings.medianFilter << " size " << settings.medianSize << " factor "
+                 << settings.samplingFactor << " bits " << bits);
+    const std::uint32_t mask = (1u << bits) - 1u;
+    const std::vector<std::uint16_t> samples = noise(static_cast<std::size_t>(width) * height, mask,
+                                                     static_cast<unsigned>(width * 131 + height));
+    std::vector<float> values;
+    for (std::uint16_t s : samples)
+        values.push_back(static_cast<float>(s) / static_cast<float>(mask));
+    BayerImage mosaic = prep_test::makeImage(width, height, 1, cfa1, values, bits);
+    mosaic.buffer()->cfa[0] = cfa0;
+    const BayerImage prepared = prep::prepareMosaic(mosaic, settings);
+    expectSameImage(prepared, inSteps(mosaic, settings));
+    if (prep::patternSize(cfa0, cfa1) == 2) {
+        prep::MosaicStream stream(width, height, settings);
+        for (std::int32_t y = 0; y < height; ++y)
+            stream.addRow(samples.data() + static_cast<std::size_t>(y) * width);
+        expectSameImage(stream.finish(bits, 0, cfa1), prepared);
+        EXPECT_EQ(stream.largest(), *std::max_element(samples.begin(), samples.end()));
+    }
+    return mosaic;
+}
+
+TEST(MosaicPreparation, OnePassAndStreamMatchTheStepsForEveryWindowFactorSizeOrderAndDepth) {
     // Odd sizes lose their last row or column; the small ones are narrower
     // than the window, so its mirror reflects more than once.
     const std::int32_t sizes[][2] = {{2, 2}, {3, 5}, {6, 4}, {17, 13}, {64, 48}, {101, 67}};
     for (const auto& size : sizes)
         for (int window = 1; window <= 10; ++window)
-            for (int factor : {1, 2, 3, 4, 7}) {
-                SCOPED_TRACE(::testing::Message() << size[0] << "x" << size[1] << " size " << window
-                                                  << " factor " << factor);
-                const BayerImage mosaic = noisyMosaic(size[0], size[1], img::kCfaGrbg);
-                expectSameImage(prep::prepareMosaic(mosaic, {true, window, factor}),
-                                inSteps(mosaic, {true, window, factor}));
-            }
+            for (int factor : {1, 2, 3, 4, 7})
+                expectSamePreparations(size[0], size[1], img::kCfaGrbg, {true, window, factor});
     for (std::uint32_t cfa : {img::kCfaRggb, img::kCfaGrbg, img::kCfaGbrg, img::kCfaBggr})
-        for (int factor : {1, 2, 4, 5}) {
-            const BayerImage mosaic = noisyMosaic(37, 29, cfa);
-            expectSameImage(prep::prepareMosaic(mosaic, {false, 11, factor}), // size unused
-                            inSteps(mosaic, {false, 11, factor}));
-        }
-    const BayerImage mosaic = noisyMosaic(40, 30, img::kCfaBggr);
+        for (int factor : {1, 2, 4, 5}) // the window size is not used
+            expectSamePreparations(37, 29, cfa, {false, 11, factor});
+    const int depths[][5] = {{130, 34, 12, 3, 3}, {36, 30, 16, 6, 1}, {40, 40, 14, 8, 2},
+                             {6, 14, 11, 3, 1},   {65, 47, 8, 0, 3},  {3, 5, 10, 0, 2}};
+    for (const auto& d : depths) // width, height, bits, window (0: no median), factor
+        expectSamePreparations(d[0], d[1], img::kCfaGrbg, {d[3] > 0, d[3], d[4]},
+                               static_cast<std::uint16_t>(d[2]));
+    const BayerImage mosaic = expectSamePreparations(40, 30, img::kCfaBggr, {false, 3, 1});
     expectSameImage(prep::prepareMosaic(mosaic, {false, 3, 1}), mosaic);
     // No pattern: the planes are the mosaic itself; a 4 x 4 pattern (low bits
     // of the first cfa word).
-    const BayerImage plain = noisyMosaic(20, 10, 0);
-    expectSameImage(prep::prepareMosaic(plain, {true, 3, 2}), inSteps(plain, {true, 3, 2}));
-    BayerImage sixteen = noisyMosaic(32, 16, 0);
-    sixteen.buffer()->cfa[0] = 0x1;
-    expectSameImage(prep::prepareMosaic(sixteen, {true, 3, 2}), inSteps(sixteen, {true, 3, 2}));
+    expectSamePreparations(20, 10, 0, {true, 3, 2});
+    expectSamePreparations(32, 16, 0, {true, 3, 2}, 10, 0x1);
 }
 
 TEST(MosaicPreparation, UnusualSamplesLandAsInTheSteps) {
     // NaN, negative zero (equal to zero: it shares the tree's node), values
     // whose sum overflows, infinities and negative values.
-    BayerImage mosaic = noisyMosaic(24, 18, img::kCfaRggb);
+    BayerImage mosaic = expectSamePreparations(24, 18, img::kCfaRggb, {true, 3, 1});
     float* p = mosaic.pixels();
     for (std::size_t i : {0u, 5u, 26u, 27u, 100u, 231u, 400u})
         p[i] = std::numeric_limits<float>::quiet_NaN();
@@ -121,45 +136,6 @@ TEST(MosaicPreparation, UnusualSamplesLandAsInTheSteps) {
     for (int size : {2, 3, 4})
         expectSameImage(prep::prepareMosaic(mosaic, {true, size, 1}),
                         inSteps(mosaic, {true, size, 1}));
-}
-
-// Integer rows: odd and even sizes, images narrower than the window, every
-// window size, factors 1 to 5, the median off, depths 8 to 16.
-TEST(MosaicStream, GivesTheBitsOfTheFloatPreparation) {
-    const struct {
-        std::int32_t width, height;
-        std::uint16_t bits;
-        bool median;
-        int size, factor;
-    } cases[] = {
-        {64, 48, 10, true, 3, 1},  {67, 49, 10, true, 3, 4}, {130, 34, 12, true, 3, 3},
-        {40, 30, 10, true, 1, 2},  {41, 31, 10, true, 2, 1}, {40, 30, 12, true, 4, 2},
-        {50, 38, 10, true, 5, 3},  {36, 30, 16, true, 6, 1}, {45, 41, 10, true, 7, 5},
-        {40, 40, 14, true, 8, 2},  {38, 34, 10, true, 9, 4}, {60, 44, 10, true, 10, 3},
-        {8, 6, 10, true, 9, 1},    {6, 14, 11, true, 3, 1},  {2, 2, 10, true, 3, 1},
-        {64, 48, 10, false, 3, 1}, {65, 47, 8, false, 3, 3}, {3, 5, 10, false, 1, 2},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(::testing::Message()
-                     << c.width << "x" << c.height << " size " << c.size << " factor " << c.factor);
-        const MosaicPreparation settings{c.median, c.size, c.factor};
-        const std::uint32_t mask = (1u << c.bits) - 1u;
-        const std::vector<std::uint16_t> samples =
-            noise(static_cast<std::size_t>(c.width) * c.height, mask,
-                  static_cast<unsigned>(c.width * 131 + c.height));
-        std::vector<float> values;
-        for (std::uint16_t s : samples)
-            values.push_back(static_cast<float>(s) / static_cast<float>(mask));
-        const BayerImage image =
-            prep_test::makeImage(c.width, c.height, 1, img::kCfaGrbg, values, c.bits);
-
-        prep::MosaicStream stream(c.width, c.height, settings);
-        for (std::int32_t y = 0; y < c.height; ++y)
-            stream.addRow(samples.data() + static_cast<std::size_t>(y) * c.width);
-        expectSameImage(stream.finish(c.bits, 0, img::kCfaGrbg),
-                        prep::prepareMosaic(image, settings));
-        EXPECT_EQ(stream.largest(), *std::max_element(samples.begin(), samples.end()));
-    }
 }
 
 } // namespace
