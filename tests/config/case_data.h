@@ -59,6 +59,11 @@ template <typename Action> std::string errorOf(Action action, const std::string&
     return none;
 }
 
+// A number of a table; JSON has no NaN or infinity: "nan", "inf", "-inf".
+inline float number(const nlohmann::json& value) {
+    return value.is_string() ? std::stof(value.get<std::string>()) : value.get<float>();
+}
+
 // What `action` returns, or the kind and message of what it throws.
 template <typename Action> std::string outcomeOf(Action action) {
     try {

@@ -33,9 +33,7 @@ const std::map<std::string, std::uint32_t> kOrders = {{"RGGB", img::kCfaRggb},
                                                       {"GBRG", img::kCfaGbrg},
                                                       {"BGGR", img::kCfaBggr}};
 
-float number(const json& value) { // JSON has no NaN or infinity: "nan", "inf", "-inf"
-    return value.is_string() ? std::stof(value.get<std::string>()) : value.get<float>();
-}
+using case_data::number;
 
 std::uint32_t cfaOf(const json& cfa) {
     return cfa.is_string() ? kOrders.at(cfa) : cfa.get<std::uint32_t>();
