@@ -152,15 +152,11 @@ TEST(RegisterFile, VariantsGiveTheirTexts) {
                         shown += line + "\n";
                 config_node_impl back("root");
                 parse_config_text(run.text(), back);
-                const config_node& block = back.find("reference");
-                return shown + "read back: serial " + block.find("serial_no").as_string() +
-                       ", GR[3][7] " +
-                       number(block
-                                  .find_path(run.infix.substr(run.infix.empty() ? 0 : 1) +
-                                             (run.infix.empty() ? "" : ".") +
-                                             "controlPointGR[3][7]")
-                                  .as_float()) +
-                       ", entries " + std::to_string(back.namedChildren().size());
+                const std::string point = "reference" + run.infix + ".controlPointGR[3][7]";
+                return shown + "read back: serial " +
+                       back.find_path("reference.serial_no").as_string() + ", GR[3][7] " +
+                       number(back.find_path(point).as_float()) + ", entries " +
+                       std::to_string(back.namedChildren().size());
             });
         });
 }
