@@ -35,12 +35,4 @@ inline std::vector<float> samplesOf(const img::BayerImage& image) {
     return std::vector<float>(image.pixels(), image.pixels() + count);
 }
 
-// 0, 1, 2, ... count - 1.
-inline std::vector<float> counting(std::size_t count) {
-    std::vector<float> values(count);
-    for (std::size_t i = 0; i < count; ++i)
-        values[i] = static_cast<float>(i);
-    return values;
-}
-
 } // namespace prep_test
