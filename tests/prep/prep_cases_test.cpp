@@ -178,11 +178,11 @@ std::string run(const json& c, std::ostream& out, BayerImage& image) {
         return std::to_string(prep::sampleUnits(c["sample"], c["scale"]));
     if (op == "medianTree") {
         prep::MedianTree tree;
-        for (const json& v : c.value("before", json::array())) // gone with clear()
-            tree.insert(v);
-        tree.clear();
-        for (const json& v : c["values"])
-            tree.insert(v);
+        for (const json& values : {c.value("before", json::array()), c["values"]}) {
+            tree.clear(); // a fresh window: what came before is gone
+            for (const json& v : values)
+                tree.insert(v);
+        }
         return text(std::vector<float>{tree.median()}.data(), 1) + " of " +
                std::to_string(tree.valueCount());
     }
