@@ -81,15 +81,17 @@ BayerImage imageOf(const json& c) {
     return image;
 }
 
-std::string text(const float* values, std::size_t count) {
+// Values with 9 significant digits, or `decimals` after the point where the
+// last bits may differ between machines (powers, sums of many values).
+std::string text(const float* values, std::size_t count, int decimals = 0) {
     std::ostringstream out;
-    out << std::setprecision(9);
+    decimals ? out << std::fixed << std::setprecision(decimals) : out << std::setprecision(9);
     for (std::size_t i = 0; i < count; ++i)
         out << (i ? " " : "") << values[i];
     return out.str();
 }
 
-std::string text(const BayerImage& image) {
+std::string text(const BayerImage& image, int decimals = 0) {
     const std::vector<float> samples = prep_test::samplesOf(image);
     std::string name = std::to_string(image.cfa());
     for (const auto& [order, cfa] : kOrders)
@@ -99,9 +101,10 @@ std::string text(const BayerImage& image) {
            std::to_string(image.channels()) + " " + name +
            (image.buffer()->pixelType == img::kPixelRaw ? " raw: " : ": ") +
            (samples.size() <= 64
-                ? text(samples.data(), samples.size())
-                : "min " + text(&*std::min_element(samples.begin(), samples.end()), 1) + " max " +
-                      text(&*std::max_element(samples.begin(), samples.end()), 1));
+                ? text(samples.data(), samples.size(), decimals)
+                : "min " + text(&*std::min_element(samples.begin(), samples.end()), 1, decimals) +
+                      " max " +
+                      text(&*std::max_element(samples.begin(), samples.end()), 1, decimals));
 }
 
 std::string text(const lsc::SampleSet& set) {
@@ -248,16 +251,15 @@ std::string run(const json& c, std::ostream& out, BayerImage& image) {
     settings.deltaAbBlocks[1] = c["blocks"][1];
     for (std::size_t i = 0; c.contains("ccm") && i < 9; ++i)
         settings.ccm[i / 3][i % 3] = c["ccm"][i];
-    if (op == "residual")
-        return text(
-            std::vector<float>{prep::luminanceResidual(image, settings).value_or(-1.0f)}.data(), 1);
+    if (op == "residual") {
+        const float residual = prep::luminanceResidual(image, settings).value_or(-1.0f);
+        return text(&residual, 1, 5);
+    }
     const prep::DeltaAbResult r = prep::evaluateDeltaAb(image, settings);
-    std::ostringstream result;
-    result << std::setprecision(9) << "deltas " << r.columns << "x" << r.rows << ": "
-           << text(r.deltaImage.data(), r.deltaImage.size()) << "\nmean chroma " << r.meanChroma
-           << " max " << r.maxDelta << " deviation " << r.deltaStdDev << "\ndisplay "
-           << text(image);
-    return result.str();
+    const float statistics[3] = {r.meanChroma, r.maxDelta, r.deltaStdDev};
+    return "deltas " + std::to_string(r.columns) + "x" + std::to_string(r.rows) + ": " +
+           text(r.deltaImage.data(), r.deltaImage.size(), 4) + "\nmean chroma, max, deviation " +
+           text(statistics, 3, 4) + "\ndisplay " + text(image, 5);
 }
 
 TEST(PrepCases, EachCaseGivesItsResultOrMessage) {
@@ -314,22 +316,15 @@ TEST(OutputFiles, FilesThatCannotBeOpenedOrWrittenAreNamed) {
     const std::string missing = dir.file("none.txt"), unwritable = dir.file("no/out.txt");
     const lsc::SampleSet set;
     const prep::DeltaAbResult result{1, 1, {1.0f}, 0, 0, 0};
+    const prep::SampleFileScale one{1023, 1};
     const std::pair<std::function<void()>, std::string> cases[] = {
-        {[&] {
-             prep::readSampleFile(missing, image, {1023, 1});
-         },
+        {[&] { prep::readSampleFile(missing, image, one); },
          "Cannot open input sample file: " + missing},
-        {[&] {
-             prep::readSampleFile(dir.file("bad.txt"), image, {1023, 1});
-         },
+        {[&] { prep::readSampleFile(dir.file("bad.txt"), image, one); },
          "Invalid format in sample file."},
-        {[&] {
-             prep::writeSampleFile(unwritable, set, image, {1023, 1});
-         },
+        {[&] { prep::writeSampleFile(unwritable, set, image, one); },
          "Cannot open sample output file: " + unwritable},
-        {[&] {
-             prep::writeSampleFile("/dev/full", set, image, {1023, 1});
-         },
+        {[&] { prep::writeSampleFile("/dev/full", set, image, one); },
          "Cannot write sample output file: /dev/full"},
         {[&] { prep::writeDeltaFile(unwritable, result); }, "Cannot open file : " + unwritable},
         {[&] { prep::writeStatsFile(unwritable, result); }, "Cannot open file : " + unwritable},
@@ -337,8 +332,8 @@ TEST(OutputFiles, FilesThatCannotBeOpenedOrWrittenAreNamed) {
     };
     for (const auto& [action, message] : cases)
         EXPECT_EQ(case_data::errorOf(action), message);
-    EXPECT_THROW(prep::readSampleFile(missing, image, {1023, 1}), std::runtime_error);
-    EXPECT_THROW(prep::writeSampleFile("/dev/full", set, image, {1023, 1}), std::runtime_error);
+    EXPECT_THROW(prep::readSampleFile(missing, image, one), std::runtime_error);
+    EXPECT_THROW(prep::writeSampleFile("/dev/full", set, image, one), std::runtime_error);
 }
 
 } // namespace
