@@ -8,12 +8,14 @@
 
 #include "image/bayer_image.h"
 #include "image/image_buffer.h"
+#include "tests/config/case_data.h"
 
 namespace prep_test {
 
+// A float image holding `samples` (or zeros), row by row, channel by channel.
 inline img::BayerImage makeImage(std::int32_t width, std::int32_t height,
                                  std::uint16_t channels = 1, std::uint32_t cfa1 = img::kCfaRggb,
-                                 std::uint16_t bits = 10) {
+                                 const std::vector<float>& samples = {}, std::uint16_t bits = 10) {
     int result = 0;
     img::BayerImage image;
     const bool raw = channels == 1;
@@ -21,22 +23,10 @@ inline img::BayerImage makeImage(std::int32_t width, std::int32_t height,
         width, height, bits, channels, 1, 0, cfa1, raw ? img::kPixelRaw : img::kPixelOther,
         raw ? img::kBufferRawCfa : img::kBufferInterleaved, img::kDataReal32, &result));
     EXPECT_EQ(result, 0);
+    const std::size_t count = static_cast<std::size_t>(width) * height * channels;
+    for (std::size_t i = 0; i < count; ++i)
+        image.pixels()[i] = samples.empty() ? 0.0f : samples[i % samples.size()];
     return image;
-}
-
-// Fills every sample with its index scaled into 0..1.
-inline void fillRamp(img::BayerImage& image) {
-    const std::size_t count =
-        static_cast<std::size_t>(image.width()) * image.height() * image.channels();
-    for (std::size_t i = 0; i < count; ++i)
-        image.pixels()[i] = static_cast<float>(i) / static_cast<float>(count);
-}
-
-inline void fill(img::BayerImage& image, float value) {
-    const std::size_t count =
-        static_cast<std::size_t>(image.width()) * image.height() * image.channels();
-    for (std::size_t i = 0; i < count; ++i)
-        image.pixels()[i] = value;
 }
 
 inline std::vector<float> samplesOf(const img::BayerImage& image) {
