@@ -1,0 +1,407 @@
+// Reading raw captures: fixed-header files, containers, NKRAW files and
+// headerless files of a layout given on the console.
+
+#include <cstring>
+
+#include <gtest/gtest.h>
+
+#include "image/byte_source.h"
+#include "image/image_result.h"
+#include "image/kqraw_container.h"
+#include "image/kqraw_fixed_header.h"
+#include "image/raw_prompt.h"
+#include "image/raw_reader.h"
+#include "raw_test_files.h"
+#include "tests/support/flat_field.h"
+#include "tests/support/temp_dir.h"
+
+namespace img {
+namespace {
+
+using rawtest::readBytes;
+using testing_support::KqRawBuilder;
+using Samples = std::vector<std::uint16_t>;
+
+std::string container(std::uint32_t w, std::uint32_t h, const Samples& s) {
+    return KqRawBuilder().header(w, h, 0x47524247).pixels(s).bytes();
+}
+
+std::string cut(std::string bytes, std::size_t count) {
+    bytes.resize(bytes.size() - count);
+    return bytes;
+}
+
+TEST(RawRead, EachKindOfFileGivesItsImageOrItsCode) {
+    const struct {
+        std::string bytes;
+        int rc;
+        std::uint32_t fileType = 0, cfa = 0;
+        std::uint16_t bits = 0;
+        Samples samples = {};
+    } cases[] = {
+        {rawtest::fixedHeaderFile(3, 2, {0, 1, 2, 3, 4, 700}),
+         0,
+         kFileKqRaw,
+         kCfaRggb,
+         10,
+         {0, 1, 2, 3, 4, 700}},
+        {cut(rawtest::fixedHeaderFile(2, 1, {5, 6}), 2), -21},
+        {rawtest::fixedHeaderFile(0xFFFFFFF0u, 0xFFFFFFF0u, {1}), -21},
+        {rawtest::fixedHeaderFile(0, 5, {}), -21},
+        {container(2, 2, {1, 2, 3, 4000}), 0, kFileKqRaw2, kCfaGrbg, 12, {1, 2, 3, 4000}},
+        {KqRawBuilder().header(2, 2, 0).comment("no pixels").bytes(), -21},
+        {container(2, 2, {1, 2, 3}), -21},
+        {container(0xFFFFFFF0u, 0xFFFFFFF0u, {1, 2, 3}), -21},
+        {container(0, 3, {}), -21},
+        {cut(container(2, 2, {1, 2, 3, 4}), 3), -21}, // not a prompt
+        {rawtest::nkrawFile(2, 2, {1, 2, 3, 2000}), 0, kFileNkRaw, kCfaGrbg, 11, {1, 2, 3, 2000}},
+        {rawtest::nkrawFile(2, 2, {1, 2, 3}), -22},
+        {rawtest::nkrawFile(2, 2, {1, 2, 3, 4, 5}), -22},
+        {"just some bytes", -4}, // no console to ask
+        {"", -4},
+    };
+    for (const auto& c : cases) {
+        int rc = 1;
+        const ImagePtr image = readBytes(c.bytes, &rc);
+        EXPECT_EQ(rc, c.rc) << c.bytes.size() << " bytes";
+        ASSERT_EQ(image != nullptr, c.rc == 0);
+        if (!image)
+            continue;
+        EXPECT_EQ(image->fileType, c.fileType);
+        EXPECT_EQ(image->cfa[1], c.cfa);
+        EXPECT_EQ(image->bitsPerSample, c.bits);
+        EXPECT_EQ(image->pixelType, kPixelRaw);
+        EXPECT_EQ(image->bufferType, kBufferRawCfa);
+        EXPECT_EQ(image->dataType, kDataUint16);
+        EXPECT_EQ(rawtest::samplesOf(image.get()), c.samples);
+        ASSERT_NE(image->rawHeader, nullptr); // the header travels with the image
+    }
+    int rc = 0;
+    ImagePtr fixed = readBytes(rawtest::fixedHeaderFile(1, 1, {1}), &rc);
+    EXPECT_EQ(kqrawFixedGet32(static_cast<const KqRawFixedHeader*>(fixed->rawHeader), 104),
+              0xDEADBEEFu);
+    ImagePtr nkraw = readBytes(rawtest::nkrawFile(1, 1, {1}), &rc);
+    EXPECT_EQ(std::memcmp(nkraw->rawHeader, "NKRAWHDR", 8), 0);
+    ImagePtr inContainer = readBytes(container(1, 1, {1}), &rc);
+    EXPECT_EQ(static_cast<const KqRawContainer*>(inContainer->rawHeader)->pixelIndex, 1);
+    EXPECT_EQ(rawRead("/nonexistent/dir/file.raw", &rc), nullptr);
+    EXPECT_EQ(rc, -1);
+}
+
+TEST(RawRead, FixedHeaderFileTwoBytesTooLongIsReadWithAWarning) {
+    int rc = 1;
+    testing::internal::CaptureStderr();
+    ImagePtr image = readBytes(rawtest::fixedHeaderFile(2, 1, {5, 6}) + "xx", &rc);
+    EXPECT_EQ(testing::internal::GetCapturedStderr(),
+              "WARNING: File 'test.raw' is too big for KQRAW.  Ignore extra data\n");
+    ASSERT_TRUE(image);
+    EXPECT_EQ(rawtest::samplesOf(image.get()), (Samples{5, 6}));
+}
+
+TEST(RawRead, DepthComesFromTheLargestSampleWithTenAsTheFloor) {
+    const std::pair<std::uint16_t, std::uint16_t> cases[] = {{0, 10},    {700, 10},  {1023, 10},
+                                                             {1024, 11}, {4000, 12}, {65535, 16}};
+    for (const auto& [largest, bits] : cases)
+        for (const std::string& bytes :
+             {container(2, 1, {3, largest}), rawtest::fixedHeaderFile(2, 1, {largest, 3})}) {
+            int rc = 0;
+            ImagePtr image = readBytes(bytes, &rc);
+            ASSERT_TRUE(image);
+            EXPECT_EQ(image->bitsPerSample, bits) << largest;
+            for (int ch = 0; ch < 4; ++ch) {
+                EXPECT_EQ(image->level[ch].whiteVal, static_cast<float>(1u << bits));
+                EXPECT_EQ(image->clip[ch].maxClip, static_cast<float>(1u << bits));
+                EXPECT_EQ(image->level[ch].blackVal, 0.0f);
+            }
+        }
+}
+
+RawLayout layout(std::uint32_t w, std::uint32_t h, std::uint32_t bits, std::uint64_t header = 0,
+                 std::uint32_t images = 1, bool little = true) {
+    RawLayout l;
+    l.width = w;
+    l.height = h;
+    l.bitDepth = bits;
+    l.cfa = kCfaBggr;
+    l.littleEndian = little;
+    l.images = images;
+    l.headerSize = header;
+    return l;
+}
+
+int fixedAnswer(void* context, RawLayout* l) {
+    *l = *static_cast<const RawLayout*>(context);
+    return 0;
+}
+
+int noAnswer(void*, RawLayout*) {
+    return kIoError;
+}
+
+TEST(RawRead, LayoutFromTheConsoleIsAskedForLastAndMustFitTheFile) {
+    const struct {
+        std::string bytes;
+        RawLayout layout;
+        int rc;
+        std::uint32_t pixelType = 0, dataType = 0;
+        std::uint16_t samplesPerPixel = 0;
+        Samples samples = {};
+    } cases[] = {
+        {"HDR\x01\x02\x03\x04",
+         layout(2, 1, 12, 3),
+         0,
+         kPixelRaw,
+         kDataUint16,
+         1,
+         {0x0201, 0x0403}},
+        {"HDR\x01\x02\x03\x04",
+         layout(2, 1, 12, 3, 1, false),
+         0,
+         kPixelRaw,
+         kDataUint16,
+         1,
+         {0x0102, 0x0304}},
+        {"abcd", layout(2, 2, 8), 0, kPixelRaw, kDataUint8, 1},
+        {std::string(12, 'x'), layout(2, 2, 8), 0, kPixelRgb, kDataUint8, 3},
+        {std::string(24, 'x'), layout(2, 1, 16, 0, 2), 0, kPixelRgb, kDataUint16, 3},
+        {std::string(5, 'x'), layout(2, 2, 8), -23},
+        {std::string(4, 'x'), layout(2, 2, 10), -23},   // 10 bits in a byte
+        {std::string(4, 'x'), layout(2, 2, 8, 9), -23}, // header larger than the file
+        {std::string(4, 'x'), layout(0, 2, 8), -23},
+        {std::string(4, 'x'), layout(0xFFFFFFFFu, 0xFFFFFFFFu, 8, 0, 0xFFFFFFFFu), -23},
+    };
+    for (const auto& c : cases) {
+        MemorySource source(reinterpret_cast<const std::uint8_t*>(c.bytes.data()), c.bytes.size());
+        int rc = 1;
+        ImagePtr image(rawReadSource(source, fixedAnswer, const_cast<RawLayout*>(&c.layout), &rc));
+        EXPECT_EQ(rc, c.rc) << c.bytes;
+        ASSERT_EQ(image != nullptr, c.rc == 0);
+        if (!image)
+            continue;
+        EXPECT_EQ(image->fileType, kFileFixRaw);
+        EXPECT_EQ(image->cfa[1], c.pixelType == kPixelRaw ? kCfaBggr : 0u);
+        EXPECT_EQ(image->pixelType, c.pixelType);
+        EXPECT_EQ(image->dataType, c.dataType);
+        EXPECT_EQ(image->samplesPerPixel, c.samplesPerPixel);
+        EXPECT_EQ(image->numberOfImages, c.layout.images);
+        if (!c.samples.empty()) {
+            EXPECT_EQ(rawtest::samplesOf(image.get()), c.samples);
+        }
+    }
+    const std::string bytes("\x10\x00\x20\x00", 4);
+    MemorySource source(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
+    int rc = 0;
+    EXPECT_FALSE(rawReadSource(source, noAnswer, nullptr, &rc));
+    EXPECT_EQ(rc, -2);
+}
+
+struct ContainerRelease {
+    void operator()(KqRawContainer* c) const noexcept { kqrawContainerRelease(c); }
+};
+using ContainerPtr = std::unique_ptr<KqRawContainer, ContainerRelease>;
+
+ContainerPtr parse(const std::string& bytes, int* rc) {
+    MemorySource source(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size(),
+                        "test.kqraw");
+    return ContainerPtr(kqrawContainerParse(source, rc));
+}
+
+KqRawBuilder minimal() {
+    return std::move(KqRawBuilder().header(2, 2, 0x52474742).pixels({1, 2, 3, 4}));
+}
+
+TEST(KqRawContainer, RefusesWhatItCannotHoldBeforeAllocating) {
+    std::string earlyMarker = rawtest::fixedHeaderFile(1000, 1000, {}, 1);
+    rawtest::putU32(earlyMarker, 298668, 0);
+    rawtest::putU32(earlyMarker, 200, 0xCAFEFEED); // pixels would follow at 204
+    std::string revision5 = earlyMarker;
+    rawtest::putU32(revision5, 4, 5); // not a fixed-header file at all
+    const std::pair<std::string, int> cases[] = {
+        {KqRawBuilder().pixels({1}).header(1, 1, 0).bytes(), -4},
+        {KqRawBuilder().block(kqtag::kFileHeader, std::string(36, '\0'), 40).bytes(), -4},
+        {minimal().block("OPAQUE__________", "abc", 0xFFFFFFF0u).bytes(), -21},
+        {cut(minimal().bytes(), 1), -21},
+        {KqRawBuilder().header(1, 1, 0).block(kqtag::kPixels, "1234567").bytes(), -21},
+        {KqRawBuilder().header(1, 1, 0).block(kqtag::kPixels, std::string(11, '\0')).bytes(), -21},
+        {earlyMarker, -21},
+        {revision5, -4}};
+    for (const auto& [bytes, expected] : cases) {
+        int rc = 0;
+        EXPECT_FALSE(parse(bytes, &rc));
+        EXPECT_EQ(rc, expected) << bytes.substr(0, 16);
+    }
+}
+
+TEST(KqRawContainer, ReadsBlocksInOrder) {
+    const float gains[4] = {1.0f, 2.0f, 3.0f, 4.0f};
+    int rc = 1;
+    // A trailing piece shorter than a block header is ignored; a second
+    // header block replaces the first in place.
+    ContainerPtr c = parse(minimal()
+                               .capture(33.0f, gains)
+                               .sensorInfo("a", "SN42", "c")
+                               .comment("hi")
+                               .header(7, 9, 0)
+                               .raw("xyz")
+                               .bytes(),
+                           &rc);
+    ASSERT_TRUE(c);
+    EXPECT_EQ(rc, 0);
+    EXPECT_EQ(c->count, 5);
+    EXPECT_EQ(c->headerIndex, 0);
+    EXPECT_EQ(c->pixelIndex, 1);
+    std::uint32_t width = 0;
+    kqrawBlockGet32(c->blocks[0], kqhdr::kWidth, &width);
+    EXPECT_EQ(width, 7u);
+    ASSERT_EQ(c->blocks[1]->sampleCount, 4u);
+    EXPECT_EQ(c->blocks[1]->samples[3], 4);
+    float exposure = 0;
+    EXPECT_TRUE(kqrawBlockGetFloat(c->blocks[2], kqcap::kExposureTime, &exposure));
+    EXPECT_EQ(exposure, 33.0f);
+    ASSERT_EQ(c->blocks[3]->form, KqRawForm::kSensorInfo);
+    EXPECT_EQ(c->blocks[3]->infoWord, 1u);
+    EXPECT_STREQ(c->blocks[3]->strings[1].text, "SN42");
+    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kComment), 4);
+    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kMakerNote), -1);
+}
+
+TEST(KqRawContainer, KeepsAHundredBlocksAndRoomForThePixels) {
+    KqRawBuilder builder = KqRawBuilder().header(1, 1, 0);
+    for (int i = 0; i < 120; ++i)
+        builder.comment("note " + std::to_string(i));
+    builder.pixels({9});
+    int rc = 0;
+    testing::internal::CaptureStderr();
+    ContainerPtr c = parse(builder.bytes(), &rc);
+    const std::string warnings = testing::internal::GetCapturedStderr();
+    ASSERT_TRUE(c);
+    EXPECT_EQ(c->count, 100);
+    EXPECT_STREQ(c->blocks[98]->strings[0].text, "note 97");
+    EXPECT_EQ(c->blocks[c->pixelIndex]->samples[0], 9);
+    EXPECT_EQ(warnings.substr(0, 110),
+              "WARNING: Raw container 'test.kqraw' holds more than 100 blocks; block "
+              "'COMMENT___120131' dropped.\nWARNING: Raw");
+}
+
+TEST(KqRawContainer, StringsBeyondThePayloadKeepTheBlockAsReadAndTailsAreCarried) {
+    const std::string badInfo = rawtest::u32(1) + rawtest::u32(2) + "ab" + rawtest::u32(50) + "x";
+    const std::string note = rawtest::u32(3) + "abc" + "PAD";
+    int rc = 0;
+    testing::internal::CaptureStderr();
+    ContainerPtr c = parse(
+        minimal().block(kqtag::kSensorInfo, badInfo).block(kqtag::kMakerNote, note).bytes(), &rc);
+    EXPECT_EQ(testing::internal::GetCapturedStderr(),
+              "WARNING: Raw container 'test.kqraw': the strings of block "
+              "'SENSORINFO120131' do not fit its size; block kept as read.\n");
+    ASSERT_TRUE(c);
+    EXPECT_EQ(c->blocks[2]->form, KqRawForm::kOpaque);
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(c->blocks[2]->payload), c->blocks[2]->size),
+              badInfo);
+    EXPECT_EQ(c->blocks[3]->form, KqRawForm::kText);
+    EXPECT_STREQ(c->blocks[3]->strings[0].text, "abc");
+    EXPECT_EQ(c->blocks[3]->tailSize, 3u);
+    EXPECT_EQ(c->blocks[3]->size, note.size());
+}
+
+TEST(KqRawContainer, ConvertsAFixedHeaderFileWhoseMarkerIsEarly) {
+    std::string bytes = rawtest::fixedHeaderFile(2, 1, {}, 1);
+    rawtest::putU32(bytes, 298668, 0);       // not at the end...
+    rawtest::putU32(bytes, 200, 0xCAFEFEED); // ...but here: pixels follow at 204
+    rawtest::putU32(bytes, 32, 33 * 65536);
+    rawtest::putU32(bytes, 36, 0x11223344);
+    rawtest::putU32(bytes, 40, 65536 / 2);
+    rawtest::putU32(bytes, 48, 0x55667788);
+    rawtest::putFloat(bytes, 68 + 8, 2.5f);
+    bytes.replace(204, 4, rawtest::samplesLE({700, 13}));
+    int rc = 1;
+    ContainerPtr c = parse(bytes, &rc);
+    ASSERT_TRUE(c);
+    EXPECT_EQ(rc, 0);
+    const KqRawBlock* pixels = c->blocks[c->pixelIndex];
+    EXPECT_EQ(Samples(pixels->samples, pixels->samples + pixels->sampleCount), (Samples{700, 13}));
+    const KqRawBlock* capture = c->blocks[kqrawContainerFind(c.get(), kqtag::kCapture)];
+    const std::pair<int, float> floats[] = {
+        {kqcap::kExposureTime, 33.0f}, {kqcap::kSecondValue, 0.5f}, {kqcap::kGain0 + 8, 2.5f}};
+    for (const auto& [at, expected] : floats) {
+        float value = 0;
+        ASSERT_TRUE(kqrawBlockGetFloat(capture, at, &value));
+        EXPECT_EQ(value, expected) << at;
+    }
+    const std::pair<const KqRawBlock*, std::pair<int, std::uint32_t>> words[] = {
+        {capture, {kqcap::kCarried1, 0x11223344u}},
+        {capture, {kqcap::kCarried2, 0x55667788u}},
+        {c->blocks[c->headerIndex], {kqhdr::kBayerCode, 0x52474742u}}};
+    for (const auto& [block, field] : words) {
+        std::uint32_t word = 0;
+        kqrawBlockGet32(block, field.first, &word);
+        EXPECT_EQ(word, field.second) << field.first;
+    }
+}
+
+TEST(KqRawContainer, ApiKeepsHeaderPixelsSizesAndTheBlockLimit) {
+    ContainerPtr c(kqrawContainerCreate());
+    testing_support::TempDir dir;
+    EXPECT_FALSE(kqrawContainerWrite(c.get(), dir.file("a").c_str())); // no header
+    KqRawBlock* header = kqrawBlockCreateHeader();
+    EXPECT_FALSE(kqrawContainerAdd(c.get(), header));
+    EXPECT_FALSE(kqrawContainerSetPixels(c.get(), header));
+    EXPECT_TRUE(kqrawContainerSetHeader(c.get(), header));
+    EXPECT_FALSE(kqrawContainerWrite(c.get(), dir.file("a").c_str())); // no pixels
+    EXPECT_FALSE(testing_support::fileExists(dir.file("a")));
+    EXPECT_EQ(kqrawContainerRead(dir.file("missing").c_str()), nullptr);
+    for (int i = 1; i < kKqRawMaxBlocks; ++i)
+        ASSERT_TRUE(kqrawContainerAdd(c.get(), kqrawBlockCreateComment("c")));
+    KqRawBlockPtr extra(kqrawBlockCreateComment("too many"));
+    EXPECT_FALSE(kqrawContainerAdd(c.get(), extra.get()));
+    EXPECT_EQ(kqrawContainerFindLast(c.get(), kqtag::kComment), kKqRawMaxBlocks - 1);
+
+    KqRawBlockPtr info(kqrawBlockCreateSensorInfo());
+    EXPECT_EQ(info->size, 4u + 3 * 4);
+    EXPECT_TRUE(kqrawBlockSetSerialNumber(info.get(), "0123abcd"));
+    EXPECT_EQ(info->size, 4u + 3 * 4 + 8);
+    EXPECT_TRUE(kqrawBlockSetSerialNumber(info.get(), nullptr));
+    EXPECT_STREQ(info->strings[1].text, "");
+    EXPECT_EQ(info->size, 4u + 3 * 4);
+    KqRawBlockPtr comment(kqrawBlockCreateComment("hello"));
+    EXPECT_EQ(comment->size, 9u);
+    EXPECT_FALSE(kqrawBlockSetString(comment.get(), 1, "no second string"));
+    KqRawBlockPtr capture(kqrawBlockCreateCapture());
+    std::uint32_t word = 0;
+    EXPECT_TRUE(kqrawBlockGet32(capture.get(), 0, &word));
+    EXPECT_EQ(word, 2u);
+    EXPECT_FALSE(kqrawBlockGet32(capture.get(), 53, &word));
+
+    // A new header records the system clock, past January 2038 too (64-bit time).
+    const auto before = static_cast<std::int64_t>(std::time(nullptr));
+    kqrawHeaderStamp(header);
+    std::uint32_t seconds = 0, microseconds = 0;
+    ASSERT_TRUE(kqrawBlockGet32(header, kqhdr::kSeconds, &seconds));
+    ASSERT_TRUE(kqrawBlockGet32(header, kqhdr::kMicroseconds, &microseconds));
+    EXPECT_GE(seconds, before);
+    EXPECT_LE(seconds, static_cast<std::int64_t>(std::time(nullptr)));
+    EXPECT_LT(microseconds, 1000000u);
+    EXPECT_GE(sizeof(std::time_t), 8u);
+}
+
+TEST(KqRawContainer, WritesEveryBlockBackWithReservedBytesAndOrder) {
+    const std::string bytes = KqRawBuilder()
+                                  .header(2, 1, 0x47425247)
+                                  .block("CAMSTATE__120118", "camera state", 12, "reserved-bytes!!")
+                                  .pixels({5, 6})
+                                  .sensorInfo("first", "serial", "third")
+                                  .block("SOMETHINGNEW0001", std::string("\0\1\2", 3))
+                                  .comment("")
+                                  .bytes();
+    int rc = 0;
+    ContainerPtr c = parse(bytes, &rc);
+    ASSERT_TRUE(c);
+    testing_support::TempDir dir;
+    ASSERT_TRUE(kqrawContainerWrite(c.get(), dir.file("out.kqraw").c_str()));
+    EXPECT_EQ(testing_support::readFile(dir.file("out.kqraw")), bytes);
+    ContainerPtr again(kqrawContainerRead(dir.file("out.kqraw").c_str()));
+    ASSERT_TRUE(again);
+    EXPECT_EQ(again->count, 6);
+}
+
+} // namespace
+} // namespace img
