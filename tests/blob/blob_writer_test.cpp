@@ -12,6 +12,7 @@
 #include "blob/blob_dump.h"
 #include "blob/blob_parser.h"
 #include "blob/blob_writer.h"
+#include "blob/md5.h"
 #include "config/config_file.h"
 #include "golden_file.h"
 
@@ -144,6 +145,20 @@ TEST(BlobWriter, SizeLimits) {
                                           "hold.");
     EXPECT_EQ(outcome(focusSets(32, 255)), // about 66 KB
               "Binary calibration data too large: block offsets must stay below 64 KiB.");
+    // Blocks together cannot be larger than the blob: a table naming one large
+    // focus block twice would build a huge tree from a small one.
+    Bytes twice = generate(focusSets(1, 255));
+    EXPECT_NE(dumpOf(twice).find("FDN_dist_pair[254] = { 1, 2 };"), std::string::npos);
+    const std::uint8_t focusEntry[] = {0x00, 0x30, twice[14], twice[15]};
+    std::copy(focusEntry, focusEntry + 4, twice.begin() + 8); // over the tool entry
+    const Md5Digest digest = md5(twice.data(), twice.size() - 16);
+    std::copy(digest.begin(), digest.end(), twice.end() - 16);
+    EXPECT_THROW(
+        try { dumpOf(twice); } catch (const std::runtime_error& e) {
+            EXPECT_STREQ(e.what(), "Binary calibration data is corrupt.");
+            throw;
+        },
+        std::runtime_error);
 }
 
 } // namespace
