@@ -1,9 +1,11 @@
 // The pieces the blob is made of: value codes, bit packing, big-endian bytes,
 // the digest, date texts and configuration values checked for their fields.
 
+#include <cstdio>
 #include <cstdlib>
 #include <ctime>
 #include <limits>
+#include <sstream>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -15,83 +17,109 @@
 #include "blob/md5.h"
 #include "blob/utc_date_text.h"
 #include "blob/value_code.h"
+#include "golden_file.h"
 
 namespace blob {
 namespace {
 
 using Bytes = std::vector<std::uint8_t>;
 
-ValueFormat format(unsigned intBits, unsigned fracBits) {
-    ValueFormat f;
-    f.intBits = intBits;
-    f.fracBits = fracBits;
-    return f;
-}
-
-TEST(ValueFormatText, ReadsAndWritesFormats) {
-    const struct {
-        const char* text;
-        unsigned intBits, fracBits;
-        const char* written;
-    } cases[] = {{"s3.8", 3, 8, "s3.8"},
-                 {"u7.8", 7, 8, "s7.8"},
-                 {"s3.", 3, 0, "s3.0"},
-                 {"s.8", 0, 8, "s0.8"},
-                 {"s", 0, 0, "s0.0"},
-                 {"u.", 0, 0, "s0.0"},
-                 {"s99999999999999999999.1", 65535, 1, "s65535.1"}}; // saturates, no wrap
-    for (const auto& c : cases) {
-        const ValueFormat f = parseValueFormat(c.text);
-        EXPECT_EQ(f.intBits, c.intBits) << c.text;
-        EXPECT_EQ(f.fracBits, c.fracBits) << c.text;
-        EXPECT_EQ(f.codeBits(), c.intBits + c.fracBits + 1) << c.text;
-        EXPECT_EQ(valueFormatText(f), c.written);
-    }
-    for (const char* text :
-         {"x3.8", "s3.8a", "s38", "", "S3.8", "s3.8.1", "s-3.8", "s3,8", " s3.8"}) {
-        try {
-            parseValueFormat(text);
-            ADD_FAILURE() << text << " was accepted";
-        } catch (const std::invalid_argument& e) {
-            EXPECT_STREQ(e.what(), "invalid float encoding format") << text;
+// What one row of tests/data/blob/codec_cases.txt gives: its kind, then the
+// fields after it; the last field of the row is the expected text.
+std::string result(config::config_node& config, const std::vector<std::string>& f) {
+    static const char kHex[] = "0123456789abcdef";
+    const std::string& kind = f[0];
+    std::string text;
+    try {
+        if (kind == "format") {
+            const ValueFormat v = parseValueFormat(f[1]);
+            return std::to_string(v.intBits) + "." + std::to_string(v.fracBits) + " " +
+                   std::to_string(v.codeBits()) + " " + valueFormatText(v);
         }
+        if (kind == "encode") {
+            char code[16];
+            std::snprintf(code, sizeof code, "%#x",
+                          encodeValue(std::stod(f[1]), parseValueFormat(f[2])));
+            return code;
+        }
+        if (kind == "decode" || kind == "range") {
+            const ValueFormat v = parseValueFormat(f[2]);
+            char value[64];
+            if (kind == "decode")
+                std::snprintf(
+                    value, sizeof value, "%.25g",
+                    decodeValue(static_cast<std::uint32_t>(std::stoul(f[1], nullptr, 16)), v));
+            else
+                std::snprintf(value, sizeof value, "%.25g %.25g", valueFormatMaximum(v),
+                              valueFormatStep(v));
+            return value;
+        }
+        if (kind == "date")
+            return utcDateText(std::stoll(f[1])).value_or("(none)");
+        if (kind == "md5") {
+            for (std::uint8_t byte :
+                 md5(reinterpret_cast<const std::uint8_t*>(f[1].data()), f[1].size()))
+                text += std::string{kHex[byte >> 4], kHex[byte & 15]};
+            return text;
+        }
+        config::config_node& node = config.child_path(f[1]);
+        node.set(f[2]);
+        if (kind == "serial") {
+            for (std::uint8_t byte : serialBytes(config, node))
+                text += std::string{kHex[byte >> 4], kHex[byte & 15]};
+            return "x" + text;
+        }
+        if (kind == "posture")
+            return std::string("'") + postureCharacter(config, node);
+        return "#" + std::to_string(fieldValue(config, node, std::stoll(f[3]), std::stoll(f[4])));
+    } catch (const std::exception& e) {
+        return e.what();
     }
-    EXPECT_DOUBLE_EQ(valueFormatMaximum(format(3, 8)), 7.99609375);
-    EXPECT_DOUBLE_EQ(valueFormatMaximum(format(7, 8)), 127.99609375);
-    EXPECT_DOUBLE_EQ(valueFormatMaximum(format(0, 0)), 0.0);
-    EXPECT_DOUBLE_EQ(valueFormatStep(format(3, 8)), 1.0 / 256);
-    EXPECT_DOUBLE_EQ(valueFormatStep(format(3, 0)), 1.0);
 }
 
-TEST(ValueCode, EncodesSignAndMagnitude) {
-    const double nan = std::numeric_limits<double>::quiet_NaN();
-    const double inf = std::numeric_limits<double>::infinity();
-    const struct {
-        double value;
-        unsigned intBits, fracBits;
-        std::uint32_t code;
-    } cases[] = {{1.5, 3, 8, 0x180},
-                 {-1.5, 3, 8, 0x980},
-                 {0.0, 3, 8, 0},
-                 {7.99609375, 3, 8, 0x7FF},
-                 {-7.99609375, 3, 8, 0xFFF},
-                 {0.9990, 3, 8, 0x100}, // carries
-                 {0.7, 3, 0, 0x1},
-                 {0.125, 3, 2, 0x0},
-                 {0.375, 3, 2, 0x1}, // ties go down
-                 {0.376, 3, 2, 0x2},
-                 {-0.375, 3, 2, 0x21},
-                 {-0.001, 3, 8, 0x800}, // -0 kept
-                 {nan, 3, 8, 0},
-                 {inf, 3, 8, 0},
-                 {-(32768.0 - 1.0 / 65536), 15, 16, 0xFFFFFFFF}};
-    for (const auto& c : cases)
-        EXPECT_EQ(encodeValue(c.value, format(c.intBits, c.fracBits)), c.code) << c.value;
-    EXPECT_DOUBLE_EQ(decodeValue(0xFFFFFFFFu, format(15, 16)), -(32768.0 - 1.0 / 65536));
-    EXPECT_DOUBLE_EQ(decodeValue(0x00018000u, format(15, 16)), 1.5);
-    const ValueFormat f = format(3, 8);
-    for (std::uint32_t code = 0; code < (1u << f.codeBits()); ++code) // -0 codes as itself too
+TEST(BlobCodec, CasesGiveTheirResults) {
+    setenv("TZ", "Asia/Kolkata", 1); // dates are UTC whatever the time zone
+    tzset();
+    config::config_node_impl root{"root"};
+    std::istringstream rows(
+        testing_support::readFile(testing_support::dataPath("blob/codec_cases.txt")));
+    int count = 0;
+    for (std::string row; std::getline(rows, row);) {
+        if (row.empty() || row[0] == '#')
+            continue;
+        std::vector<std::string> fields;
+        for (std::size_t at = 0, bar;; at = bar + 1) {
+            bar = row.find('|', at);
+            fields.push_back(row.substr(at, bar - at));
+            if (bar == std::string::npos)
+                break;
+        }
+        EXPECT_EQ(result(root.child("config"), fields), fields.back()) << row;
+        ++count;
+    }
+    EXPECT_GT(count, 80);
+    unsetenv("TZ");
+    tzset();
+}
+
+TEST(BlobCodec, EveryCodeDecodesToAValueThatCodesTheSame) {
+    const ValueFormat f = parseValueFormat("s3.8");
+    for (std::uint32_t code = 0; code < (1u << f.codeBits()); ++code) // -0 too
         ASSERT_EQ(encodeValue(decodeValue(code, f), f), code) << decodeValue(code, f);
+    EXPECT_EQ(encodeValue(std::numeric_limits<double>::quiet_NaN(), f), 0u);
+    EXPECT_EQ(md5(nullptr, 0), md5(reinterpret_cast<const std::uint8_t*>(""), 0));
+    const std::int64_t min = std::numeric_limits<std::int64_t>::min();
+    EXPECT_FALSE(utcDateText(min).has_value());
+    EXPECT_FALSE(utcDateText(-(min + 1)).has_value());
+    config::config_node_impl root{"root"};
+    config::config_node& config = root.child("config");
+    config::config_node& serial = config.child_path("module.serial_no");
+    serial.set(std::string(2 * 65533, 'a')); // the longest the tracking block holds
+    EXPECT_EQ(serialBytes(config, serial).size(), 65533u);
+    serial.set(std::string(2 * 65534, 'a'));
+    EXPECT_THROW(serialBytes(config, serial), std::runtime_error);
+    EXPECT_THROW(fieldValue(config, config.find("reference").find("R"), 0, 65535),
+                 std::invalid_argument);
 }
 
 TEST(BitPacking, PacksMostSignificantBitFirstAndUnpacksEveryWidth) {
@@ -155,131 +183,6 @@ TEST(ByteIo, BigEndianBothWaysAndOverrunsFailForGood) {
     EXPECT_FALSE(rangeInside(17, 0, 16));
     EXPECT_FALSE(rangeInside(8, max, 16));
     EXPECT_FALSE(rangeInside(max, 2, 16));
-}
-
-TEST(Md5, MatchesTheReferenceVectors) {
-    const std::pair<std::string, std::string> vectors[] = {
-        {"", "d41d8cd98f00b204e9800998ecf8427e"},
-        {"a", "0cc175b9c0f1b6a831c399e269772661"},
-        {"abc", "900150983cd24fb0d6963f7d28e17f72"},
-        {"message digest", "f96b697d7cb7938d525a2f31aaf161d0"},
-        {"abcdefghijklmnopqrstuvwxyz", "c3fcd3d76192e4007dfb496cca67e13b"},
-        {"ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789",
-         "d174ab98d277d9f5a5611c2c9f419d9f"},
-        {"12345678901234567890123456789012345678901234567890123456789012345678901234567890",
-         "57edf4a22be3c955ac49da2e2107b67a"}};
-    for (const auto& [text, hex] : vectors) {
-        const Md5Digest digest =
-            md5(reinterpret_cast<const std::uint8_t*>(text.data()), text.size());
-        std::string written;
-        for (std::uint8_t byte : digest)
-            written +=
-                "0123456789abcdef"[byte >> 4] + std::string(1, "0123456789abcdef"[byte & 15]);
-        EXPECT_EQ(written, hex) << text;
-    }
-    EXPECT_EQ(md5(nullptr, 0), md5(reinterpret_cast<const std::uint8_t*>(""), 0));
-}
-
-TEST(UtcDateText, FourDigitYearsToTheMinuteWhateverTheTimeZone) {
-    setenv("TZ", "Asia/Kolkata", 1); // restored below
-    tzset();
-    const std::int64_t min = std::numeric_limits<std::int64_t>::min();
-    const std::pair<std::int64_t, const char*> cases[] = {{0, "1970-01-01T00:00"},
-                                                          {1335868200, "2012-05-01T10:30"},
-                                                          {1335868259, "2012-05-01T10:30"},
-                                                          {951782400, "2000-02-29T00:00"},
-                                                          {2147483647, "2038-01-19T03:14"},
-                                                          {4102444800, "2100-01-01T00:00"},
-                                                          {-1, "1969-12-31T23:59"},
-                                                          {-2208988800, "1900-01-01T00:00"},
-                                                          {-62167219200, "0000-01-01T00:00"},
-                                                          {253402300799, "9999-12-31T23:59"},
-                                                          {-62167219201, ""},
-                                                          {253402300800, ""},
-                                                          {min, ""},
-                                                          {-(min + 1), ""}};
-    for (const auto& [seconds, text] : cases)
-        EXPECT_EQ(utcDateText(seconds).value_or(""), text) << seconds;
-    unsetenv("TZ");
-    tzset();
-}
-
-TEST(FieldValues, WholeNumbersSerialsAndPosturesFitTheirFields) {
-    config::config_node_impl root{"root"};
-    config::config_node& config = root.child("config");
-    // path, text, what reading it gives ("#" + number, "x" + serial bytes, "'" + posture or the
-    // message)
-    const struct {
-        const char* path;
-        std::string text;
-        std::string expected;
-    } cases[] = {
-        {"af.macro", "4294967295", "#4294967295"},
-        {"af.macro", "-1",
-         "Value for af.macro does not fit in the binary calibration data, value must be between 0 "
-         "and 4294967295."},
-        {"af.macro", "99999999999999999999999",
-         "Value for af.macro does not fit in the binary calibration data, value must be between 0 "
-         "and 4294967295."},
-        {"af.macro", "+7", "#7"},
-        {"light", "-1", "#-1"},
-        {"R", "1.5", "Value for R is not a whole number."},
-        {"R", "", "Value for R is not a whole number."},
-        {"R", "-", "Value for R is not a whole number."},
-        {"R", "12a", "Value for R is not a whole number."},
-        {"R", " 1", "Value for R is not a whole number."},
-        {"R", "0x10", "Value for R is not a whole number."},
-        {"serial_no", "0a1B", "x0a1b"},
-        {"serial_no", "\"ff00\"", "xff00"},
-        {"serial_no", "\"\"", "x"},
-        {"serial_no", "", "x"},
-        {"serial_no", std::string(2 * 65533, 'a'), "x" + std::string(2 * 65533, 'a')},
-        {"serial_no", std::string(2 * 65534, 'a'),
-         "Value for serial_no is too long for the binary calibration data."},
-        {"serial_no", "0a1",
-         "Value for serial_no is not a valid serial number, it must be an even number of "
-         "hexadecimal digits."},
-        {"serial_no", "0g",
-         "Value for serial_no is not a valid serial number, it must be an even number of "
-         "hexadecimal digits."},
-        {"serial_no", "\"12 34\"",
-         "Value for serial_no is not a valid serial number, it must be an even number of "
-         "hexadecimal digits."},
-        {"serial_no", "\"",
-         "Value for serial_no is not a valid serial number, it must be an even number of "
-         "hexadecimal digits."},
-        {"serial_no", "-1",
-         "Value for serial_no is not a valid serial number, it must be an even number of "
-         "hexadecimal digits."},
-        {"posture", "'H'", "'H"},
-        {"posture", "V", "'V"},
-        {"posture", "' '", "' "},
-        {"posture", "", "Value for posture is empty, a posture character is needed."},
-        {"posture", "Up", "Value for posture must be a single posture character."},
-    };
-    const std::string hex = "0123456789abcdef";
-    for (const auto& c : cases) {
-        config::config_node& node = config.child_path(c.path);
-        node.set(c.text);
-        std::string result;
-        try {
-            if (std::string(c.path) == "serial_no") {
-                result = "x";
-                for (std::uint8_t byte : serialBytes(config, node))
-                    result += std::string(1, hex[byte >> 4]) + hex[byte & 15];
-            } else if (std::string(c.path) == "posture") {
-                result = std::string("'") + postureCharacter(config, node);
-            } else {
-                result = "#" + std::to_string(fieldValue(config, node, c.path[0] == 'l' ? -1 : 0,
-                                                         c.path[0] == 'R' ? 65535 : 4294967295));
-            }
-        } catch (const std::runtime_error& e) {
-            result = e.what();
-        }
-        EXPECT_EQ(result, c.expected) << c.path << " = " << c.text.substr(0, 20);
-    }
-    EXPECT_THROW(fieldValue(config, config.find("reference").find("R"), 0, 65535),
-                 std::invalid_argument);
 }
 
 } // namespace
