@@ -1,6 +1,7 @@
 // Reading raw captures: fixed-header files, containers, NKRAW files and
 // headerless files of a layout given on the console.
 
+#include <cstdio>
 #include <cstring>
 
 #include <gtest/gtest.h>
@@ -12,6 +13,7 @@
 #include "image/raw_prompt.h"
 #include "image/raw_reader.h"
 #include "raw_test_files.h"
+#include "tests/blob/golden_file.h"
 #include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 
@@ -232,110 +234,84 @@ TEST(KqRawContainer, RefusesWhatItCannotHoldBeforeAllocating) {
     }
 }
 
-TEST(KqRawContainer, ReadsBlocksInOrder) {
-    const float gains[4] = {1.0f, 2.0f, 3.0f, 4.0f};
+// A parsed container as text, one line a block: tag, form, payload size, then
+// the samples, the strings and the size of the tail behind them, or the
+// payload bytes in hex (the header's creation time as dots); the warnings follow.
+std::string describe(const std::string& bytes) {
     int rc = 1;
-    // A trailing piece shorter than a block header is ignored; a second
-    // header block replaces the first in place.
-    ContainerPtr c = parse(minimal()
-                               .capture(33.0f, gains)
-                               .sensorInfo("a", "SN42", "c")
-                               .comment("hi")
-                               .header(7, 9, 0)
-                               .raw("xyz")
-                               .bytes(),
-                           &rc);
-    ASSERT_TRUE(c);
-    EXPECT_EQ(rc, 0);
-    EXPECT_EQ(c->count, 5);
-    EXPECT_EQ(c->headerIndex, 0);
-    EXPECT_EQ(c->pixelIndex, 1);
-    std::uint32_t width = 0;
-    kqrawBlockGet32(c->blocks[0], kqhdr::kWidth, &width);
-    EXPECT_EQ(width, 7u);
-    ASSERT_EQ(c->blocks[1]->sampleCount, 4u);
-    EXPECT_EQ(c->blocks[1]->samples[3], 4);
-    float exposure = 0;
-    EXPECT_TRUE(kqrawBlockGetFloat(c->blocks[2], kqcap::kExposureTime, &exposure));
-    EXPECT_EQ(exposure, 33.0f);
-    ASSERT_EQ(c->blocks[3]->form, KqRawForm::kSensorInfo);
-    EXPECT_EQ(c->blocks[3]->infoWord, 1u);
-    EXPECT_STREQ(c->blocks[3]->strings[1].text, "SN42");
-    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kComment), 4);
-    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kMakerNote), -1);
-}
-
-TEST(KqRawContainer, KeepsAHundredBlocksAndRoomForThePixels) {
-    KqRawBuilder builder = KqRawBuilder().header(1, 1, 0);
-    for (int i = 0; i < 120; ++i)
-        builder.comment("note " + std::to_string(i));
-    builder.pixels({9});
-    int rc = 0;
     testing::internal::CaptureStderr();
-    ContainerPtr c = parse(builder.bytes(), &rc);
-    const std::string warnings = testing::internal::GetCapturedStderr();
-    ASSERT_TRUE(c);
-    EXPECT_EQ(c->count, 100);
-    EXPECT_STREQ(c->blocks[98]->strings[0].text, "note 97");
-    EXPECT_EQ(c->blocks[c->pixelIndex]->samples[0], 9);
-    EXPECT_EQ(warnings.substr(0, 110),
-              "WARNING: Raw container 'test.kqraw' holds more than 100 blocks; block "
-              "'COMMENT___120131' dropped.\nWARNING: Raw");
-}
-
-TEST(KqRawContainer, StringsBeyondThePayloadKeepTheBlockAsReadAndTailsAreCarried) {
-    const std::string badInfo = rawtest::u32(1) + rawtest::u32(2) + "ab" + rawtest::u32(50) + "x";
-    const std::string note = rawtest::u32(3) + "abc" + "PAD";
-    int rc = 0;
-    testing::internal::CaptureStderr();
-    ContainerPtr c = parse(
-        minimal().block(kqtag::kSensorInfo, badInfo).block(kqtag::kMakerNote, note).bytes(), &rc);
-    EXPECT_EQ(testing::internal::GetCapturedStderr(),
-              "WARNING: Raw container 'test.kqraw': the strings of block "
-              "'SENSORINFO120131' do not fit its size; block kept as read.\n");
-    ASSERT_TRUE(c);
-    EXPECT_EQ(c->blocks[2]->form, KqRawForm::kOpaque);
-    EXPECT_EQ(std::string(reinterpret_cast<const char*>(c->blocks[2]->payload), c->blocks[2]->size),
-              badInfo);
-    EXPECT_EQ(c->blocks[3]->form, KqRawForm::kText);
-    EXPECT_STREQ(c->blocks[3]->strings[0].text, "abc");
-    EXPECT_EQ(c->blocks[3]->tailSize, 3u);
-    EXPECT_EQ(c->blocks[3]->size, note.size());
-}
-
-TEST(KqRawContainer, ConvertsAFixedHeaderFileWhoseMarkerIsEarly) {
-    std::string bytes = rawtest::fixedHeaderFile(2, 1, {}, 1);
-    rawtest::putU32(bytes, 298668, 0);       // not at the end...
-    rawtest::putU32(bytes, 200, 0xCAFEFEED); // ...but here: pixels follow at 204
-    rawtest::putU32(bytes, 32, 33 * 65536);
-    rawtest::putU32(bytes, 36, 0x11223344);
-    rawtest::putU32(bytes, 40, 65536 / 2);
-    rawtest::putU32(bytes, 48, 0x55667788);
-    rawtest::putFloat(bytes, 68 + 8, 2.5f);
-    bytes.replace(204, 4, rawtest::samplesLE({700, 13}));
-    int rc = 1;
     ContainerPtr c = parse(bytes, &rc);
-    ASSERT_TRUE(c);
-    EXPECT_EQ(rc, 0);
-    const KqRawBlock* pixels = c->blocks[c->pixelIndex];
-    EXPECT_EQ(Samples(pixels->samples, pixels->samples + pixels->sampleCount), (Samples{700, 13}));
-    const KqRawBlock* capture = c->blocks[kqrawContainerFind(c.get(), kqtag::kCapture)];
-    const std::pair<int, float> floats[] = {
-        {kqcap::kExposureTime, 33.0f}, {kqcap::kSecondValue, 0.5f}, {kqcap::kGain0 + 8, 2.5f}};
-    for (const auto& [at, expected] : floats) {
-        float value = 0;
-        ASSERT_TRUE(kqrawBlockGetFloat(capture, at, &value));
-        EXPECT_EQ(value, expected) << at;
+    const std::string warnings = testing::internal::GetCapturedStderr();
+    if (!c)
+        return "refused with " + std::to_string(rc) + "\n" + warnings;
+    std::string text = "header " + std::to_string(c->headerIndex) + ", pixels " +
+                       std::to_string(c->pixelIndex) + "\n";
+    for (int i = 0; i < c->count; ++i) {
+        const KqRawBlock* b = c->blocks[i];
+        text += std::string(reinterpret_cast<const char*>(b->tag), 16) + " form " +
+                std::to_string(static_cast<int>(b->form)) + " size " + std::to_string(b->size);
+        for (std::uint64_t n = 0; n < b->sampleCount && b->form == KqRawForm::kPixels; ++n)
+            text += " " + std::to_string(b->samples[n]);
+        const int strings = b->form == KqRawForm::kSensorInfo ? 3 : b->form == KqRawForm::kText;
+        if (b->form == KqRawForm::kSensorInfo)
+            text += " info " + std::to_string(b->infoWord);
+        for (int k = 0; k < strings; ++k)
+            text += " '" + std::string(b->strings[k].text) + "'";
+        if (strings)
+            text += " tail " + std::to_string(b->tailSize);
+        for (std::uint32_t n = 0; n < b->size && b->form == KqRawForm::kOpaque; ++n) {
+            char hex[4];
+            const bool stamp =
+                i == c->headerIndex && n >= kqhdr::kSeconds && n < kqhdr::kSeconds + 8;
+            std::snprintf(hex, sizeof hex, stamp ? "%s.." : "%s%02x", n % 4 ? "" : " ",
+                          b->payload[n]);
+            text += hex;
+        }
+        text += "\n";
     }
-    const std::pair<const KqRawBlock*, std::pair<int, std::uint32_t>> words[] = {
-        {capture, {kqcap::kCarried1, 0x11223344u}},
-        {capture, {kqcap::kCarried2, 0x55667788u}},
-        {c->blocks[c->headerIndex], {kqhdr::kBayerCode, 0x52474742u}}};
-    for (const auto& [block, field] : words) {
-        std::uint32_t word = 0;
-        kqrawBlockGet32(block, field.first, &word);
-        EXPECT_EQ(word, field.second) << field.first;
-    }
+    return text + warnings;
+}
+
+TEST(KqRawContainer, ParsedBlocksAreGoldenFiles) {
+    const float gains[4] = {1.0f, 2.0f, 3.0f, 4.0f};
+    KqRawBuilder many = KqRawBuilder().header(1, 1, 0);
+    for (int i = 0; i < 120; ++i)
+        many.comment("note " + std::to_string(i));
+    many.pixels({9}); // room is kept for the pixels after the hundredth block
+    std::string earlyMarker = rawtest::fixedHeaderFile(2, 1, {}, 1);
+    rawtest::putU32(earlyMarker, 298668, 0);       // not at the end...
+    rawtest::putU32(earlyMarker, 200, 0xCAFEFEED); // ...but here: pixels follow at 204
+    const std::pair<std::size_t, std::uint32_t> fields[] = {
+        {32, 33 * 65536}, {36, 0x11223344}, {40, 65536 / 2}, {48, 0x55667788}, {76, 0x40200000}};
+    for (const auto& [at, value] : fields)
+        rawtest::putU32(earlyMarker, at, value);
+    earlyMarker.replace(204, 4, rawtest::samplesLE({700, 13}));
+    const std::pair<const char*, std::string> cases[] = {
+        // A trailing piece shorter than a block header is ignored; a second
+        // header block replaces the first in place.
+        {"in_order", minimal()
+                         .capture(33.0f, gains)
+                         .sensorInfo("a", "SN42", "c")
+                         .comment("hi")
+                         .header(7, 9, 0)
+                         .raw("xyz")
+                         .bytes()},
+        {"hundred_blocks", many.bytes()},
+        {"strings_beyond_the_payload",
+         minimal()
+             .block(kqtag::kSensorInfo,
+                    rawtest::u32(1) + rawtest::u32(2) + "ab" + rawtest::u32(50) + "x")
+             .block(kqtag::kMakerNote, rawtest::u32(3) + "abc" + "PAD")
+             .bytes()},
+        {"fixed_header_marker_early", earlyMarker},
+    };
+    for (const auto& [name, bytes] : cases)
+        testing_support::expectGolden(std::string("image/container/") + name + ".txt",
+                                      describe(bytes));
+    int rc = 0;
+    ContainerPtr c = parse(minimal().comment("hi").bytes(), &rc);
+    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kComment), 2);
+    EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kMakerNote), -1);
 }
 
 TEST(KqRawContainer, ApiKeepsHeaderPixelsSizesAndTheBlockLimit) {
