@@ -143,6 +143,7 @@ TEST_F(BayerImageTest, HeaderlessDetailsGoIntoAContainerOrAFixedHeader) {
     BayerImage fixed;
     fixed.createFromHeaderless(1, 1, 10, kCfaRggb, 40.0f, 2.0f, "0123456789abcdef0123456789ABCDEF",
                                "0x1122334455667788", true);
+    fixed.pixels()[0] = 0.5f; // 512 of 1023
     EXPECT_EQ(fixed.serialNumber(32), "0123456789abcdef0123456789abcdef");
     testing_support::expectGolden("image/bayer/headerless.kqraw", store(fixed));
     fixed.setSensorGuid("abc");
