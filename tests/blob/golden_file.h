@@ -3,6 +3,7 @@
 // holds it; LSC_GOLDEN_UPDATE=1 rewrites the file from the current build
 // instead (every diff of a golden file is reviewed before it is committed).
 
+#include <cstdio>
 #include <cstdlib>
 #include <string>
 
@@ -16,7 +17,31 @@ inline std::string dataPath(const std::string& name) {
     return std::string(LSC_SOURCE_DIR) + "/tests/data/" + name;
 }
 
-inline void expectGolden(const std::string& name, const std::string& actual) {
+// A large output (a fixed-header raw file is ~300 KB, nearly all zeros) is
+// kept as its size and the hex of its 16-byte rows that are not all zero.
+inline std::string sparseHex(const std::string& bytes) {
+    std::string text = std::to_string(bytes.size()) + " bytes, rows not all zero:\n";
+    for (std::size_t row = 0; row < bytes.size(); row += 16) {
+        const std::string part = bytes.substr(row, 16);
+        if (part.find_first_not_of('\0') == std::string::npos)
+            continue;
+        char hex[24];
+        std::snprintf(hex, sizeof hex, "%08zx:", row);
+        text += hex;
+        for (const char c : part) {
+            std::snprintf(hex, sizeof hex, " %02x", static_cast<unsigned char>(c));
+            text += hex;
+        }
+        text += "\n";
+    }
+    return text;
+}
+
+inline void expectGolden(std::string name, std::string actual) {
+    if (actual.size() > 65536) {
+        name += ".hex";
+        actual = sparseHex(actual);
+    }
     const char* update = std::getenv("LSC_GOLDEN_UPDATE");
     if (update && std::string(update) == "1")
         return writeFile(dataPath(name), actual);
