@@ -1,6 +1,7 @@
 // Reading raw captures: fixed-header files, containers, NKRAW files and
 // headerless files of a layout given on the console.
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 
@@ -33,51 +34,51 @@ std::string cut(std::string bytes, std::size_t count) {
     return bytes;
 }
 
+// What a read gives, as one line: the code, then the image's kinds, depth,
+// Bayer code and samples (the first eight).
+std::string described(int rc, const ImageBuffer* image) {
+    std::string text = "rc " + std::to_string(rc);
+    if (!image)
+        return text + ", no image\n";
+    text += std::string(", ") + fileTypeName(image->fileType) + " " +
+            pixelTypeName(image->pixelType) + " " + bufferTypeName(image->bufferType) + " " +
+            dataTypeName(image->dataType) + " x" + std::to_string(image->samplesPerPixel) + " " +
+            std::to_string(image->numberOfImages) + " images " +
+            std::to_string(image->bitsPerSample) + " bits " + cfaPatternName(image->cfa[1]) +
+            (image->rawHeader ? " header" : "") + ":";
+    if (image->dataType == kDataUint8 || image->dataType == kDataUint16)
+        for (std::uint64_t i = 0; i < std::min<std::uint64_t>(8, imageTotalSamples(image, -1)); ++i)
+            text += " " + std::to_string(image->dataType == kDataUint8
+                                             ? static_cast<const std::uint8_t*>(image->data)[i]
+                                             : static_cast<const std::uint16_t*>(image->data)[i]);
+    return text + "\n";
+}
+
 TEST(RawRead, EachKindOfFileGivesItsImageOrItsCode) {
-    const struct {
-        std::string bytes;
-        int rc;
-        std::uint32_t fileType = 0, cfa = 0;
-        std::uint16_t bits = 0;
-        Samples samples = {};
-    } cases[] = {
-        {rawtest::fixedHeaderFile(3, 2, {0, 1, 2, 3, 4, 700}),
-         0,
-         kFileKqRaw,
-         kCfaRggb,
-         10,
-         {0, 1, 2, 3, 4, 700}},
-        {cut(rawtest::fixedHeaderFile(2, 1, {5, 6}), 2), -21},
-        {rawtest::fixedHeaderFile(0xFFFFFFF0u, 0xFFFFFFF0u, {1}), -21},
-        {rawtest::fixedHeaderFile(0, 5, {}), -21},
-        {container(2, 2, {1, 2, 3, 4000}), 0, kFileKqRaw2, kCfaGrbg, 12, {1, 2, 3, 4000}},
-        {KqRawBuilder().header(2, 2, 0).comment("no pixels").bytes(), -21},
-        {container(2, 2, {1, 2, 3}), -21},
-        {container(0xFFFFFFF0u, 0xFFFFFFF0u, {1, 2, 3}), -21},
-        {container(0, 3, {}), -21},
-        {cut(container(2, 2, {1, 2, 3, 4}), 3), -21}, // not a prompt
-        {rawtest::nkrawFile(2, 2, {1, 2, 3, 2000}), 0, kFileNkRaw, kCfaGrbg, 11, {1, 2, 3, 2000}},
-        {rawtest::nkrawFile(2, 2, {1, 2, 3}), -22},
-        {rawtest::nkrawFile(2, 2, {1, 2, 3, 4, 5}), -22},
-        {"just some bytes", -4}, // no console to ask
-        {"", -4},
+    const std::pair<const char*, std::string> cases[] = {
+        {"fixed header", rawtest::fixedHeaderFile(3, 2, {0, 1, 2, 3, 4, 700})},
+        {"fixed header, 2 bytes short", cut(rawtest::fixedHeaderFile(2, 1, {5, 6}), 2)},
+        {"fixed header, huge size", rawtest::fixedHeaderFile(0xFFFFFFF0u, 0xFFFFFFF0u, {1})},
+        {"fixed header, no width", rawtest::fixedHeaderFile(0, 5, {})},
+        {"container", container(2, 2, {1, 2, 3, 4000})},
+        {"container, no pixels", KqRawBuilder().header(2, 2, 0).comment("no pixels").bytes()},
+        {"container, 3 of 4 samples", container(2, 2, {1, 2, 3})},
+        {"container, huge size", container(0xFFFFFFF0u, 0xFFFFFFF0u, {1, 2, 3})},
+        {"container, no width", container(0, 3, {})},
+        {"container, cut", cut(container(2, 2, {1, 2, 3, 4}), 3)}, // not a prompt
+        {"nkraw", rawtest::nkrawFile(2, 2, {1, 2, 3, 2000})},
+        {"nkraw, short", rawtest::nkrawFile(2, 2, {1, 2, 3})},
+        {"nkraw, long", rawtest::nkrawFile(2, 2, {1, 2, 3, 4, 5})},
+        {"other bytes", "just some bytes"}, // no console to ask
+        {"empty", ""},
     };
-    for (const auto& c : cases) {
+    std::string text;
+    for (const auto& [name, bytes] : cases) {
         int rc = 1;
-        const ImagePtr image = readBytes(c.bytes, &rc);
-        EXPECT_EQ(rc, c.rc) << c.bytes.size() << " bytes";
-        ASSERT_EQ(image != nullptr, c.rc == 0);
-        if (!image)
-            continue;
-        EXPECT_EQ(image->fileType, c.fileType);
-        EXPECT_EQ(image->cfa[1], c.cfa);
-        EXPECT_EQ(image->bitsPerSample, c.bits);
-        EXPECT_EQ(image->pixelType, kPixelRaw);
-        EXPECT_EQ(image->bufferType, kBufferRawCfa);
-        EXPECT_EQ(image->dataType, kDataUint16);
-        EXPECT_EQ(rawtest::samplesOf(image.get()), c.samples);
-        ASSERT_NE(image->rawHeader, nullptr); // the header travels with the image
+        const ImagePtr image = readBytes(bytes, &rc);
+        text += std::string(name) + ": " + described(rc, image.get());
     }
+    testing_support::expectGolden("image/read/kinds.txt", text);
     int rc = 0;
     ImagePtr fixed = readBytes(rawtest::fixedHeaderFile(1, 1, {1}), &rc);
     EXPECT_EQ(kqrawFixedGet32(static_cast<const KqRawFixedHeader*>(fixed->rawHeader), 104),
@@ -141,55 +142,29 @@ int noAnswer(void*, RawLayout*) {
 }
 
 TEST(RawRead, LayoutFromTheConsoleIsAskedForLastAndMustFitTheFile) {
-    const struct {
-        std::string bytes;
-        RawLayout layout;
-        int rc;
-        std::uint32_t pixelType = 0, dataType = 0;
-        std::uint16_t samplesPerPixel = 0;
-        Samples samples = {};
-    } cases[] = {
-        {"HDR\x01\x02\x03\x04",
-         layout(2, 1, 12, 3),
-         0,
-         kPixelRaw,
-         kDataUint16,
-         1,
-         {0x0201, 0x0403}},
-        {"HDR\x01\x02\x03\x04",
-         layout(2, 1, 12, 3, 1, false),
-         0,
-         kPixelRaw,
-         kDataUint16,
-         1,
-         {0x0102, 0x0304}},
-        {"abcd", layout(2, 2, 8), 0, kPixelRaw, kDataUint8, 1},
-        {std::string(12, 'x'), layout(2, 2, 8), 0, kPixelRgb, kDataUint8, 3},
-        {std::string(24, 'x'), layout(2, 1, 16, 0, 2), 0, kPixelRgb, kDataUint16, 3},
-        {std::string(5, 'x'), layout(2, 2, 8), -23},
-        {std::string(4, 'x'), layout(2, 2, 10), -23},   // 10 bits in a byte
-        {std::string(4, 'x'), layout(2, 2, 8, 9), -23}, // header larger than the file
-        {std::string(4, 'x'), layout(0, 2, 8), -23},
-        {std::string(4, 'x'), layout(0xFFFFFFFFu, 0xFFFFFFFFu, 8, 0, 0xFFFFFFFFu), -23},
+    const std::pair<std::string, RawLayout> cases[] = {
+        {"HDR\x01\x02\x03\x04", layout(2, 1, 12, 3)},
+        {"HDR\x01\x02\x03\x04", layout(2, 1, 12, 3, 1, false)},
+        {"abcd", layout(2, 2, 8)},
+        {std::string(12, 'x'), layout(2, 2, 8)},
+        {std::string(24, 'x'), layout(2, 1, 16, 0, 2)},
+        {std::string(5, 'x'), layout(2, 2, 8)},
+        {std::string(4, 'x'), layout(2, 2, 10)},   // 10 bits in a byte
+        {std::string(4, 'x'), layout(2, 2, 8, 9)}, // header larger than the file
+        {std::string(4, 'x'), layout(0, 2, 8)},
+        {std::string(4, 'x'), layout(0xFFFFFFFFu, 0xFFFFFFFFu, 8, 0, 0xFFFFFFFFu)},
     };
-    for (const auto& c : cases) {
-        MemorySource source(reinterpret_cast<const std::uint8_t*>(c.bytes.data()), c.bytes.size());
+    std::string text;
+    for (const auto& [bytes, l] : cases) {
+        MemorySource source(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
         int rc = 1;
-        ImagePtr image(rawReadSource(source, fixedAnswer, const_cast<RawLayout*>(&c.layout), &rc));
-        EXPECT_EQ(rc, c.rc) << c.bytes;
-        ASSERT_EQ(image != nullptr, c.rc == 0);
-        if (!image)
-            continue;
-        EXPECT_EQ(image->fileType, kFileFixRaw);
-        EXPECT_EQ(image->cfa[1], c.pixelType == kPixelRaw ? kCfaBggr : 0u);
-        EXPECT_EQ(image->pixelType, c.pixelType);
-        EXPECT_EQ(image->dataType, c.dataType);
-        EXPECT_EQ(image->samplesPerPixel, c.samplesPerPixel);
-        EXPECT_EQ(image->numberOfImages, c.layout.images);
-        if (!c.samples.empty()) {
-            EXPECT_EQ(rawtest::samplesOf(image.get()), c.samples);
-        }
+        ImagePtr image(rawReadSource(source, fixedAnswer, const_cast<RawLayout*>(&l), &rc));
+        text += std::to_string(bytes.size()) + " bytes as " + std::to_string(l.width) + "x" +
+                std::to_string(l.height) + " " + std::to_string(l.bitDepth) + " bits, " +
+                std::to_string(l.images) + " images, header " + std::to_string(l.headerSize) +
+                (l.littleEndian ? "" : ", big-endian") + ": " + described(rc, image.get());
     }
+    testing_support::expectGolden("image/read/console_layouts.txt", text);
     const std::string bytes("\x10\x00\x20\x00", 4);
     MemorySource source(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
     int rc = 0;
