@@ -51,10 +51,7 @@ std::string dumpOf(const Bytes& blob) {
 // comment line, "\n" in the expected text is a line break.
 std::vector<std::array<std::string, 3>> rows(const std::string& name) {
     std::vector<std::array<std::string, 3>> result;
-    std::istringstream in(readFile(dataPath(name)));
-    for (std::string line; std::getline(in, line);) {
-        if (line.empty() || line[0] == '#')
-            continue;
+    for (const std::string& line : testing_support::dataRows(name)) {
         const std::size_t a = line.find('|'), b = line.find('|', a + 1);
         std::string expected = line.substr(b + 1);
         for (std::size_t at; (at = expected.find("\\n")) != std::string::npos;)

@@ -5,7 +5,9 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <sstream>
 #include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -15,6 +17,17 @@ namespace testing_support {
 
 inline std::string dataPath(const std::string& name) {
     return std::string(LSC_SOURCE_DIR) + "/tests/data/" + name;
+}
+
+// The rows of a case table under tests/data/: its lines but the empty ones
+// and the comments ('#' first).
+inline std::vector<std::string> dataRows(const std::string& name) {
+    std::vector<std::string> rows;
+    std::istringstream in(readFile(dataPath(name)));
+    for (std::string line; std::getline(in, line);)
+        if (!line.empty() && line[0] != '#')
+            rows.push_back(line);
+    return rows;
 }
 
 // A large output (a fixed-header raw file is ~300 KB, nearly all zeros) is
