@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstring>
 #include <memory>
+#include <tuple>
 
 #include <gtest/gtest.h>
 
@@ -152,11 +153,10 @@ TEST(ImageBuffer, PlanesMetadataDisplayTestAndNames) {
 TEST(ImageStreamIo, ScalarsRoundTripInBothByteOrders) {
     std::FILE* file = std::tmpfile();
     ASSERT_NE(file, nullptr);
-    EXPECT_EQ(streamWrite16(file, true, 0x1234), 0);
-    EXPECT_EQ(streamWrite32(file, false, 0xA1B2C3D4u), 0);
-    EXPECT_EQ(streamWrite64(file, true, 0x0102030405060708ull), 0);
-    EXPECT_EQ(streamWriteFloat(file, false, 1.5f), 0);
-    EXPECT_EQ(streamWrite8(file, 0xEE), 0);
+    // In order, each returning 0 (&& sequences them).
+    EXPECT_TRUE(!streamWrite16(file, true, 0x1234) && !streamWrite32(file, false, 0xA1B2C3D4u) &&
+                !streamWrite64(file, true, 0x0102030405060708ull) &&
+                !streamWriteFloat(file, false, 1.5f) && !streamWrite8(file, 0xEE));
     EXPECT_EQ(testing_support::readStream(file),
               std::string("\x12\x34\xD4\xC3\xB2\xA1\x01\x02\x03\x04\x05\x06\x07\x08\x00\x00\xC0"
                           "\x3F\xEE",
@@ -167,16 +167,12 @@ TEST(ImageStreamIo, ScalarsRoundTripInBothByteOrders) {
     std::uint64_t v64 = 0;
     float f = 0;
     std::uint8_t v8 = 0;
-    EXPECT_EQ(streamRead16(file, true, &v16), 0);
-    EXPECT_EQ(streamRead32(file, false, &v32), 0);
-    EXPECT_EQ(streamRead64(file, true, &v64), 0);
-    EXPECT_EQ(streamReadFloat(file, false, &f), 0);
-    EXPECT_EQ(streamRead8(file, &v8), 0);
-    EXPECT_EQ(v16, 0x1234);
-    EXPECT_EQ(v32, 0xA1B2C3D4u);
-    EXPECT_EQ(v64, 0x0102030405060708ull);
-    EXPECT_EQ(f, 1.5f);
-    EXPECT_EQ(v8, 0xEE);
+    EXPECT_TRUE(!streamRead16(file, true, &v16) && !streamRead32(file, false, &v32) &&
+                !streamRead64(file, true, &v64) && !streamReadFloat(file, false, &f) &&
+                !streamRead8(file, &v8));
+    EXPECT_EQ(std::make_tuple(v16, v32, v64, f, v8),
+              std::make_tuple(std::uint16_t{0x1234}, 0xA1B2C3D4u, 0x0102030405060708ull, 1.5f,
+                              std::uint8_t{0xEE}));
     EXPECT_EQ(streamRead32(file, false, &v32), -1);
     std::fclose(file);
 }
