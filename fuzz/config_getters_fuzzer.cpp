@@ -17,15 +17,7 @@
 #include "config/parameter_table.h"
 #include "config/value_text.h"
 
-using config::check_float_range;
-using config::check_int_range;
-using config::config_date_seconds;
-using config::config_node;
-using config::config_node_impl;
-using config::doubleText;
-using config::integerText;
-using config::parseFloatText;
-using config::parseIntegerText;
+using namespace config;
 
 namespace {
 

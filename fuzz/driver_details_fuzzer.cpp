@@ -18,24 +18,11 @@
 #include "image/image_buffer.h"
 #include "lsc/apan_exception.h"
 
+using namespace img;
 using config::strip_comments;
-
-using img::kCfaBggr;
-using img::kCfaGbrg;
-using img::kCfaGrbg;
-using img::kCfaRggb;
+using driver::HeaderlessRawDetails;
 
 namespace {
-
-using driver::HeaderlessRawDetails;
-using driver::parseHeaderlessDetails;
-
-bool isHexText(const std::string& text) {
-    for (const char c : text)
-        if (!((c >= '0' && c <= '9') || (c >= 'a' && c <= 'f') || (c >= 'A' && c <= 'F')))
-            return false;
-    return true;
-}
 
 void checkAccepted(const HeaderlessRawDetails& d) {
     const bool sizes = d.width >= 1 && d.width <= 65535 && d.height >= 1 && d.height <= 65535;
@@ -43,7 +30,8 @@ void checkAccepted(const HeaderlessRawDetails& d) {
     const bool cfa =
         d.cfa == kCfaRggb || d.cfa == kCfaGrbg || d.cfa == kCfaBggr || d.cfa == kCfaGbrg;
     const bool serial =
-        d.serialNumber.size() % 2 == 0 && d.serialNumber.size() <= 32 && isHexText(d.serialNumber);
+        d.serialNumber.size() % 2 == 0 && d.serialNumber.size() <= 32 &&
+        d.serialNumber.find_first_not_of("0123456789abcdefABCDEF") == std::string::npos;
     if (!(sizes && bits && cfa && serial))
         std::abort();
 }
@@ -63,7 +51,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     details.push(strip_comments('#'));
     details.push(io::array_source(text, length));
     try {
-        checkAccepted(parseHeaderlessDetails(details, defaultBits));
+        checkAccepted(driver::parseHeaderlessDetails(details, defaultBits));
     } catch (const boost::program_options::error&) {
     } catch (const apan::exception&) {
     } catch (const std::runtime_error&) {    // missing or out-of-range values

@@ -12,24 +12,18 @@
 #include "image/kqraw_container.h"
 #include "image/kqraw_fixed_header.h"
 
-using img::ImageBuffer;
-using img::imageRelease;
-using img::kKqRawFixedHeaderSize;
-using img::KqRawContainer;
-using img::kqrawContainerRelease;
-using img::kqrawFixedRead;
-using img::kqrawFixedToContainer;
+using namespace img;
 
 namespace {
 
 constexpr std::size_t kFieldBytes = 112;
 
 void readBoth(const std::uint8_t* data, std::size_t size) {
-    img::MemorySource strict(data, size, "fuzz");
+    MemorySource strict(data, size, "fuzz");
     ImageBuffer* image = nullptr;
     (void)kqrawFixedRead(strict, &image); // only that it neither crashes nor leaks
     imageRelease(image);
-    img::MemorySource converted(data, size, "fuzz");
+    MemorySource converted(data, size, "fuzz");
     KqRawContainer* container = nullptr;
     (void)kqrawFixedToContainer(converted, &container);
     kqrawContainerRelease(container);

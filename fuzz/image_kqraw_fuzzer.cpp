@@ -10,12 +10,7 @@
 #include "image/byte_source.h"
 #include "image/kqraw_container.h"
 
-using img::KqRawContainer;
-using img::kqrawContainerCopyBlocks;
-using img::kqrawContainerCreate;
-using img::kqrawContainerParse;
-using img::KqRawContainerPtr;
-using img::kqrawContainerWriteStream;
+using namespace img;
 
 namespace {
 
@@ -37,7 +32,7 @@ void checkRewrite(const KqRawContainer* container) {
     std::vector<std::uint8_t> first;
     if (!written(container, first))
         return;
-    img::MemorySource source(first.data(), first.size(), "rewritten");
+    MemorySource source(first.data(), first.size(), "rewritten");
     int rc = 0;
     KqRawContainerPtr again(kqrawContainerParse(source, &rc));
     std::vector<std::uint8_t> second;
@@ -48,7 +43,7 @@ void checkRewrite(const KqRawContainer* container) {
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-    img::MemorySource source(data, size, "fuzz");
+    MemorySource source(data, size, "fuzz");
     int rc = 0;
     KqRawContainerPtr container(kqrawContainerParse(source, &rc));
     if (!container)

@@ -12,14 +12,13 @@
 #include "image/raw_reader.h"
 #include "image/raw_samples.h"
 
-using img::ImageBuffer;
-using img::imageRelease;
+using namespace img;
 
 namespace {
 
 constexpr std::size_t kAnswerBytes = 1 + 28;
 
-int answer(void* context, img::RawLayout* layout) {
+int answer(void* context, RawLayout* layout) {
     const auto* p = static_cast<const std::uint8_t*>(context);
     auto word = [p](std::size_t at) {
         std::uint32_t v;
@@ -41,16 +40,16 @@ int answer(void* context, img::RawLayout* layout) {
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     int rc = 0;
     if (size >= kAnswerBytes && (data[0] & 1) != 0) {
-        img::MemorySource source(data + kAnswerBytes, size - kAnswerBytes, "fuzz");
-        imageRelease(img::rawReadSource(source, answer, const_cast<std::uint8_t*>(data), &rc));
+        MemorySource source(data + kAnswerBytes, size - kAnswerBytes, "fuzz");
+        imageRelease(rawReadSource(source, answer, const_cast<std::uint8_t*>(data), &rc));
         return 0;
     }
-    imageRelease(img::rawReadMemory(data, size, "fuzz", &rc));
-    img::MemorySource source(data, size, "fuzz");
+    imageRelease(rawReadMemory(data, size, "fuzz", &rc));
+    MemorySource source(data, size, "fuzz");
     ImageBuffer* header = nullptr;
     std::uint64_t samplesAt = 0;
-    if (img::rawReadHeaderOnly(source, &header, &samplesAt) == 0 && header)
-        (void)img::readDeferredSamples(source, samplesAt, header);
+    if (rawReadHeaderOnly(source, &header, &samplesAt) == 0 && header)
+        (void)readDeferredSamples(source, samplesAt, header);
     imageRelease(header);
     return 0;
 }

@@ -1,3 +1,7 @@
+// The questions about a headerless file's layout, over given answers; what
+// they print (questions, then the error output) is a golden file per case under
+// tests/data/image/prompt/.
+
 #include <cstdio>
 #include <string>
 
@@ -5,88 +9,42 @@
 
 #include "image/image_buffer.h"
 #include "image/raw_prompt.h"
+#include "tests/blob/golden_file.h"
+#include "tests/support/temp_dir.h"
 
 namespace img {
 namespace {
 
-// Runs the questions over a given input; returns what was written to the console.
-struct Session {
-    int result = 0;
-    img::RawLayout layout;
-    std::string out;
-    std::string err;
-};
-
-std::string contents(std::FILE* file) {
-    std::string text;
-    std::rewind(file);
-    for (int c; (c = std::fgetc(file)) != EOF;)
-        text += static_cast<char>(c);
-    return text;
-}
-
-Session ask(const std::string& input) {
-    Session s;
-    std::FILE* in = std::tmpfile();
-    std::FILE* out = std::tmpfile();
-    std::FILE* err = std::tmpfile();
-    std::fputs(input.c_str(), in);
-    std::rewind(in);
-    s.result = img::askRawLayout(in, out, err, &s.layout);
-    s.out = contents(out);
-    s.err = contents(err);
-    std::fclose(in);
-    std::fclose(out);
-    std::fclose(err);
-    return s;
-}
-
-TEST(RawPrompt, AsksEveryQuestionInOrder) {
-    const Session s = ask("640\n480\n10\n3\nn\n1\n512\n");
-    EXPECT_EQ(s.result, 0);
-    EXPECT_EQ(s.out, "Read input file as RAW with or without header...\n"
-                     "RAW Image Width = RAW Image Height= RAW Bit Depth (1-16) = "
-                     "RAW Bayer Type (1=RGGB, 2=BGGR, 3=GRBG, 4=GBRG) = "
-                     "Data in Little-Endian ? (Y/N) : Number of Images = Header Size = ");
-    EXPECT_EQ(s.layout.width, 640u);
-    EXPECT_EQ(s.layout.height, 480u);
-    EXPECT_EQ(s.layout.bitDepth, 10u);
-    EXPECT_EQ(s.layout.cfa, kCfaGrbg);
-    EXPECT_FALSE(s.layout.littleEndian);
-    EXPECT_EQ(s.layout.images, 1u);
-    EXPECT_EQ(s.layout.headerSize, 512u);
-}
-
-TEST(RawPrompt, RepeatsBitDepthAndBayerTypeUntilValid) {
-    const Session s = ask("4\n4\n0\n17\n12\n5\nx\n2\ny\n1\n0\n");
-    EXPECT_EQ(s.result, 0);
-    const std::string depthError = "ERROR: Bit Depth must be between 1 and 16 inclusive\n";
-    const std::string bayerError = "ERROR: Invalid choice of RAW Bayer Type\n";
-    const std::string depth = "RAW Bit Depth (1-16) = ";
-    const std::string bayer = "RAW Bayer Type (1=RGGB, 2=BGGR, 3=GRBG, 4=GBRG) = ";
-    EXPECT_NE(s.out.find(depth + depthError + depth + depthError + depth + bayer + bayerError +
-                         bayer + bayerError + bayer + "Data"),
-              std::string::npos);
-    EXPECT_EQ(s.layout.bitDepth, 12u);
-    EXPECT_EQ(s.layout.cfa, kCfaBggr);
-    EXPECT_TRUE(s.layout.littleEndian);
-}
-
-TEST(RawPrompt, EndOfInputFailsWithAClearLineInsteadOfLooping) {
-    for (const char* input : {"", "640\n480\n", "640\n480\n99\n", "1\n1\n8\n1\nY\n1\n"}) {
-        const Session s = ask(input);
-        EXPECT_EQ(s.result, -2) << input;
-        EXPECT_EQ(s.err, "ERROR: No answer on standard input.\n") << input;
+TEST(RawPrompt, AsksUntilEachAnswerIsValidAndFailsAtTheEndOfInput) {
+    const std::pair<const char*, const char*> cases[] = {
+        {"in_order", "640\n480\n10\n3\nn\n1\n512\n"},
+        {"repeated", "4\n4\n0\n17\n12\n5\nx\n2\ny\n1\n0\n"},
+        {"not_numbers", "wide\n-3\n 8 \n99999999999\n6\n16\n4\nY\n2\n18446744073709551615\n"},
+        {"no_input", ""},
+        {"ends_at_depth", "640\n480\n"},
+        {"ends_after_a_wrong_depth", "640\n480\n99\n"},
+        {"ends_at_header_size", "1\n1\n8\n1\nY\n1\n"},
+    };
+    for (const auto& [name, input] : cases) {
+        std::FILE* in = std::tmpfile();
+        std::FILE* out = std::tmpfile();
+        std::FILE* err = std::tmpfile();
+        std::fputs(input, in);
+        std::rewind(in);
+        RawLayout l;
+        const int rc = askRawLayout(in, out, err, &l);
+        std::fprintf(err, "\n--- result %d", rc); // and the layout taken
+        if (rc == 0)
+            std::fprintf(err, ": %ux%u, %u bits, %s, %s, %u images, header %llu", l.width, l.height,
+                         l.bitDepth, cfaPatternName(l.cfa),
+                         l.littleEndian ? "little-endian" : "big-endian", l.images,
+                         static_cast<unsigned long long>(l.headerSize));
+        testing_support::expectGolden(std::string("image/prompt/") + name + ".txt",
+                                      testing_support::readStream(out) + "\n--- error output\n" +
+                                          testing_support::readStream(err));
+        for (std::FILE* file : {in, out, err})
+            std::fclose(file);
     }
-}
-
-TEST(RawPrompt, AnswersThatAreNotNumbersAreAskedAgain) {
-    const Session s = ask("wide\n-3\n 8 \n99999999999\n6\n16\n4\nY\n2\n18446744073709551615\n");
-    EXPECT_EQ(s.result, 0);
-    EXPECT_EQ(s.layout.width, 8u);
-    EXPECT_EQ(s.layout.height, 6u);
-    EXPECT_EQ(s.layout.cfa, kCfaGbrg);
-    EXPECT_EQ(s.layout.headerSize, 18446744073709551615ull);
 }
 
 } // namespace
