@@ -1,0 +1,145 @@
+// Figures the calibration report computes: block means of a Bayer image and
+// gain surfaces sampled from control grids.
+
+#include <functional>
+#include <stdexcept>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "lsc/eval_patch.h"
+#include "report/report_data.h"
+#include "tests/lsc/lsc_test_image.h"
+
+namespace report {
+namespace {
+
+using img::BayerImage;
+using lsc::kGridPoints;
+
+BayerImage mosaic(int width, int height, std::uint32_t cfa,
+                  const std::function<float(int, int)>& value) {
+    BayerImage image;
+    lsc_test::makeImage(image, width, height, cfa, value);
+    return image;
+}
+
+std::string thrown(const std::function<void()>& action) {
+    try {
+        action();
+    } catch (const std::runtime_error& error) {
+        return error.what();
+    }
+    return "no error";
+}
+
+const char* const kNoImage = "The report needs a Bayer image of at least 2 x 2 float samples.";
+const char* const kNoBlocks = "The report's block grid needs at least one block.";
+
+TEST(BlockMeans, SortsPixelsIntoChannelsByBayerOrder) {
+    for (const lsc_test::Order& order : lsc_test::kOrders) {
+        // The 2 x 2 cell holds the channel numbers 1..4 (red 1 ... blue 4).
+        const ChannelBlockMeans means = blockMeans(
+            mosaic(12, 8, order.cfa,
+                   [&](int x, int y) {
+                       return 1.0f + static_cast<float>(order.channelAt[(y & 1) * 2 + (x & 1)]);
+                   }),
+            3, 2);
+        ASSERT_EQ(means.columns * means.rows, 6);
+        for (int k = 0; k < lsc::kChannels; ++k)
+            EXPECT_EQ(means.mean[k], std::vector<float>(6, static_cast<float>(k + 1)))
+                << order.name;
+    }
+}
+
+TEST(BlockMeans, DealsCellsToBlocksInOrderAndLeavesOutAnOddLastRowAndColumn) {
+    // Red is the cell column (green 0); column 10 and row 2 hold 100 and do not count.
+    const auto red = [](int x, int y) {
+        return x == 10 || y == 2 ? 100.0f : (x + y) % 2 ? 0.0f : static_cast<float>(x / 2);
+    };
+    EXPECT_EQ(blockMeans(mosaic(11, 3, img::kCfaRggb, red), 2, 1).mean[0],
+              (std::vector<float>{1.0f, 3.5f})); // cells 0..2 and 3..4
+    const auto wider = [](int x, int y) { return (x + y) % 2 ? 0.0f : static_cast<float>(x / 2); };
+    EXPECT_EQ(blockMeans(mosaic(12, 2, img::kCfaRggb, wider), 2, 1).mean[0],
+              (std::vector<float>{1.0f, 4.0f})); // cells 0..2 and 3..5
+    const ChannelBlockMeans coarse =
+        blockMeans(mosaic(6, 4, img::kCfaRggb, [](int, int) { return 0.5f; }), 10, 10);
+    EXPECT_EQ(coarse.columns, 3); // never finer than the cells
+    EXPECT_EQ(coarse.rows, 2);
+}
+
+TEST(BlockMeans, RefusesImagesWithoutAWholeCellAndEmptyGrids) {
+    EXPECT_EQ(thrown([] { blockMeans(BayerImage(), 2, 2); }), kNoImage);
+    EXPECT_EQ(thrown([] {
+                  blockMeans(mosaic(1, 8, img::kCfaRggb, [](int, int) { return 1.0f; }), 2, 2);
+              }),
+              kNoImage);
+    EXPECT_EQ(thrown([] {
+                  blockMeans(mosaic(4, 4, img::kCfaRggb, [](int, int) { return 1.0f; }), 0, 2);
+              }),
+              kNoBlocks);
+}
+
+TEST(BlockMeans, ScaledToPeakAndDeviationFromTheMean) {
+    ChannelBlockMeans means;
+    means.columns = 4;
+    means.rows = 1;
+    means.mean[0] = {0.3f, 0.6f, 0.5f, 0.05f}; // below the black level: 0
+    means.mean[1] = {0.0f, 0.0f, 0.0f, 0.0f};  // no signal: no division
+    scaleToPeak(means, 0.1f);
+    const float scaled[4] = {0.4f, 1.0f, 0.8f, 0.0f};
+    for (int i = 0; i < 4; ++i)
+        EXPECT_NEAR(means.mean[0][static_cast<std::size_t>(i)], scaled[i], 1e-6) << i;
+    EXPECT_EQ(means.mean[1], (std::vector<float>{0.0f, 0.0f, 0.0f, 0.0f}));
+    means.mean[2] = {0.9f, 1.1f, 1.0f, 1.2f};
+    deviationFromMean(means); // mean 1.05
+    EXPECT_NEAR(means.mean[2][0], -0.15f / 1.05f, 1e-6);
+    EXPECT_NEAR(largestAbsolute(means.mean[2]), 0.15f / 1.05f, 1e-6);
+    const ValueRange range = channelRange(means, 2);
+    EXPECT_NEAR(range.minimum, -0.15f / 1.05f, 1e-6);
+    EXPECT_NEAR(range.maximum, 0.15f / 1.05f, 1e-6);
+}
+
+TEST(BlockGridFor, KeepsBlocksAboutSquareOnEitherOrientation) {
+    const int cases[][5] = {
+        {640, 480, 16, 16, 12}, {480, 640, 16, 12, 16}, {4000, 2, 16, 16, 1}, {0, 480, 16, 0, 0}};
+    for (const auto& c : cases) {
+        const BlockGrid grid = blockGridFor(c[0], c[1], c[2]);
+        EXPECT_EQ(grid.columns, c[3]) << c[0] << " x " << c[1];
+        if (c[0] > 0) {
+            EXPECT_EQ(grid.rows, c[4]) << c[0] << " x " << c[1];
+        }
+    }
+}
+
+const double kDefaultFractions[4] = {0.25, 0.5, 0.25, 0.5};
+
+TEST(GainSurface, SamplesCellCentresAndTheImageCorners) {
+    float grid[kGridPoints];
+    for (int i = 0; i < kGridPoints; ++i)
+        grid[i] = 1.0f + 0.1f * static_cast<float>(i / 10) + 0.01f * static_cast<float>(i % 10);
+    const GainSurface surface = sampleGainSurface(grid, 1000, 800, kDefaultFractions, 4, 2);
+    ASSERT_EQ(surface.gain.size(), 8u);
+    // Cell (column 1, row 0) has its centre at pixel (375, 200): centre patch
+    // column with u = 125 / 500, top patch row with v = 0.
+    EXPECT_FLOAT_EQ(surface.gain[1], lsc::evalPatch(grid, lsc::patchStart(1, 1), 0.25f, 0.0f));
+    const lsc::PatchBreakpoints breaks = lsc::patchBreakpoints(1000, 800, 0.25, 0.5, 0.25, 0.5);
+    EXPECT_FLOAT_EQ(gainAt(grid, breaks, 375, 200), surface.gain[1]);
+    // The extremes are the image corners, never a cell centre.
+    EXPECT_FLOAT_EQ(surface.minimum, 1.0f);
+    EXPECT_FLOAT_EQ(surface.maximum, gainAt(grid, breaks, 999, 799));
+    EXPECT_GT(surface.maximum, 1.98f);
+}
+
+TEST(GainSurface, RefusesUnusableGeometryAndEmptyGrids) {
+    float grid[kGridPoints] = {};
+    const double squeezed[4] = {0.0, 0.5, 0.25, 0.5};
+    EXPECT_EQ(thrown([&] { sampleGainSurface(grid, 640, 480, squeezed, 4, 3); }).rfind("Patch", 0),
+              0u);
+    EXPECT_EQ(thrown([&] { sampleGainSurface(grid, 640, 480, kDefaultFractions, 0, 3); }),
+              kNoBlocks);
+    EXPECT_EQ(thrown([&] { sampleGainSurface(grid, 0, 480, kDefaultFractions, 4, 3); }), kNoImage);
+}
+
+} // namespace
+} // namespace report

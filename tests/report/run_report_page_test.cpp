@@ -1,0 +1,131 @@
+// The calibration report page, byte for byte against the pages kept under
+// tests/data/report/ (LSC_GOLDEN_UPDATE=1 rewrites them), in any locale, and
+// how it is written.
+
+#include <cmath>
+#include <filesystem>
+#include <functional>
+#include <iterator>
+#include <locale>
+#include <stdexcept>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "report/run_report_html.h"
+#include "tests/lsc/golden_file.h"
+#include "tests/report/run_report_example.h"
+#include "tests/support/temp_dir.h"
+
+namespace report {
+namespace {
+
+struct PageCase {
+    const char* name;
+    std::function<void(RunReport&)> change;
+};
+
+const PageCase kPages[] = {
+    {"passed", [](RunReport&) {}},
+    {"passed_details",
+     [](RunReport& r) {
+         r.shadingBefore.mean[2][5] = 0.2f;     // darkest green/blue block
+         r.residualAfter.mean[3][7] = -0.0125f; // largest blue residual
+         r.haveLuma = true;
+         r.lumaResidual = 0.0234f;
+         r.lumaBound = 3.0f;
+         r.inspectionInFixedNotation = true;
+         r.gains[3] = 1.5f;
+         r.serialNumber = "SN<1>";
+         r.framesAveraged = 4;
+         r.inputFiles = {{"--input", "a&b.kqraw"}, {"--config", "lsc.cfg"}};
+         r.outputs = {{"--calibrate", "calibration.txt"}};
+         r.inputPath = "in<put>&\"\xFF.kqraw"; // markup and a broken byte stay text
+         // Points are drawn once and only inside the prepared image.
+         r.samplePoints = {{0, 0}, {0, 0}, {158, 118}, {160, 0}, {0, 500}};
+     }},
+    {"failed",
+     [](RunReport& r) {
+         r.finished = false;
+         r.failedStage = "Delta ab";
+         r.failureMessage = "Maximum delta ab is greater than threshold of 8\n"
+                            "<light> & \"diffuser\"";
+         r.exitStatus = 1;
+         r.maxDelta = 9.5f;
+         r.delta[17] = 9.5f;
+         r.haveLuma = true;
+         r.lumaResidual = 0.0234f;
+         r.lumaBound = 2.0f; // above the bound
+         r.haveFitError = true;
+         r.maxErrorBound = 0.2f;
+         r.maxRmsBound = 0.05f;
+         r.deviationMax[0] = 0.25f;
+         r.deviationRms[0] = 0.0123f;
+         r.deviationMax[3] = 0.125f;
+         r.deviationRms[3] = 0.0625f;
+         r.deviationRms[2] = std::nanf(""); // a broken figure never passes
+     }},
+    {"ended_before_loading",
+     [](RunReport& r) {
+         r = RunReport();
+         r.toolVersion = "3.8.1";
+         r.commandLine = "--config missing.cfg";
+         r.failedStage = "Configuration";
+         r.failureMessage = "Cannot open file : missing.cfg";
+         r.exitStatus = 2;
+     }},
+    {"unfinished", [](RunReport& r) { r.finished = false; }},
+    {"xtest_without_delta",
+     [](RunReport& r) {
+         r.xtest = true;
+         r.warnings = {"X-test run: <test surface>", "Unknown configuration key a.b (ignored)"};
+         r.haveDelta = false;
+     }},
+    {"patch_without_pixels", [](RunReport& r) { r.fractions[0] = 0.0; }},
+};
+
+// A locale that writes a decimal comma and groups thousands.
+struct CommaDecimal : std::numpunct<char> {
+    char do_decimal_point() const override { return ','; }
+    char do_thousands_sep() const override { return '.'; }
+    std::string do_grouping() const override { return "\3"; }
+};
+
+class ReportPage : public ::testing::TestWithParam<PageCase> {};
+
+TEST_P(ReportPage, MatchesTheKeptPageInAnyLocale) {
+    RunReport report = report::test::exampleRunReport();
+    GetParam().change(report);
+    const std::string page = runReportHtml(report);
+    lsc_test::expectGolden(std::string("report/") + GetParam().name + ".html", page);
+    const std::locale previous =
+        std::locale::global(std::locale(std::locale::classic(), new CommaDecimal));
+    const std::string again = runReportHtml(report);
+    std::locale::global(previous);
+    EXPECT_TRUE(page == again);
+}
+
+INSTANTIATE_TEST_SUITE_P(Runs, ReportPage, ::testing::ValuesIn(kPages),
+                         [](const ::testing::TestParamInfo<PageCase>& page) {
+                             return std::string(page.param.name);
+                         });
+
+TEST(WriteRunReport, WritesThePageAloneOrNamesTheFileItCannotWrite) {
+    testing_support::TempDir dir;
+    const RunReport report = report::test::exampleRunReport();
+    writeRunReport(dir.file("r.html"), report);
+    EXPECT_EQ(testing_support::readFile(dir.file("r.html")), runReportHtml(report));
+    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(dir.path()), {}),
+              1); // no leftovers
+    for (const std::string& path : {dir.file("no/such/dir/r.html"), std::string("/dev/full")}) {
+        try {
+            writeRunReport(path, report);
+            ADD_FAILURE() << "no error for " << path;
+        } catch (const std::runtime_error& error) {
+            EXPECT_EQ(std::string(error.what()), "Cannot write report file: " + path);
+        }
+    }
+}
+
+} // namespace
+} // namespace report
