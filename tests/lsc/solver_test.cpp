@@ -1,0 +1,246 @@
+// Bernstein weights and the dense solvers of the surface fit: small systems
+// with exact answers, one case per failure, and the bits of the solutions.
+
+#include <algorithm>
+#include <cstdint>
+#include <cstring>
+#include <random>
+#include <stdexcept>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "caught_exception.h"
+#include "lsc/bernstein.h"
+#include "lsc/bernstein_surface.h"
+#include "lsc/linear_least_squares.h"
+
+namespace lsc {
+namespace {
+
+using apan::denseMatrix;
+using lsc_test::caught;
+
+denseMatrix matrixOf(std::uint32_t rows, std::uint32_t columns, const std::vector<double>& values) {
+    denseMatrix m(rows, columns);
+    for (std::size_t i = 0; i < values.size(); ++i)
+        m[i] = values[i];
+    return m;
+}
+
+TEST(Bernstein, KnownValuesAndIndicesOutsideTheDegree) {
+    const struct {
+        int i, n;
+        double t, value;
+    } cases[] = {{0, 3, 0.0, 1.0},       {3, 3, 1.0, 1.0}, {1, 3, 0.0, 0.0}, {1, 3, 0.5, 0.375},
+                 {2, 3, 0.25, 0.140625}, {1, 2, 0.5, 0.5}, {0, 0, 0.3, 1.0}, {-1, 2, 0.3, 0.0},
+                 {3, 2, 0.3, 0.0},       {0, -1, 0.3, 0.0}};
+    for (const auto& c : cases)
+        EXPECT_EQ(bernstein(c.i, c.n, c.t), c.value) << c.i << ", " << c.n << ", " << c.t;
+}
+
+// A x = b, with x exact; the least-squares solver takes the square path on
+// square systems and must give the same bits.
+struct SolveCase {
+    std::uint32_t rows, columns;
+    std::vector<double> a, b;
+    double tolerance;
+    std::vector<double> x;
+};
+
+const SolveCase kSquare[] = {
+    {3, 3, {2, 1, -1, -3, -1, 2, -2, 1, 2}, {8, -11, -3}, 1e-7, {2, 3, -1}},
+    // Zero pivot: the first usable row (leading 1) comes up, not the largest (4).
+    {3, 3, {0, 1, 1, 1, 2, 3, 4, 1, 1}, {2, 6, 6}, 1e-7, {1, 1, 1}},
+    // A lead within the tolerance leaves its row untouched.
+    {2, 2, {1, 1, 0.25, 1}, {2, 1.25}, 0.5, {0.75, 1.25}},
+    {2, 2, {0, 1, 1, 0}, {3, 4}, 0.0, {4, 3}}, // zero tolerance still swaps
+};
+
+TEST(LinearSystem, SolvesSmallSystemsExactlyOnBothPaths) {
+    for (const SolveCase& c : kSquare)
+        for (bool leastSquares : {false, true}) {
+            denseMatrix a = matrixOf(c.rows, c.columns, c.a), b = matrixOf(c.rows, 1, c.b);
+            denseMatrix x(c.columns, 1);
+            if (leastSquares)
+                apan::linearLeastSquares<double>(&a, &x, &b).solve(c.tolerance);
+            else
+                apan::linearSystem<double>(&a, &x, &b).solve(c.tolerance);
+            for (std::uint32_t i = 0; i < c.columns; ++i)
+                EXPECT_NEAR(x[i], c.x[i], 1e-12) << c.a[0] << ", unknown " << i;
+        }
+    denseMatrix a = matrixOf(3, 3, kSquare[1].a), b = matrixOf(3, 1, kSquare[1].b), x(3, 1);
+    apan::linearSystem<double>(&a, &x, &b).solve(1e-7);
+    EXPECT_EQ(a(0, 1), 2.0); // row 1 became the normalised first row
+}
+
+TEST(LinearLeastSquares, OverdeterminedSystemsGiveTheLeastSquaresAnswer) {
+    const SolveCase cases[] = {
+        {3, 2, {1, 0, 0, 1, 1, 1}, {1, 2, 3}, 1e-10, {1, 2}},              // consistent
+        {3, 1, {1, 1, 1}, {1, 2, 6}, 1e-10, {3}},                          // the mean
+        {4, 2, {1, 0, 1, 1, 1, 2, 1, 3}, {1, 3, 2, 4}, 1e-10, {1.3, 0.8}}, // a line
+    };
+    for (const SolveCase& c : cases) {
+        denseMatrix a = matrixOf(c.rows, c.columns, c.a), b = matrixOf(c.rows, 1, c.b);
+        denseMatrix x(c.columns, 1);
+        apan::linearLeastSquares<double>(&a, &x, &b).solve(c.tolerance);
+        for (std::uint32_t i = 0; i < c.columns; ++i)
+            EXPECT_NEAR(x[i], c.x[i], 1e-12) << c.rows << " x " << c.columns << ", unknown " << i;
+    }
+}
+
+TEST(LinearSystem, EachFailureHasItsCodeAndTexts) {
+    struct Broken : apan::linearSystem<double> {
+        using apan::linearSystem<double>::linearSystem;
+        void solve(double) override { (*x_)[0] = 2.1; }
+    };
+    denseMatrix a(3, 3), x(3, 1), b(3, 1), x2(2, 1), b6(6, 1), a63(6, 3), a24(2, 4), x4(4, 1);
+    for (std::uint32_t r = 0; r < 6; ++r) { // identical columns 0 and 2
+        a63(r, 0) = a63(r, 2) = r + 1.0;
+        a63(r, 1) = (r * r) % 5;
+    }
+    denseMatrix singular = matrixOf(3, 3, {2, 1, 1, 1, 3, 2, 3, 4, 3}); // row 2 = row 0 + row 1
+    denseMatrix ones = matrixOf(2, 2, {1, 1, 1, 1}),
+                zeroColumn = matrixOf(3, 2, {1, 0, 2, 0, 3, 0});
+    denseMatrix a32(3, 2), b3(3, 1), b2 = matrixOf(2, 1, {1, 1}), c2 = matrixOf(2, 1, {1, 1});
+    bernsteinSurface surface(3, 3, 0.0, 640.0, 0.0, 480.0);
+    for (int i = 0; i < 8; ++i)
+        surface.addSample(i * 80.0, i * 60.0, 1.0);
+    const struct {
+        apan::exception e;
+        int code;
+        const char *what, *hint;
+    } cases[] = {
+        {caught([&] { Broken(&a, &x, &b).selfTest(); }), 1, "The linear system solver failed.",
+         "Selftest failure."},
+        {caught([&] { surface.fit(1e-7); }), 220,
+         "Under constrained fit being attempted. You must specify at least as many sample points "
+         "as control points.",
+         "While it's possible to solve undercontrained linear least squares systems we don't "
+         "support it."},
+        {caught([&] { apan::linearLeastSquares<double>(&a63, &x, &b6).solve(1e-10); }), 230,
+         "Warning: trying to solve a rank deficient system",
+         "Rank deficient matrices often occur whenyou have an ill-conditioned system of linear "
+         "equations."},
+        {caught([&] { apan::linearLeastSquares<double>(&zeroColumn, &x2, &b3).solve(1e-10); }), 230,
+         nullptr, nullptr},
+        {caught([&] { apan::linearLeastSquares<double>(&a24, &x4, &b2).solve(1e-10); }), 230,
+         nullptr, nullptr}, // underdetermined
+        {caught([&] { apan::linearSystem<double>(&singular, &x, &b).solve(1e-7); }), 231,
+         "Singular or undetermined linear system.",
+         "Usually the rows or columns are not linear independent."},
+        {caught([&] { apan::linearSystem<double>(&ones, &x2, &c2).solve(0.0); }), 231, nullptr,
+         nullptr},
+        {caught([&] { apan::linearSystem<double>(&a32, &x2, &b3).solve(1e-7); }), 231,
+         "You can only solve linear system if the 'A' matrix is square.",
+         "You need as many constraints as equations our the system can't be solved."},
+    };
+    for (const auto& c : cases) {
+        EXPECT_EQ(c.e.code(), c.code) << c.e.what();
+        if (c.what) {
+            EXPECT_STREQ(c.e.what(), c.what);
+            EXPECT_EQ(c.e.hint(), c.hint);
+        }
+    }
+}
+
+TEST(LinearSystem, SelfTestSolvesItsSystemAndRefusesOtherStorage) {
+    for (bool leastSquares : {false, true}) {
+        denseMatrix a(3, 3), x(3, 1), b(3, 1);
+        apan::linearLeastSquares<double> lls(&a, &x, &b);
+        apan::linearSystem<double> square(&a, &x, &b);
+        apan::linearSystem<double>& system = leastSquares ? lls : square;
+        system.selfTest();
+        EXPECT_NEAR(x[0], 2.0, 1e-12);
+        EXPECT_NEAR(x[1], 1.0, 1e-12);
+        EXPECT_NEAR(x[2], -1.0, 1e-12);
+    }
+    denseMatrix a4(4, 4), x4(4, 1), b4(4, 1);
+    EXPECT_THROW(apan::linearSystem<double>(&a4, &x4, &b4).selfTest(), std::invalid_argument);
+}
+
+TEST(LinearSystem, RefusesVectorsThatDoNotFitTheMatrixAndAnUnaddressableSize) {
+    denseMatrix a = matrixOf(2, 2, {1, 0, 0, 1}), shortX(1, 1), b(2, 1), longB(3, 1), x(2, 1);
+    EXPECT_THROW(apan::linearSystem<double>(&a, &shortX, &b).solve(1e-7), std::invalid_argument);
+    EXPECT_THROW(apan::linearSystem<double>(&a, &x, &longB).solve(1e-7), std::invalid_argument);
+    EXPECT_THROW(apan::linearSystem<double>(&a, nullptr, &b).solve(1e-7), std::invalid_argument);
+    EXPECT_THROW(apan::linearLeastSquares<double>(&a, &x, &longB).solve(1e-7),
+                 std::invalid_argument);
+    EXPECT_THROW(denseMatrix(0xffffffffu, 0xffffffffu), std::bad_alloc);
+}
+
+TEST(BernsteinSurface, NineSamplesDetermineAQuadraticAndRowsRunAlongY) {
+    const auto quadratic = [](double x, double y) {
+        return 0.5 + 0.001 * x - 0.002 * y + 1e-6 * x * y + 2e-7 * x * x;
+    };
+    bernsteinSurface surface(3, 3, 0.0, 640.0, 0.0, 480.0);
+    for (double x : {0.0, 320.0, 639.0})
+        for (double y : {0.0, 240.0, 479.0})
+            surface.addSample(x, y, quadratic(x, y));
+    surface.fit(1e-7);
+    for (double x : {0.0, 100.0, 555.0, 639.0})
+        for (double y : {0.0, 17.0, 479.0})
+            EXPECT_NEAR(surface.value(x, y), quadratic(x, y), 1e-7) << x << "," << y;
+    bernsteinSurface corner(3, 3, 0.0, 100.0, 0.0, 100.0);
+    corner.controlPoints()(2, 0) = 1.0; // bottom-left
+    EXPECT_EQ(corner.value(0.0, 100.0), 1.0);
+    EXPECT_EQ(corner.value(100.0, 0.0), 0.0);
+}
+
+// Problems of the shape of the patch fit: rows of 16 products of cubic
+// Bernstein weights in one of 3 x 3 patches of a 10 x 10 grid (or dense
+// rows), from a fixed integer generator so that every platform builds the
+// same bits; the digest (FNV-1a) is over the solution's bits.
+std::uint64_t solutionDigest(unsigned rows, unsigned columns, std::uint64_t seed, bool patchRows) {
+    std::mt19937_64 generator(seed);
+    auto unit = [&] { return static_cast<double>(generator() >> 11) * 0x1p-53; };
+    denseMatrix a(rows, columns), b(rows, 1), x(columns, 1);
+    for (unsigned r = 0; r < rows; ++r) {
+        if (patchRows) {
+            const double u = unit() * 3, v = unit() * 3;
+            const unsigned px = std::min(2u, static_cast<unsigned>(u));
+            const unsigned py = std::min(2u, static_cast<unsigned>(v));
+            const double s = u - px, t = v - py;
+            const double bu[4] = {(1 - s) * (1 - s) * (1 - s), 3 * s * (1 - s) * (1 - s),
+                                  3 * s * s * (1 - s), s * s * s};
+            const double bv[4] = {(1 - t) * (1 - t) * (1 - t), 3 * t * (1 - t) * (1 - t),
+                                  3 * t * t * (1 - t), t * t * t};
+            for (unsigned i = 0; i < 4; ++i)
+                for (unsigned k = 0; k < 4; ++k)
+                    a(r, (py * 3 + i) * 10 + px * 3 + k) = bv[i] * bu[k];
+            b[r] = 1.0 + 0.3 * ((u - 1.5) * (u - 1.5) + (v - 1.5) * (v - 1.5)) + 0.01 * unit();
+        } else {
+            for (unsigned c = 0; c < columns; ++c)
+                a(r, c) = unit() - 0.5;
+            b[r] = unit();
+        }
+    }
+    apan::linearLeastSquares<double>(&a, &x, &b).solve(1e-10);
+    std::uint64_t digest = 14695981039346656037ull;
+    for (unsigned c = 0; c < columns; ++c) {
+        std::uint64_t bits;
+        std::memcpy(&bits, &x[c], sizeof bits);
+        for (int i = 0; i < 8; ++i)
+            digest = (digest ^ ((bits >> (8 * i)) & 0xff)) * 1099511628211ull;
+    }
+    return digest;
+}
+
+TEST(LinearLeastSquares, KeepsEveryBitOfTheKeptSolutions) {
+    const struct {
+        unsigned rows, columns;
+        std::uint64_t seed;
+        bool patchRows;
+        std::uint64_t digest;
+    } cases[] = {
+        {400, 100, 1, true, 0x99c506538941cc22ull},  {900, 100, 2, true, 0x5d833e53309bb4bfull},
+        {3000, 100, 3, true, 0x86d02878d89d7e0dull}, {57, 13, 4, false, 0x073e4b2c04f1c01bull},
+        {400, 31, 5, false, 0xb40f1054123b0d55ull},
+    };
+    for (const auto& c : cases)
+        EXPECT_EQ(solutionDigest(c.rows, c.columns, c.seed, c.patchRows), c.digest)
+            << c.rows << " x " << c.columns << " seed " << c.seed;
+}
+
+} // namespace
+} // namespace lsc
