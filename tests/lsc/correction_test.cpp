@@ -1,0 +1,218 @@
+// Applying the correction: per-pixel gains of each channel's surface, the
+// reduced output, refusals, the X-test surface, and a noisy synthetic flat
+// field that must come out flat after fit and correction.
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <sstream>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "golden_file.h"
+#include "lsc/lens_shading_correction.h"
+#include "lsc/lens_shading_fit.h"
+#include "lsc/sample_collection.h"
+#include "lsc/xtest_surface.h"
+#include "lsc_test_image.h"
+#include "tests/support/flat_field.h"
+
+namespace lsc {
+namespace {
+
+using lsc_test::kOrders;
+using lsc_test::makeImage;
+
+float ramp(int x, int y) {
+    return 0.001f * static_cast<float>(y * 1000 + x);
+}
+
+struct Correction {
+    img::BayerImage image, corrected;
+    ShadingCorrection correction;
+    float blackLevel = 0.0f;
+    unsigned step = 1;
+
+    Correction(int width, int height, std::uint32_t cfa, float (*value)(int, int),
+               float gain = 1.0f) {
+        makeImage(image, width, height, cfa, value, 12);
+        for (auto& grid : correction.controlGrids)
+            std::fill(grid, grid + kGridPoints, gain);
+    }
+    // The error text, or "" with the corrected image in `corrected`.
+    std::string apply() {
+        try {
+            corrected = applyLensShading(image, correction, blackLevel, step);
+        } catch (const std::runtime_error& e) {
+            return e.what();
+        }
+        return "";
+    }
+    float at(int x, int y) const { return corrected.pixels()[y * corrected.width() + x]; }
+};
+
+TEST(Correction, UnitGainsLeaveTheInputMinusTheBlackLevelAndDropAnOddRowAndColumn) {
+    Correction run(5, 5, img::kCfaGbrg, ramp);
+    run.blackLevel = 0.25f;
+    ASSERT_EQ(run.apply(), "");
+    EXPECT_EQ(run.corrected.width() * 10 + run.corrected.height(), 44);
+    EXPECT_EQ(run.corrected.cfa(), img::kCfaGbrg);
+    EXPECT_EQ(run.corrected.bitsPerSample(), 12);
+    EXPECT_EQ(run.corrected.buffer()->dataType, static_cast<std::uint32_t>(img::kDataReal32));
+    for (int y = 0; y < 4; ++y)
+        for (int x = 0; x < 4; ++x)
+            EXPECT_NEAR(run.at(x, y), ramp(x, y) - 0.25f, 1e-6f) << x << ", " << y;
+}
+
+TEST(Correction, StepReducesTheImageBlockByBlock) {
+    Correction run(40, 32, img::kCfaRggb, ramp);
+    run.step = 2;
+    ASSERT_EQ(run.apply(), "");
+    ASSERT_EQ(run.corrected.width() * 100 + run.corrected.height(), 2016);
+    // Output (2, 0) is input (4, 0): the first pixel of input block 2; (3, 1) is (5, 1).
+    const int cases[][4] = {{2, 0, 4, 0}, {3, 1, 5, 1}, {19, 15, 37, 29}};
+    for (const auto& c : cases)
+        EXPECT_NEAR(run.at(c[0], c[1]), ramp(c[2], c[3]), 1e-5f) << c[0] << ", " << c[1];
+}
+
+TEST(Correction, EachPixelUsesItsChannelsGridInEveryBayerOrder) {
+    for (const lsc_test::Order& order : kOrders) {
+        Correction run(8, 6, order.cfa, [](int, int) { return 0.5f; });
+        for (int k = 0; k < 4; ++k)
+            std::fill(run.correction.controlGrids[k], run.correction.controlGrids[k] + kGridPoints,
+                      static_cast<float>(k + 1));
+        ASSERT_EQ(run.apply(), "");
+        for (int y = 0; y < 6; ++y)
+            for (int x = 0; x < 8; ++x)
+                EXPECT_NEAR(run.at(x, y),
+                            0.5f * static_cast<float>(order.channelAt[(y & 1) * 2 + (x & 1)] + 1),
+                            1e-5f)
+                    << order.name << " " << x << ", " << y;
+    }
+}
+
+TEST(Correction, GainFollowsThePatchSurface) {
+    Correction run(
+        40, 40, img::kCfaRggb, [](int, int) { return 1.0f; }, 0.0f);
+    // Red gain rising with the global column index: 1 + column / 9 at the grid points.
+    for (int i = 0; i < 100; ++i)
+        run.correction.controlGrids[0][i] = 1.0f + static_cast<float>(i % 10) / 9.0f;
+    ASSERT_EQ(run.apply(), "");
+    EXPECT_NEAR(run.at(0, 0), 1.0f, 1e-6f);                // left edge
+    EXPECT_NEAR(run.at(10, 0), 1.0f + 3.0f / 9.0f, 1e-6f); // x = L = 10: first centre point
+    EXPECT_NEAR(run.at(20, 0), 1.0f + 4.5f / 9.0f, 1e-5f); // halfway through the centre patch
+    EXPECT_EQ(run.at(1, 0), 0.0f);                         // green/red keeps its zero grid
+}
+
+TEST(Correction, RefusesWhatItCannotCorrect) {
+    const std::string tooSmall = "Image is too small to correct: width and height must be at "
+                                 "least twice apply_lsc.sampling_factor.";
+    const struct {
+        int width, height;
+        unsigned step;
+        double top;
+        std::string error;
+    } cases[] = {{7, 40, 4, 0.25, tooSmall},
+                 {1, 1, 1, 0.25, tooSmall},
+                 {8, 8, 0, 0.25, "apply_lsc.sampling_factor must be at least 1."},
+                 {64, 64, 1, 0.0,
+                  "Patch geometry leaves a patch without pixels: the patch factors (or patch "
+                  "sizes) must give left and top patches of at least one pixel and leave room for "
+                  "the right and bottom patches."}};
+    for (const auto& c : cases) {
+        Correction run(c.width, c.height, img::kCfaRggb, ramp);
+        run.step = c.step;
+        run.correction.layout.top = c.top;
+        EXPECT_EQ(run.apply(), c.error) << c.width << " x " << c.height;
+        EXPECT_TRUE(run.corrected.empty());
+    }
+    Correction none(2, 2, img::kCfaRggb, ramp);
+    none.image = img::BayerImage();
+    EXPECT_EQ(none.apply(), "No image to process for lens shading.");
+}
+
+TEST(XTestSurface, GridsAreTheKeptOnes) {
+    ShadingCorrection correction;
+    applyXTestSurface(correction);
+    std::string text;
+    char line[32];
+    for (int k = 0; k < kChannels; ++k)
+        for (int i = 0; i < kGridPoints; ++i) {
+            std::snprintf(line, sizeof line, "%.9g%c",
+                          static_cast<double>(correction.controlGrids[k][i]),
+                          i % 10 == 9 ? '\n' : ' ');
+            text += line;
+        }
+    lsc_test::expectGolden("lsc/xtest_surface.txt", text);
+}
+
+// Largest relative deviation of a channel's 16 x 16 block means from the mean
+// of those blocks, leaving out the outermost ring of blocks.
+double worstBlockDeviation(const img::BayerImage& image, const lsc_test::Order& order,
+                           int channel) {
+    const int width = image.width(), columns = width / 16, rows = image.height() / 16;
+    std::vector<double> means;
+    for (int by = 1; by + 1 < rows; ++by)
+        for (int bx = 1; bx + 1 < columns; ++bx) {
+            double sum = 0;
+            for (int y = by * 16; y < by * 16 + 16; ++y)
+                for (int x = bx * 16; x < bx * 16 + 16; ++x)
+                    if (order.channelAt[(y & 1) * 2 + (x & 1)] == channel)
+                        sum += image.pixels()[static_cast<std::size_t>(y) * width + x];
+            means.push_back(sum / 64);
+        }
+    double mean = 0, worst = 0;
+    for (double m : means)
+        mean += m / static_cast<double>(means.size());
+    for (double m : means)
+        worst = std::max(worst, std::fabs(m / mean - 1.0));
+    return worst;
+}
+
+TEST(CorrectedFlatField, EveryChannelIsFlatWithinOnePercent) {
+    const int depth[4][2] = {{10, 64}, {12, 256}, {8, 0}, {14, 1024}}; // bits, black level
+    for (int i = 0; i < 4; ++i) {
+        const lsc_test::Order& order = kOrders[i];
+        testing_support::FlatFieldShape shape;
+        shape.width = 320;
+        shape.height = 240;
+        shape.cfa = order.cfa;
+        shape.bits = depth[i][0];
+        shape.blackLevel = depth[i][1];
+        shape.cornerLevel = 0.5;
+        shape.colourShading = 0.08;
+        shape.noise = 0.002; // about 2 codes at 10 bits
+        shape.seed = 7 + static_cast<std::uint32_t>(shape.bits);
+        const testing_support::FlatField field = testing_support::makeFlatField(shape);
+        const std::vector<float> normalized = field.normalized();
+
+        ShadingSettings settings;
+        settings.blackLevel =
+            static_cast<float>(shape.blackLevel) / static_cast<float>(field.fullScale());
+        settings.sampleAngleStep = 8;
+        settings.procSamplingFactor = 4;
+        settings.sampleWindow = 3; // the median of nine blocks per sample takes out the noise
+        settings.quiet = true;
+        img::BayerImage image;
+        makeImage(
+            image, shape.width, shape.height, order.cfa,
+            [&](int x, int y) { return normalized[static_cast<std::size_t>(y) * 320 + x]; },
+            static_cast<std::uint16_t>(shape.bits));
+        std::ostringstream messages;
+        const img::BayerImage levelled = levelledImage(image, settings.blackLevel);
+        FitDeviations deviations;
+        const FitResult fit = fitLensShading(collectSamples(levelled, settings, messages),
+                                             {levelled, true}, settings, messages, deviations);
+        // The correction gets the prepared image, black level included.
+        const img::BayerImage corrected =
+            applyLensShading(image, fit.correction, settings.blackLevel, settings.applyStep);
+        for (int k = 0; k < 4; ++k)
+            EXPECT_LT(worstBlockDeviation(corrected, order, k), 0.01) << order.name << " " << k;
+    }
+}
+
+} // namespace
+} // namespace lsc
