@@ -3,10 +3,9 @@
 
 Usage: png_check.py FILE [--min-colours N] [--min-ink FRACTION]
 
-Decodes the PNG with the standard library only (8-bit greyscale, RGB or RGBA,
-non-interlaced, as browsers write screenshots), counts the distinct colours and
-the share of pixels that are not near white, and fails when the page shows
-too few colours (a blank or error page) or too little ink.
+Decodes 8-bit greyscale, RGB or RGBA non-interlaced PNG (as browsers write
+screenshots) with the standard library, and fails when the page shows too few
+colours (a blank or error page) or too little ink (pixels not near white).
 """
 
 import argparse
@@ -15,24 +14,32 @@ import sys
 import zlib
 
 
-def paeth(a, b, c):
-    p = a + b - c
-    pa, pb, pc = abs(p - a), abs(p - b), abs(p - c)
-    if pa <= pb and pa <= pc:
-        return a
-    return b if pb <= pc else c
+def unfilter(kind, line, previous, channels):
+    for i in range(len(line)):
+        left = line[i - channels] if i >= channels else 0
+        up, corner = previous[i], previous[i - channels] if i >= channels else 0
+        if kind == 1:
+            line[i] = (line[i] + left) & 0xFF
+        elif kind == 2:
+            line[i] = (line[i] + up) & 0xFF
+        elif kind == 3:
+            line[i] = (line[i] + ((left + up) >> 1)) & 0xFF
+        elif kind == 4:
+            p = left + up - corner
+            pa, pb, pc = abs(p - left), abs(p - up), abs(p - corner)
+            line[i] = (line[i] + (left if pa <= pb and pa <= pc else up if pb <= pc else corner)) & 0xFF
+        elif kind != 0:
+            raise ValueError("bad filter type")
+    return line
 
 
 def decode(data):
     """Returns (width, height, channels, rows) with rows as bytearrays."""
     if data[:8] != b"\x89PNG\r\n\x1a\n":
         raise ValueError("not a PNG file")
-    pos, width, height, channels, idat = 8, 0, 0, 0, bytearray()
-    while pos + 8 <= len(data):
-        (length,) = struct.unpack(">I", data[pos:pos + 4])
-        kind = data[pos + 4:pos + 8]
-        if pos + 12 + length > len(data):
-            raise ValueError("truncated chunk")
+    pos, idat, width, height, channels = 8, bytearray(), 0, 0, None
+    while pos + 12 <= len(data):
+        (length,), kind = struct.unpack(">I", data[pos:pos + 4]), data[pos + 4:pos + 8]
         body = data[pos + 8:pos + 8 + length]
         if kind == b"IHDR":
             width, height, depth, colour, _, _, interlace = struct.unpack(">IIBBBBB", body)
@@ -41,33 +48,16 @@ def decode(data):
                 raise ValueError("unsupported PNG layout")
         elif kind == b"IDAT":
             idat += body
-        elif kind == b"IEND":
-            break
         pos += 12 + length
-    raw = zlib.decompress(bytes(idat))
-    stride = width * channels
-    if len(raw) < height * (stride + 1):
-        raise ValueError("short image data")
-    rows, previous = [], bytearray(stride)
+    raw, stride, rows = zlib.decompress(bytes(idat)), width * (channels or 1), []
+    if channels is None or len(raw) < height * (stride + 1):
+        raise ValueError("short or headerless image data")
+    previous = bytearray(stride)
     for y in range(height):
         start = y * (stride + 1)
-        kind, line = raw[start], bytearray(raw[start + 1:start + 1 + stride])
-        for i in range(stride):
-            left = line[i - channels] if i >= channels else 0
-            up = previous[i]
-            corner = previous[i - channels] if i >= channels else 0
-            if kind == 1:
-                line[i] = (line[i] + left) & 0xFF
-            elif kind == 2:
-                line[i] = (line[i] + up) & 0xFF
-            elif kind == 3:
-                line[i] = (line[i] + ((left + up) >> 1)) & 0xFF
-            elif kind == 4:
-                line[i] = (line[i] + paeth(left, up, corner)) & 0xFF
-            elif kind != 0:
-                raise ValueError("bad filter type")
-        rows.append(line)
-        previous = line
+        previous = unfilter(raw[start], bytearray(raw[start + 1:start + 1 + stride]), previous,
+                            channels)
+        rows.append(previous)
     return width, height, channels, rows
 
 
@@ -79,17 +69,12 @@ def main():
     args = parser.parse_args()
     with open(args.png, "rb") as f:
         width, height, channels, rows = decode(f.read())
-    colours, ink = set(), 0
-    for line in rows:
-        for x in range(0, width * channels, channels):
-            pixel = bytes(line[x:x + min(channels, 3)])
-            colours.add(pixel)
-            if min(pixel) < 235:
-                ink += 1
-    share = ink / float(width * height) if width and height else 0.0
-    print("%s: %d x %d, %d colours, %.1f %% ink" % (args.png, width, height, len(colours),
-                                                   100.0 * share))
-    if len(colours) < args.min_colours or share < args.min_ink:
+    pixels = [bytes(line[x:x + min(channels, 3)]) for line in rows
+              for x in range(0, width * channels, channels)]
+    colours, ink = len(set(pixels)), sum(1 for p in pixels if min(p) < 235)
+    share = ink / float(len(pixels)) if pixels else 0.0
+    print("%s: %d x %d, %d colours, %.1f %% ink" % (args.png, width, height, colours, 100 * share))
+    if colours < args.min_colours or share < args.min_ink:
         print("the rendered report looks blank", file=sys.stderr)
         return 1
     return 0
