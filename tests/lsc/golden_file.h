@@ -1,7 +1,9 @@
 #pragma once
-// Compares a formatted output with its kept copy under tests/data/; with
-// LSC_GOLDEN_UPDATE=1 in the environment it rewrites the copy instead.
+// Compares a formatted output with its reviewed copy under tests/data/; with
+// LSC_GOLDEN_UPDATE=1 in the environment it rewrites the copy instead (then
+// `git diff tests/data` shows what changed).
 
+#include <algorithm>
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
@@ -17,22 +19,13 @@ inline void expectGolden(const std::string& name, const std::string& text) {
         std::ofstream(path, std::ios::binary) << text;
         return;
     }
-    std::ifstream in(path, std::ios::binary);
     std::stringstream kept;
-    kept << in.rdbuf();
-    if (kept.str() == text)
-        return;
-    // Name the first line that differs rather than printing whole pages.
-    std::istringstream want(kept.str()), got(text);
-    std::string a, b;
-    for (int line = 1;; ++line) {
-        const bool moreA = static_cast<bool>(std::getline(want, a));
-        const bool moreB = static_cast<bool>(std::getline(got, b));
-        if (a != b || moreA != moreB || !moreA) {
-            ADD_FAILURE() << path << ", line " << line << ":\nkept: " << a << "\ngot:  " << b;
-            return;
-        }
-    }
+    kept << std::ifstream(path, std::ios::binary).rdbuf();
+    const std::size_t differs =
+        std::mismatch(text.begin(), text.end(), kept.str().begin(), kept.str().end()).first -
+        text.begin();
+    EXPECT_TRUE(kept.str() == text) << path << " differs from byte " << differs << ": "
+                                    << text.substr(differs > 40 ? differs - 40 : 0, 120);
 }
 
 } // namespace lsc_test
