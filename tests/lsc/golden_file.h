@@ -19,13 +19,13 @@ inline void expectGolden(const std::string& name, const std::string& text) {
         std::ofstream(path, std::ios::binary) << text;
         return;
     }
-    std::stringstream kept;
-    kept << std::ifstream(path, std::ios::binary).rdbuf();
-    const std::size_t differs =
-        std::mismatch(text.begin(), text.end(), kept.str().begin(), kept.str().end()).first -
-        text.begin();
-    EXPECT_TRUE(kept.str() == text) << path << " differs from byte " << differs << ": "
-                                    << text.substr(differs > 40 ? differs - 40 : 0, 120);
+    std::stringstream in;
+    in << std::ifstream(path, std::ios::binary).rdbuf();
+    const std::string kept = in.str();
+    const auto at = std::mismatch(text.begin(), text.end(), kept.begin(), kept.end()).first;
+    const std::size_t differs = static_cast<std::size_t>(at - text.begin());
+    EXPECT_TRUE(kept == text) << path << " differs from byte " << differs << ": "
+                              << text.substr(differs > 40 ? differs - 40 : 0, 120);
 }
 
 } // namespace lsc_test
