@@ -12,6 +12,7 @@
 
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "golden_file.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/lens_shading_fit.h"
@@ -44,12 +45,8 @@ struct Correction {
     }
     // The error text, or "" with the corrected image in `corrected`.
     std::string apply() {
-        try {
-            corrected = applyLensShading(image, correction, blackLevel, step);
-        } catch (const std::runtime_error& e) {
-            return e.what();
-        }
-        return "";
+        return lsc_test::runtimeError(
+            [&] { corrected = applyLensShading(image, correction, blackLevel, step); });
     }
     float at(int x, int y) const { return corrected.pixels()[y * corrected.width() + x]; }
 };

@@ -22,15 +22,7 @@ namespace lsc {
 namespace {
 
 using lsc_test::makeImage;
-
-template <typename F> std::string runtimeError(F f) {
-    try {
-        f();
-    } catch (const std::runtime_error& e) {
-        return e.what();
-    }
-    return "(passed)";
-}
+using lsc_test::runtimeError;
 
 std::string aboveCeiling(const char* gain, const char* channel, const char* ceiling) {
     return std::string("Gain ") + gain + " of the " + channel + " channel is above lsc.max_gain (" +
@@ -58,7 +50,7 @@ protected:
         samples = collectSamples(levelled, settings, messages);
         settings.quiet = false;
     }
-    // The fit's error text, "(passed)" when it gave a correction.
+    // The fit's error text, "" when it gave a correction.
     std::string fitError() {
         messages.str("");
         fit.reset();
@@ -77,7 +69,7 @@ protected:
 
 TEST_F(Fit, FlatFieldGivesUnitGainsAndTheProgressLinesUnlessQuiet) {
     collect(kFlat);
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     for (int k = 0; k < 4; ++k)
         for (int i = 0; i < 100; ++i)
             ASSERT_NEAR(fit->correction.controlGrids[k][i], 1.0f, 1e-5f) << k << ", " << i;
@@ -87,7 +79,7 @@ TEST_F(Fit, FlatFieldGivesUnitGainsAndTheProgressLinesUnlessQuiet) {
                               "Fitting surface : green/blue\nFitting surface : blue\n");
     settings.quiet = true;
     settings.logFitError = true;
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     EXPECT_EQ(messages.str(), "");
     EXPECT_TRUE(deviations.measured);
 }
@@ -95,7 +87,7 @@ TEST_F(Fit, FlatFieldGivesUnitGainsAndTheProgressLinesUnlessQuiet) {
 TEST_F(Fit, FalloffLineShowsEachCheckPointAgainstItsWantedValue) {
     collect(kFlat, 64, 48);
     settings.falloff = 0.5f; // fx = 0.5 * 32 / 40, fy = 0.5 * 24 / 40
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     EXPECT_EQ(messages.str().substr(0, messages.str().find('\n')),
               "Target value[red]  center :0.2 / 0.2  corner :0.1 / 0.1  hedge :0.12 / 0.12  "
               "vedge :0.14 / 0.14");
@@ -104,7 +96,7 @@ TEST_F(Fit, FalloffLineShowsEachCheckPointAgainstItsWantedValue) {
 TEST_F(Fit, GainsAreRelativeToTheBrightestSampleAndTheLogFlagAddsTheDeviations) {
     collect(vignetted);
     settings.logFitError = true;
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     for (int k = 0; k < 4; ++k) // about 1 at the centre, a few per cent off the surface
         EXPECT_NEAR(fit->correction.controlGrids[k][44], 1.0f, 0.05f) << k;
     EXPECT_GT(fit->correction.controlGrids[0][0], fit->correction.controlGrids[0][44] * 1.2f);
@@ -120,7 +112,7 @@ TEST_F(Fit, GainsAreRelativeToTheBrightestSampleAndTheLogFlagAddsTheDeviations) 
         EXPECT_LE(deviations.rms[k], deviations.max[k]) << k;
     }
     settings.averageChannels = true;
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     for (int i = 0; i < 100; ++i)
         for (int k = 1; k < 4; ++k)
             ASSERT_EQ(fit->correction.controlGrids[k][i], fit->correction.controlGrids[0][i]) << i;
@@ -129,11 +121,11 @@ TEST_F(Fit, GainsAreRelativeToTheBrightestSampleAndTheLogFlagAddsTheDeviations) 
 TEST_F(Fit, GreenBalanceKeepsAbsoluteGainsAndTheCeilingSeesThem) {
     collect(kFlat);
     settings.maxGain = 1.2f;
-    EXPECT_EQ(fitError(), "(passed)"); // every normalised gain is 1
-    settings.greenBalance = true;      // green/red: 0.5 / 0.4
+    EXPECT_EQ(fitError(), "");    // every normalised gain is 1
+    settings.greenBalance = true; // green/red: 0.5 / 0.4
     EXPECT_EQ(fitError(), aboveCeiling("1.25", "green/red", "1.2"));
     settings.maxGain = 6.0f;
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     EXPECT_EQ(fit->targetLevels[1], 0.5f);
     EXPECT_EQ(fit->targetLevels[2], 0.5f);
     EXPECT_NEAR(fit->correction.controlGrids[1][55], 1.25f, 1e-4f);
@@ -168,7 +160,7 @@ TEST_F(Fit, SamplesOutsideTheImageAreNotFitted) {
     outside.x = 400;
     outside.value[0] = 0.01f; // a gain of 20 if it were used
     samples.samples.push_back(outside);
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     EXPECT_NEAR(fit->correction.controlGrids[0][99], 1.0f, 1e-4f);
 }
 
@@ -184,7 +176,7 @@ TEST_F(Fit, ABlotchOnTheSamplesEndsTheFitBeforeTheGridsChange) {
     EXPECT_EQ(fitError(), "RMS error bound exceeded.");
     settings.maxRmsError = 1.0f;
     settings.maxError = 1.0f;
-    EXPECT_EQ(fitError(), "(passed)");
+    EXPECT_EQ(fitError(), "");
 }
 
 TEST_F(Fit, GainsAndControlPointsAboveTheCeilingEndTheFitBeforeTheGridsChange) {
@@ -200,7 +192,7 @@ TEST_F(Fit, GainsAndControlPointsAboveTheCeilingEndTheFitBeforeTheGridsChange) {
     settings.sampleMargin = 60; // the surface reaches the corners beyond the samples
     collect(vignetted);
     settings.maxGain = 100.0f;
-    ASSERT_EQ(fitError(), "(passed)");
+    ASSERT_EQ(fitError(), "");
     float brightest = 0.0f, darkest = 1.0f; // the largest red gain is brightest / darkest
     for (const shadingSample& s : samples.samples) {
         brightest = std::max(brightest, s.value[0]);
@@ -226,7 +218,7 @@ TEST(FitChecks, DeviationLineBoundsAndCeilingTexts) {
         const char* result;
     } bounds[] = {{rms, max, 0.2f, 0.2f, "RMS error bound exceeded."}, // RMS first
                   {rms, max, 0.3f, 0.2f, "MAX error bound exceeded."},
-                  {rms, max, 0.3f, 0.5f, "(passed)"},
+                  {rms, max, 0.3f, 0.5f, ""},
                   {broken, zeros, 1.0f, 1.0f, "RMS error bound exceeded."}, // NaN exceeds
                   {zeros, broken, 1.0f, 1.0f, "MAX error bound exceeded."}};
     for (const auto& b : bounds)
@@ -241,13 +233,13 @@ TEST(FitChecks, DeviationLineBoundsAndCeilingTexts) {
               aboveCeiling("7.31", "red", "6"));
     EXPECT_EQ(runtimeError([&] { checkGainSamples(samples, 64, 48, 7.5f); }),
               aboveCeiling("8", "blue", "7.5"));
-    EXPECT_EQ(runtimeError([&] { checkGainSamples(samples, 64, 48, 8.0f); }), "(passed)");
+    EXPECT_EQ(runtimeError([&] { checkGainSamples(samples, 64, 48, 8.0f); }), "");
     float grids[kChannels][kGridPoints];
     std::fill(&grids[0][0], &grids[0][0] + kChannels * kGridPoints, 1.0f);
     grids[2][99] = 6.25f;
     EXPECT_EQ(runtimeError([&] { checkControlPoints(grids, 6.0f); }),
               aboveCeiling("6.25", "green/blue", "6"));
-    EXPECT_EQ(runtimeError([&] { checkControlPoints(grids, 6.25f); }), "(passed)");
+    EXPECT_EQ(runtimeError([&] { checkControlPoints(grids, 6.25f); }), "");
 }
 
 } // namespace

@@ -46,11 +46,4 @@ inline std::function<float(int, int)> channelLevels(const Order& order, const fl
     };
 }
 
-inline std::function<float(int, int)> channelLevels(std::uint32_t cfa, const float levels[4]) {
-    for (const Order& order : kOrders)
-        if (order.cfa == cfa)
-            return channelLevels(order, levels);
-    return {};
-}
-
 } // namespace lsc_test

@@ -9,6 +9,7 @@
 
 #include <gtest/gtest.h>
 
+#include "caught_exception.h"
 #include "image/bayer_phase.h"
 #include "lsc/sample_collection.h"
 #include "lsc/sample_window.h"
@@ -29,12 +30,9 @@ protected:
         makeImage(image, width, height, img::kCfaRggb,
                   value ? value : lsc_test::channelLevels(kOrders[0], kLevels));
         messages.str("");
-        try {
+        return lsc_test::runtimeError([&] {
             set = collectSamples(levelledImage(image, settings.blackLevel), settings, messages);
-        } catch (const std::runtime_error& e) {
-            return e.what();
-        }
-        return "";
+        });
     }
     img::BayerImage image;
     ShadingSettings settings;

@@ -9,6 +9,7 @@
 
 #include "lsc/eval_patch.h"
 #include "report/report_data.h"
+#include "tests/lsc/caught_exception.h"
 #include "tests/lsc/lsc_test_image.h"
 
 namespace report {
@@ -22,15 +23,6 @@ BayerImage mosaic(int width, int height, std::uint32_t cfa,
     BayerImage image;
     lsc_test::makeImage(image, width, height, cfa, value);
     return image;
-}
-
-std::string thrown(const std::function<void()>& action) {
-    try {
-        action();
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
-    return "no error";
 }
 
 const char* const kNoImage = "The report needs a Bayer image of at least 2 x 2 float samples.";
@@ -69,12 +61,12 @@ TEST(BlockMeans, DealsCellsToBlocksInOrderAndLeavesOutAnOddLastRowAndColumn) {
 }
 
 TEST(BlockMeans, RefusesImagesWithoutAWholeCellAndEmptyGrids) {
-    EXPECT_EQ(thrown([] { blockMeans(BayerImage(), 2, 2); }), kNoImage);
-    EXPECT_EQ(thrown([] {
+    EXPECT_EQ(lsc_test::runtimeError([] { blockMeans(BayerImage(), 2, 2); }), kNoImage);
+    EXPECT_EQ(lsc_test::runtimeError([] {
                   blockMeans(mosaic(1, 8, img::kCfaRggb, [](int, int) { return 1.0f; }), 2, 2);
               }),
               kNoImage);
-    EXPECT_EQ(thrown([] {
+    EXPECT_EQ(lsc_test::runtimeError([] {
                   blockMeans(mosaic(4, 4, img::kCfaRggb, [](int, int) { return 1.0f; }), 0, 2);
               }),
               kNoBlocks);
@@ -134,11 +126,16 @@ TEST(GainSurface, SamplesCellCentresAndTheImageCorners) {
 TEST(GainSurface, RefusesUnusableGeometryAndEmptyGrids) {
     float grid[kGridPoints] = {};
     const double squeezed[4] = {0.0, 0.5, 0.25, 0.5};
-    EXPECT_EQ(thrown([&] { sampleGainSurface(grid, 640, 480, squeezed, 4, 3); }).rfind("Patch", 0),
+    EXPECT_EQ(lsc_test::runtimeError([&] {
+                  sampleGainSurface(grid, 640, 480, squeezed, 4, 3);
+              }).rfind("Patch", 0),
               0u);
-    EXPECT_EQ(thrown([&] { sampleGainSurface(grid, 640, 480, kDefaultFractions, 0, 3); }),
-              kNoBlocks);
-    EXPECT_EQ(thrown([&] { sampleGainSurface(grid, 0, 480, kDefaultFractions, 4, 3); }), kNoImage);
+    EXPECT_EQ(
+        lsc_test::runtimeError([&] { sampleGainSurface(grid, 640, 480, kDefaultFractions, 0, 3); }),
+        kNoBlocks);
+    EXPECT_EQ(
+        lsc_test::runtimeError([&] { sampleGainSurface(grid, 0, 480, kDefaultFractions, 4, 3); }),
+        kNoImage);
 }
 
 } // namespace
