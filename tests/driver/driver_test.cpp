@@ -16,6 +16,7 @@
 #include "driver/run.h"
 #include "driver/stage_timer.h"
 #include "lsc/apan_exception.h"
+#include "tests/lsc/caught_exception.h"
 #include "tests/support/temp_dir.h"
 
 namespace {
@@ -64,15 +65,13 @@ TEST(InfoFile, DashKeepsStandardOutputAFileIsTruncatedAndFlushedPerLine) {
     full << "line" << std::endl;
     EXPECT_TRUE(full.writeFailed());
     full.reset();
-    try {
+    const apan::exception error = lsc_test::caught([] {
         outputStream unwritable;
         unwritable.openInfoFile("/nonexistent-dir/info.txt");
-        ADD_FAILURE() << "no exception";
-    } catch (const apan::exception& error) {
-        EXPECT_EQ(error.code(), 240);
-        EXPECT_STREQ(error.what(), "Unable to output information file.");
-        EXPECT_EQ(error.hint(), "Likely a file protection issue.");
-    }
+    });
+    EXPECT_EQ(error.code(), 240);
+    EXPECT_STREQ(error.what(), "Unable to output information file.");
+    EXPECT_EQ(error.hint(), "Likely a file protection issue.");
 }
 
 TEST(StageTimer, WritesLabelSecondsAndSecOnlyWhenEnabled) {

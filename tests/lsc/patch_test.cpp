@@ -48,14 +48,10 @@ TEST(PatchGeometry, BreakpointsSizesAndWhetherEveryPatchHasPixels) {
         }
         EXPECT_EQ(patchGeometryUsable(b), c.usable) << c.width << " " << c.left << " " << c.center;
     }
-    try {
-        usablePatchBreakpoints(64, 48, 0.6, 0.5, 0.25, 0.5);
-        ADD_FAILURE() << "no exception";
-    } catch (const std::runtime_error& e) {
-        EXPECT_STREQ(e.what(), "Patch geometry leaves a patch without pixels: the patch factors "
-                               "(or patch sizes) must give left and top patches of at least one "
-                               "pixel and leave room for the right and bottom patches.");
-    }
+    EXPECT_EQ(lsc_test::runtimeError([] { usablePatchBreakpoints(64, 48, 0.6, 0.5, 0.25, 0.5); }),
+              "Patch geometry leaves a patch without pixels: the patch factors (or patch sizes) "
+              "must give left and top patches of at least one pixel and leave room for the right "
+              "and bottom patches.");
     // Exported: the outer patches round, the centre truncates.
     const ExportedPatchSizes s = exportedPatchSizes(1001, 801, 0.25, 0.5, 0.25, 0.5);
     const std::int64_t sizes[6] = {s.left, s.center, s.right, s.top, s.middle, s.bottom};

@@ -14,6 +14,7 @@
 #include <gtest/gtest.h>
 
 #include "report/run_report_html.h"
+#include "tests/lsc/caught_exception.h"
 #include "tests/lsc/golden_file.h"
 #include "tests/support/temp_dir.h"
 
@@ -191,12 +192,8 @@ TEST(WriteRunReport, WritesThePageAloneOrNamesTheFileItCannotWrite) {
     EXPECT_EQ(std::distance(std::filesystem::directory_iterator(dir.path()), {}),
               1); // no leftovers
     for (const std::string& path : {dir.file("no/such/dir/r.html"), std::string("/dev/full")}) {
-        try {
-            writeRunReport(path, report);
-            ADD_FAILURE() << "no error for " << path;
-        } catch (const std::runtime_error& error) {
-            EXPECT_EQ(std::string(error.what()), "Cannot write report file: " + path);
-        }
+        EXPECT_EQ(lsc_test::runtimeError([&] { writeRunReport(path, report); }),
+                  "Cannot write report file: " + path);
     }
 }
 
