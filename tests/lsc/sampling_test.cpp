@@ -10,7 +10,6 @@
 #include <gtest/gtest.h>
 
 #include "caught_exception.h"
-#include "image/bayer_phase.h"
 #include "lsc/sample_collection.h"
 #include "lsc/sample_window.h"
 #include "lsc_test_image.h"
@@ -162,26 +161,22 @@ TEST_F(Sampling, TargetLevelWindowIsFilterSizeOverTwiceTheFactorMadeOddAndShrink
     }
 }
 
-// A width x height working image of `order` over its own pixel store.
+// A width x height RGGB working image over its own pixel store.
 struct Plane {
-    Plane(std::uint32_t width, std::uint32_t height, float fill,
-          const lsc_test::Order& bayer = kOrders[0])
-        : pixels(std::size_t{width} * height, fill),
-          order(bayer), image{width, height, bayer.cfa, pixels.data()} {}
-    // The pixel of `channel` in the 2x2 block at even (x, y).
-    float& at(std::uint32_t x, std::uint32_t y, int channel) {
-        int i = 0;
-        while (order.channelAt[i] != channel)
-            ++i;
-        return pixels[(y + i / 2) * image.width + x + i % 2];
+    Plane(std::uint32_t width, std::uint32_t height, float fill)
+        : pixels(std::size_t{width} * height, fill), image{width, height, img::kCfaRggb,
+                                                           pixels.data()} {}
+    // The pixel of `channel` in the 2x2 block at even (x, y): RGGB is in channel order.
+    float& at(std::uint32_t x, std::uint32_t y, int k) {
+        return pixels[(y + static_cast<std::uint32_t>(k / 2)) * image.width + x +
+                      static_cast<std::uint32_t>(k % 2)];
     }
     std::vector<float> medians(std::uint32_t x, std::uint32_t y, int window) const {
         std::vector<float> result(kChannels);
-        windowMedians(image, img::bayerPhase(image.cfa), x, y, window, result.data());
+        windowMedians(image, 0, x, y, window, result.data());
         return result;
     }
     std::vector<float> pixels;
-    lsc_test::Order order;
     WorkingImage image;
 };
 
@@ -199,10 +194,9 @@ TEST(SampleWindow, MedianOfEachChannelsOwnBlocksWithinTheImage) {
     EXPECT_EQ(nine.medians(8, 8, 3), (std::vector<float>{0.25f, 5.0f, 0.5f, 0.75f}));
     // Clipped at the corner: an even count gives the mean of the middle two.
     Plane corner(20, 20, 100.0f);
-    corner.at(0, 0, 0) = 1.0f;
-    corner.at(2, 0, 0) = 20.0f;
-    corner.at(0, 2, 0) = 2.0f;
-    corner.at(2, 2, 0) = 10.0f;
+    const float reds[4] = {1, 20, 2, 10};
+    for (std::uint32_t i = 0; i < 4; ++i)
+        corner.at(2 * (i % 2), 2 * (i / 2), 0) = reds[i];
     EXPECT_EQ(corner.medians(0, 0, 3)[0], 6.0f);
     // An odd-sized image leaves out the half block at its border.
     Plane odd(7, 7, 1000.0f);
