@@ -93,8 +93,11 @@ TEST(BlockMeans, ScaledToPeakAndDeviationFromTheMean) {
 }
 
 TEST(BlockGridFor, KeepsBlocksAboutSquareOnEitherOrientation) {
-    const int cases[][5] = {
-        {640, 480, 16, 16, 12}, {480, 640, 16, 12, 16}, {4000, 2, 16, 16, 1}, {0, 480, 16, 0, 0}};
+    const int cases[][5] = {{640, 480, 16, 16, 12},
+                            {480, 640, 16, 12, 16},
+                            {480, 480, 8, 8, 8},
+                            {4000, 2, 16, 16, 1},
+                            {0, 480, 16, 0, 0}};
     for (const auto& c : cases) {
         const BlockGrid grid = blockGridFor(c[0], c[1], c[2]);
         EXPECT_EQ(grid.columns, c[3]) << c[0] << " x " << c[1];

@@ -22,6 +22,7 @@ TEST(ReportText, EscapesMarkupKeepsUtf8AndReplacesBrokenBytes) {
          "Gr\xC3\xBC\xC3\x9F"
          "e\t1\n2"},
         {"\xF0\x9F\x93\xB7", "\xF0\x9F\x93\xB7"}, // four bytes
+        {"\xC2\xB1\xDF\xBF", "\xC2\xB1\xDF\xBF"}, // the ends of the two-byte leads
         {"a\xFF"
          "b",
          "a" + kBad + "b"},

@@ -149,6 +149,12 @@ const PageCase kPages[] = {
          r.exitStatus = 2;
      }},
     {"unfinished", [](RunReport& r) { r.finished = false; }},
+    {"failed_in_correction",
+     [](RunReport& r) { // shading before, nothing after
+         r.finished = r.haveResidual = r.haveWhiteBalance = r.haveDelta = false;
+         r.failedStage = "Correction";
+         r.failureMessage = "apply_lsc.sampling_factor must be at least 1.";
+     }},
     {"xtest_without_delta",
      [](RunReport& r) {
          r.xtest = true;
