@@ -10,6 +10,7 @@
 #include <gtest/gtest.h>
 
 #include "caught_exception.h"
+#include "golden_file.h"
 #include "lsc/sample_collection.h"
 #include "lsc/sample_window.h"
 #include "lsc_test_image.h"
@@ -59,6 +60,13 @@ TEST_F(Sampling, SineGridThenBorderLinesAndTheCountLine) {
         EXPECT_EQ(set.samples[static_cast<std::size_t>(i)].y, expected[i][1]) << i;
     }
     EXPECT_EQ(messages.str(), "Number of sample points = 280\n");
+    std::string positions; // all of them, and those of odd patch sizes, against the kept list
+    for (const int width : {64, 68}) {
+        ASSERT_EQ(collect(width, width - 16), "");
+        for (const shadingSample& s : set.samples)
+            positions += std::to_string(s.x) + "," + std::to_string(s.y) + "\n";
+    }
+    lsc_test::expectGolden("lsc/sample_positions.txt", positions);
     settings.quiet = true;
     ASSERT_EQ(collect(64, 48), "");
     EXPECT_EQ(messages.str(), "");
