@@ -130,6 +130,10 @@ TEST_F(Fit, GreenBalanceKeepsAbsoluteGainsAndTheCeilingSeesThem) {
     EXPECT_EQ(fit->targetLevels[2], 0.5f);
     EXPECT_NEAR(fit->correction.controlGrids[1][55], 1.25f, 1e-4f);
     EXPECT_NEAR(fit->correction.controlGrids[2][55], 1.0f, 1e-4f);
+    const float brighterGreenRed[4] = {0.2f, 0.5f, 0.4f, 0.7f};
+    collect(lsc_test::channelLevels(lsc_test::kOrders[0], brighterGreenRed));
+    ASSERT_EQ(fitError(), "");
+    EXPECT_EQ(fit->targetLevels[1] + fit->targetLevels[2], 1.0f); // both 0.5
 }
 
 TEST_F(Fit, UnusableSamplesAndGeometryEndTheFitBeforeAnythingIsPrinted) {
