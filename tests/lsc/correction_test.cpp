@@ -1,25 +1,18 @@
 // Applying the correction: per-pixel gains of each channel's surface, the
-// reduced output, refusals, the X-test surface, and a noisy synthetic flat
-// field that must come out flat after fit and correction.
+// reduced output, refusals and the X-test surface.
 
 #include <algorithm>
-#include <cmath>
 #include <cstdio>
-#include <sstream>
 #include <stdexcept>
 #include <string>
-#include <vector>
 
 #include <gtest/gtest.h>
 
 #include "caught_exception.h"
 #include "golden_file.h"
 #include "lsc/lens_shading_correction.h"
-#include "lsc/lens_shading_fit.h"
-#include "lsc/sample_collection.h"
 #include "lsc/xtest_surface.h"
 #include "lsc_test_image.h"
-#include "tests/support/flat_field.h"
 
 namespace lsc {
 namespace {
@@ -144,71 +137,6 @@ TEST(XTestSurface, GridsAreTheKeptOnes) {
             text += line;
         }
     lsc_test::expectGolden("lsc/xtest_surface.txt", text);
-}
-
-// Largest relative deviation of a channel's 16 x 16 block means from the mean
-// of those blocks, leaving out the outermost ring of blocks.
-double worstBlockDeviation(const img::BayerImage& image, const lsc_test::Order& order,
-                           int channel) {
-    const int width = image.width(), columns = width / 16, rows = image.height() / 16;
-    std::vector<double> means;
-    for (int by = 1; by + 1 < rows; ++by)
-        for (int bx = 1; bx + 1 < columns; ++bx) {
-            double sum = 0;
-            for (int y = by * 16; y < by * 16 + 16; ++y)
-                for (int x = bx * 16; x < bx * 16 + 16; ++x)
-                    if (order.channelAt[(y & 1) * 2 + (x & 1)] == channel)
-                        sum += image.pixels()[static_cast<std::size_t>(y) * width + x];
-            means.push_back(sum / 64);
-        }
-    double mean = 0, worst = 0;
-    for (double m : means)
-        mean += m / static_cast<double>(means.size());
-    for (double m : means)
-        worst = std::max(worst, std::fabs(m / mean - 1.0));
-    return worst;
-}
-
-TEST(CorrectedFlatField, EveryChannelIsFlatWithinOnePercent) {
-    const int depth[4][2] = {{10, 64}, {12, 256}, {8, 0}, {14, 1024}}; // bits, black level
-    for (int i = 0; i < 4; ++i) {
-        const lsc_test::Order& order = kOrders[i];
-        testing_support::FlatFieldShape shape;
-        shape.width = 320;
-        shape.height = 240;
-        shape.cfa = order.cfa;
-        shape.bits = depth[i][0];
-        shape.blackLevel = depth[i][1];
-        shape.cornerLevel = 0.5;
-        shape.colourShading = 0.08;
-        shape.noise = 0.002; // about 2 codes at 10 bits
-        shape.seed = 7 + static_cast<std::uint32_t>(shape.bits);
-        const testing_support::FlatField field = testing_support::makeFlatField(shape);
-        const std::vector<float> normalized = field.normalized();
-
-        ShadingSettings settings;
-        settings.blackLevel =
-            static_cast<float>(shape.blackLevel) / static_cast<float>(field.fullScale());
-        settings.sampleAngleStep = 8;
-        settings.procSamplingFactor = 4;
-        settings.sampleWindow = 3; // the median of nine blocks per sample takes out the noise
-        settings.quiet = true;
-        img::BayerImage image;
-        makeImage(
-            image, shape.width, shape.height, order.cfa,
-            [&](int x, int y) { return normalized[static_cast<std::size_t>(y) * 320 + x]; },
-            static_cast<std::uint16_t>(shape.bits));
-        std::ostringstream messages;
-        const img::BayerImage levelled = levelledImage(image, settings.blackLevel);
-        FitDeviations deviations;
-        const FitResult fit = fitLensShading(collectSamples(levelled, settings, messages),
-                                             {levelled, true}, settings, messages, deviations);
-        // The correction gets the prepared image, black level included.
-        const img::BayerImage corrected =
-            applyLensShading(image, fit.correction, settings.blackLevel, settings.applyStep);
-        for (int k = 0; k < 4; ++k)
-            EXPECT_LT(worstBlockDeviation(corrected, order, k), 0.01) << order.name << " " << k;
-    }
 }
 
 } // namespace
