@@ -54,7 +54,7 @@ RunReport exampleRunReport() {
     report.havePrepared = true;
     report.preparedWidth = 160;
     report.preparedHeight = 120;
-    report.shadingBefore = exampleBlocks(16, 12, [](int k, double u, double v) {
+    report.shadingBefore = exampleBlocks(4, 3, [](int k, double u, double v) {
         const double r2 = (u - 0.5) * (u - 0.5) + (v - 0.5) * (v - 0.5);
         return static_cast<float>(1.0 - (0.9 + 0.1 * k) * r2 * 1.4);
     });
@@ -64,15 +64,15 @@ RunReport exampleRunReport() {
             for (int c = 0; c < 10; ++c)
                 report.controlGrids[k][r * 10 + c] = static_cast<float>(
                     1.0 + (0.5 + 0.1 * k) * ((r - 4.5) * (r - 4.5) + (c - 4.5) * (c - 4.5)) / 40.5);
-    for (std::uint32_t y = 0; y < 120; y += 8)
-        for (std::uint32_t x = 0; x < 160; x += 8)
+    for (std::uint32_t y = 0; y < 120; y += 40)
+        for (std::uint32_t x = 0; x < 160; x += 40)
             report.samplePoints.emplace_back(x, y);
     report.targetLevels[0] = 0.41f;
     report.targetLevels[1] = report.targetLevels[2] = 0.62f;
     report.targetLevels[3] = 0.37f;
     report.maxGain = 6.0f;
     report.haveResidual = true;
-    report.residualAfter = exampleBlocks(16, 12, [](int k, double u, double v) {
+    report.residualAfter = exampleBlocks(4, 3, [](int k, double u, double v) {
         return static_cast<float>(0.006 * std::sin(6.0 * u + k) * std::cos(5.0 * v));
     });
     report.haveWhiteBalance = true;
@@ -81,10 +81,10 @@ RunReport exampleRunReport() {
     report.flattenedRatios[0] = 1.000124f;
     report.flattenedRatios[1] = 0.999871f;
     report.haveDelta = true;
-    report.deltaColumns = 20;
-    report.deltaRows = 15;
-    for (int r = 0; r < 15; ++r)
-        for (int c = 0; c < 20; ++c)
+    report.deltaColumns = 6;
+    report.deltaRows = 4;
+    for (int r = 0; r < 4; ++r)
+        for (int c = 0; c < 6; ++c)
             report.delta.push_back(
                 static_cast<float>(0.4 + 2.5 * std::fabs(std::sin(0.3 * c) * std::cos(0.25 * r))));
     report.threshold = 8.0f;
@@ -173,11 +173,21 @@ struct CommaDecimal : std::numpunct<char> {
 
 class ReportPage : public ::testing::TestWithParam<PageCase> {};
 
+// The page without its drawings' outlines (<path> elements): every page but
+// the passing one keeps its text, numbers and figures' frames, and the
+// passing page alone carries the outlines, drawn the same way on every page.
+std::string withoutOutlines(std::string page) {
+    for (std::size_t at = 0; (at = page.find("<path ", at)) != std::string::npos;)
+        page.erase(at, page.find("/>", at) + 2 - at);
+    return page;
+}
+
 TEST_P(ReportPage, MatchesTheKeptPageInAnyLocale) {
     RunReport report = exampleRunReport();
     GetParam().change(report);
-    const std::string page = runReportHtml(report);
-    lsc_test::expectGolden(std::string("report/") + GetParam().name + ".html", page);
+    const std::string page = runReportHtml(report), name = GetParam().name;
+    lsc_test::expectGolden("report/" + name + ".html",
+                           name == "passed" ? page : withoutOutlines(page));
     const std::locale previous =
         std::locale::global(std::locale(std::locale::classic(), new CommaDecimal));
     const std::string again = runReportHtml(report);
