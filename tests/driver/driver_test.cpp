@@ -16,7 +16,7 @@
 #include "driver/run.h"
 #include "driver/stage_timer.h"
 #include "lsc/apan_exception.h"
-#include "tests/lsc/caught_exception.h"
+#include "tests/lsc/test_helpers.h"
 #include "tests/support/temp_dir.h"
 
 namespace {

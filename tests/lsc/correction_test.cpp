@@ -8,11 +8,10 @@
 
 #include <gtest/gtest.h>
 
-#include "caught_exception.h"
-#include "golden_file.h"
 #include "lsc/lens_shading_correction.h"
 #include "lsc/xtest_surface.h"
 #include "lsc_test_image.h"
+#include "test_helpers.h"
 
 namespace lsc {
 namespace {

@@ -13,12 +13,11 @@
 
 #include <gtest/gtest.h>
 
-#include "caught_exception.h"
-#include "golden_file.h"
 #include "lsc/fit_checks.h"
 #include "lsc/lens_shading_fit.h"
 #include "lsc/sample_collection.h"
 #include "lsc_test_image.h"
+#include "test_helpers.h"
 
 namespace lsc {
 namespace {

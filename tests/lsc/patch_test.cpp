@@ -9,11 +9,11 @@
 
 #include <gtest/gtest.h>
 
-#include "caught_exception.h"
 #include "lsc/bernstein.h"
 #include "lsc/eval_patch.h"
 #include "lsc/patch_geometry.h"
 #include "lsc/patch_surface.h"
+#include "test_helpers.h"
 
 namespace lsc {
 namespace {

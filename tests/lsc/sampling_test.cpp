@@ -9,11 +9,10 @@
 
 #include <gtest/gtest.h>
 
-#include "caught_exception.h"
-#include "golden_file.h"
 #include "lsc/sample_collection.h"
 #include "lsc/sample_window.h"
 #include "lsc_test_image.h"
+#include "test_helpers.h"
 
 namespace lsc {
 namespace {

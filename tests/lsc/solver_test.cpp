@@ -7,10 +7,10 @@
 
 #include <gtest/gtest.h>
 
-#include "caught_exception.h"
 #include "lsc/bernstein.h"
 #include "lsc/bernstein_surface.h"
 #include "lsc/linear_least_squares.h"
+#include "test_helpers.h"
 
 namespace lsc {
 namespace {

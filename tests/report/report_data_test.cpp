@@ -9,8 +9,8 @@
 
 #include "lsc/eval_patch.h"
 #include "report/report_data.h"
-#include "tests/lsc/caught_exception.h"
 #include "tests/lsc/lsc_test_image.h"
+#include "tests/lsc/test_helpers.h"
 
 namespace report {
 namespace {
@@ -58,18 +58,6 @@ TEST(BlockMeans, DealsCellsToBlocksInOrderAndLeavesOutAnOddLastRowAndColumn) {
         blockMeans(mosaic(6, 4, img::kCfaRggb, [](int, int) { return 0.5f; }), 10, 10);
     EXPECT_EQ(coarse.columns, 3); // never finer than the cells
     EXPECT_EQ(coarse.rows, 2);
-}
-
-TEST(BlockMeans, RefusesImagesWithoutAWholeCellAndEmptyGrids) {
-    EXPECT_EQ(lsc_test::runtimeError([] { blockMeans(BayerImage(), 2, 2); }), kNoImage);
-    EXPECT_EQ(lsc_test::runtimeError([] {
-                  blockMeans(mosaic(1, 8, img::kCfaRggb, [](int, int) { return 1.0f; }), 2, 2);
-              }),
-              kNoImage);
-    EXPECT_EQ(lsc_test::runtimeError([] {
-                  blockMeans(mosaic(4, 4, img::kCfaRggb, [](int, int) { return 1.0f; }), 0, 2);
-              }),
-              kNoBlocks);
 }
 
 TEST(BlockMeans, ScaledToPeakAndDeviationFromTheMean) {
@@ -126,19 +114,24 @@ TEST(GainSurface, SamplesCellCentresAndTheImageCorners) {
     EXPECT_GT(surface.maximum, 1.98f);
 }
 
-TEST(GainSurface, RefusesUnusableGeometryAndEmptyGrids) {
+TEST(ReportData, RefusesImagesWithoutAWholeCellEmptyGridsAndUnusableGeometry) {
     float grid[kGridPoints] = {};
     const double squeezed[4] = {0.0, 0.5, 0.25, 0.5};
-    EXPECT_EQ(lsc_test::runtimeError([&] {
-                  sampleGainSurface(grid, 640, 480, squeezed, 4, 3);
-              }).rfind("Patch", 0),
-              0u);
-    EXPECT_EQ(
-        lsc_test::runtimeError([&] { sampleGainSurface(grid, 640, 480, kDefaultFractions, 0, 3); }),
-        kNoBlocks);
-    EXPECT_EQ(
-        lsc_test::runtimeError([&] { sampleGainSurface(grid, 0, 480, kDefaultFractions, 4, 3); }),
-        kNoImage);
+    const auto flat = [](int width, int height) {
+        return mosaic(width, height, img::kCfaRggb, [](int, int) { return 1.0f; });
+    };
+    const std::pair<std::function<void()>, std::string> cases[] = {
+        {[] { blockMeans(BayerImage(), 2, 2); }, kNoImage},
+        {[&] { blockMeans(flat(1, 8), 2, 2); }, kNoImage},
+        {[&] { blockMeans(flat(4, 4), 0, 2); }, kNoBlocks},
+        {[&] { sampleGainSurface(grid, 640, 480, kDefaultFractions, 0, 3); }, kNoBlocks},
+        {[&] { sampleGainSurface(grid, 0, 480, kDefaultFractions, 4, 3); }, kNoImage},
+        {[&] { sampleGainSurface(grid, 640, 480, squeezed, 4, 3); },
+         "Patch geometry leaves a patch without pixels: the patch factors (or patch sizes) must "
+         "give left and top patches of at least one pixel and leave room for the right and bottom "
+         "patches."}};
+    for (const auto& [call, error] : cases)
+        EXPECT_EQ(lsc_test::runtimeError(call), error);
 }
 
 } // namespace

@@ -14,8 +14,7 @@
 #include <gtest/gtest.h>
 
 #include "report/run_report_html.h"
-#include "tests/lsc/caught_exception.h"
-#include "tests/lsc/golden_file.h"
+#include "tests/lsc/test_helpers.h"
 #include "tests/support/temp_dir.h"
 
 namespace report {
