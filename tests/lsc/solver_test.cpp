@@ -3,6 +3,7 @@
 
 #include <cstdint>
 #include <stdexcept>
+#include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -72,6 +73,7 @@ TEST(LinearSystem, SolvesSmallSystemsExactly) {
         }
 }
 
+// Codes and texts of each failure, kept in tests/data/lsc/solver_errors.txt.
 TEST(LinearSystem, EachFailureHasItsCodeAndTexts) {
     struct Broken : apan::linearSystem<double> {
         using apan::linearSystem<double>::linearSystem;
@@ -91,42 +93,20 @@ TEST(LinearSystem, EachFailureHasItsCodeAndTexts) {
     bernsteinSurface surface(3, 3, 0.0, 640.0, 0.0, 480.0);
     for (int i = 0; i < 8; ++i)
         surface.addSample(i * 80.0, i * 60.0, 1.0);
-    const struct {
-        apan::exception e;
-        int code;
-        const char *what, *hint;
-    } cases[] = {
-        {caught([&] { Broken(&a, &x, &b).selfTest(); }), 1, "The linear system solver failed.",
-         "Selftest failure."},
-        {caught([&] { surface.fit(1e-7); }), 220,
-         "Under constrained fit being attempted. You must specify at least as many sample points "
-         "as control points.",
-         "While it's possible to solve undercontrained linear least squares systems we don't "
-         "support it."},
-        {caught([&] { apan::linearLeastSquares<double>(&a63, &x, &b6).solve(1e-10); }), 230,
-         "Warning: trying to solve a rank deficient system",
-         "Rank deficient matrices often occur whenyou have an ill-conditioned system of linear "
-         "equations."},
-        {caught([&] { apan::linearLeastSquares<double>(&zeroColumn, &x2, &b3).solve(1e-10); }), 230,
-         nullptr, nullptr},
-        {caught([&] { apan::linearLeastSquares<double>(&a24, &x4, &b2).solve(1e-10); }), 230,
-         nullptr, nullptr}, // underdetermined
-        {caught([&] { apan::linearSystem<double>(&singular, &x, &b).solve(1e-7); }), 231,
-         "Singular or undetermined linear system.",
-         "Usually the rows or columns are not linear independent."},
-        {caught([&] { apan::linearSystem<double>(&ones, &x2, &c2).solve(0.0); }), 231, nullptr,
-         nullptr},
-        {caught([&] { apan::linearSystem<double>(&a32, &x2, &b3).solve(1e-7); }), 231,
-         "You can only solve linear system if the 'A' matrix is square.",
-         "You need as many constraints as equations our the system can't be solved."},
+    const apan::exception errors[] = {
+        caught([&] { Broken(&a, &x, &b).selfTest(); }),
+        caught([&] { surface.fit(1e-7); }),
+        caught([&] { apan::linearLeastSquares<double>(&a63, &x, &b6).solve(1e-10); }),
+        caught([&] { apan::linearLeastSquares<double>(&zeroColumn, &x2, &b3).solve(1e-10); }),
+        caught([&] { apan::linearLeastSquares<double>(&a24, &x4, &b2).solve(1e-10); }), // wide
+        caught([&] { apan::linearSystem<double>(&singular, &x, &b).solve(1e-7); }),
+        caught([&] { apan::linearSystem<double>(&ones, &x2, &c2).solve(0.0); }),
+        caught([&] { apan::linearSystem<double>(&a32, &x2, &b3).solve(1e-7); }),
     };
-    for (const auto& c : cases) {
-        EXPECT_EQ(c.e.code(), c.code) << c.e.what();
-        if (c.what) {
-            EXPECT_STREQ(c.e.what(), c.what);
-            EXPECT_EQ(c.e.hint(), c.hint);
-        }
-    }
+    std::string text;
+    for (const apan::exception& e : errors)
+        text += std::to_string(e.code()) + " " + e.what() + "\n    " + e.hint() + "\n";
+    lsc_test::expectGolden("lsc/solver_errors.txt", text);
 }
 
 TEST(LinearSystem, SelfTestSolvesItsSystemAndBadShapesAreRefused) {
