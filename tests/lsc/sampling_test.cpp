@@ -50,14 +50,9 @@ TEST_F(Sampling, LevelledImageLosesTheBlackLevelAndIsClampedToOne) {
 TEST_F(Sampling, SineGridThenBorderLinesAndTheCountLine) {
     settings.sampleAngleStep = 90; // angles -90, 0, 90
     ASSERT_EQ(collect(64, 48), "");
-    // Sine grid: x in {0, 32} (64 = W is dropped), y in {0, 24}; then 6 columns
-    // of 24 samples (every T / 5 = 2 rows) and 6 rows of 22 (every L / 5 = 3 columns).
-    ASSERT_EQ(set.samples.size(), 4u + 6 * 24 + 6 * 22);
-    const std::uint32_t expected[6][2] = {{0, 0}, {0, 24}, {32, 0}, {32, 24}, {2, 0}, {2, 2}};
-    for (int i = 0; i < 6; ++i) { // the first border column, x = 3, reads the block at x = 2
-        EXPECT_EQ(set.samples[static_cast<std::size_t>(i)].x, expected[i][0]) << i;
-        EXPECT_EQ(set.samples[static_cast<std::size_t>(i)].y, expected[i][1]) << i;
-    }
+    // Sine grid x in {0, 32} (64 = W is dropped), y in {0, 24}; then 6 columns
+    // of 24 samples (every T / 5 = 2 rows) and 6 rows of 22 (every L / 5 = 3
+    // columns); the first border column, x = 3, reads the block at x = 2.
     EXPECT_EQ(messages.str(), "Number of sample points = 280\n");
     std::string positions; // all of them, and those of odd patch sizes, against the kept list
     for (const int width : {64, 68}) {
