@@ -10,7 +10,6 @@
 
 #include "lsc/lens_shading_correction.h"
 #include "lsc/xtest_surface.h"
-#include "lsc_test_image.h"
 #include "test_helpers.h"
 
 namespace lsc {

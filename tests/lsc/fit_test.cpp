@@ -16,7 +16,6 @@
 #include "lsc/fit_checks.h"
 #include "lsc/lens_shading_fit.h"
 #include "lsc/sample_collection.h"
-#include "lsc_test_image.h"
 #include "test_helpers.h"
 
 namespace lsc {

@@ -11,7 +11,6 @@
 
 #include "lsc/sample_collection.h"
 #include "lsc/sample_window.h"
-#include "lsc_test_image.h"
 #include "test_helpers.h"
 
 namespace lsc {

@@ -14,7 +14,6 @@
 #include "report/report_data.h"
 #include "report/report_svg.h"
 #include "report/report_text.h"
-#include "tests/lsc/lsc_test_image.h"
 #include "tests/lsc/test_helpers.h"
 
 namespace report {
