@@ -209,7 +209,7 @@ protected:
     // odd copies, links to it, and names that are no regular files.
     void prepareDirectory(const Case& c) {
         const CaptureInfo info = captureOf(c.get("capture"));
-        prepare(unescaped(c.get("cfg")), shapeOf(c.get("shape")), info);
+        prepare(c.get("cfg"), shapeOf(c.get("shape")), info);
         for (const std::string& area : c.all("paint"))
             paint(field_, area);
         const std::string capture = testing_support::kqraw2FileBytes(field_, info);
@@ -293,6 +293,12 @@ protected:
 
 TEST_P(Cases, Run) {
     const Case& c = GetParam();
+    // A misspelt key would silently drop its check.
+    static const std::regex known("shape|capture|paint|cfg|(file|other|golden|cut) .+|before|run|"
+                                  "stdin|limit|status|out|err|tail|has|contains|lacks|exists|"
+                                  "absent|same|created|json|then");
+    for (const auto& entry : c.keys)
+        ASSERT_TRUE(std::regex_match(entry.first, known)) << "unknown key " << entry.first;
     prepareDirectory(c);
     if (HasFatalFailure())
         return;
