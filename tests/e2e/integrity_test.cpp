@@ -69,10 +69,14 @@ TEST_F(Integrity, AnotherRunsRegisterFileNeverReachesTheBinaryData) {
 // creation of its temporary) ends the run with 128 + signal, removes the
 // temporary and keeps the previous file.
 TEST_F(Integrity, SignalsDuringAWriteLeaveNothingBehind) {
-    FlatFieldShape large = smallShape();
-    large.width = 4000;
-    large.height = 3000;
-    prepare("", large);
+    // Large enough for the signal to arrive during the write; a constant
+    // level, as nothing but the write is under test.
+    FlatField large;
+    large.shape.width = 4000;
+    large.shape.height = 3000;
+    large.samples.assign(4000 * 3000, 512);
+    write("flat.kqraw", testing_support::kqraw2FileBytes(large));
+    write("lsc.cfg", "");
     for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
         write("out.bmp", "previous contents\n");
         const int watch = inotify_init1(IN_CLOEXEC);
