@@ -9,6 +9,7 @@
 #include "tests/e2e/e2e_fixture.h"
 
 #include <fcntl.h>
+#include <poll.h>
 #include <sys/inotify.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -85,8 +86,15 @@ TEST_F(Integrity, SignalsDuringAWriteLeaveNothingBehind) {
         const pid_t tool = startTool({"--config", "lsc.cfg", "--input", "flat.kqraw", "--calibrate",
                                       "cal.txt", "--inputasbmp", "out.bmp"},
                                      dir_.path());
+        // Until the temporary appears; a run that ends first fails the test
+        // instead of leaving it waiting.
         alignas(inotify_event) char events[4096];
         for (bool seen = false; !seen;) {
+            pollfd ready = {watch, POLLIN, 0};
+            if (poll(&ready, 1, 100) == 0) {
+                ASSERT_EQ(waitpid(tool, nullptr, WNOHANG), 0) << "no temporary written";
+                continue;
+            }
             const ssize_t n = ::read(watch, events, sizeof events);
             ASSERT_GT(n, 0);
             for (ssize_t at = 0; at < n;) {
