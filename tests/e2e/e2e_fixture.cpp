@@ -1,7 +1,10 @@
 #include "tests/e2e/e2e_fixture.h"
 
+#include <cstdint>
 #include <fstream>
 #include <sstream>
+
+#include "blob/md5.h"
 
 namespace e2e {
 
@@ -13,6 +16,20 @@ void expectGolden(const std::string& actual, const std::string& goldenName) {
     std::ofstream(kept, std::ios::binary) << actual;
     ADD_FAILURE() << goldenName << " differs; see: diff " << kGoldenDir << goldenName << " "
                   << kept;
+}
+
+std::string outputDigest(std::string bytes) {
+    if (bytes.compare(0, 9, "KQRAWFILE") == 0 && bytes.size() >= 68)
+        bytes.replace(60, 8, 8, '\0');
+    const blob::Md5Digest digest =
+        blob::md5(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
+    static const char digits[] = "0123456789abcdef";
+    std::string hex;
+    for (std::uint8_t byte : digest) {
+        hex += digits[byte >> 4];
+        hex += digits[byte & 15];
+    }
+    return hex;
 }
 
 std::vector<std::string> lines(const std::string& text) {

@@ -70,6 +70,10 @@ inline const std::string kGoldenDir = std::string(LSC_SOURCE_DIR) + "/tests/data
 // directory for a diff.
 void expectGolden(const std::string& actual, const std::string& goldenName);
 
+// The MD5 sum of an output as hexadecimal text; a KQRAW2 file's header
+// carries its wall-clock creation time (8 bytes at 60), which is blanked.
+std::string outputDigest(std::string bytes);
+
 // The lines of a text, without their line ends.
 std::vector<std::string> lines(const std::string& text);
 // True when `needle` occurs in `text` as a whole line.

@@ -13,7 +13,7 @@
 
 #include <gtest/gtest.h>
 
-#include "blob/md5.h"
+#include "tests/e2e/e2e_fixture.h"
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
 
@@ -25,7 +25,7 @@ using testing_support::toolCommandPrefix;
 using testing_support::writeFile;
 
 const std::string kSourceDir = LSC_SOURCE_DIR;
-const std::string kGoldenDir = kSourceDir + "/tests/data/golden/";
+const std::string kKeptDir = kSourceDir + "/tests/data/golden/";
 
 struct GoldenCase {
     const char* name;
@@ -104,31 +104,12 @@ std::vector<std::string> words(const std::string& text) {
     return result;
 }
 
-// A KQRAW2 file's header carries its wall-clock creation time (8 bytes at 60).
-std::string withoutCreationTime(std::string bytes) {
-    if (bytes.compare(0, 9, "KQRAWFILE") == 0 && bytes.size() >= 68)
-        bytes.replace(60, 8, 8, '\0');
-    return bytes;
-}
-
-std::string md5Hex(const std::string& bytes) {
-    const blob::Md5Digest digest =
-        blob::md5(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
-    static const char digits[] = "0123456789abcdef";
-    std::string hex;
-    for (std::uint8_t byte : digest) {
-        hex += digits[byte >> 4];
-        hex += digits[byte & 15];
-    }
-    return hex;
-}
-
 // "<md5>  <name>" for each binary output the run wrote, in table order.
 std::string checksums(const testing_support::TempDir& dir) {
     std::string text;
     for (const char* name : kBinaryOutputs)
         if (testing_support::fileExists(dir.file(name)))
-            text += md5Hex(withoutCreationTime(readFile(dir.file(name)))) + "  " + name + "\n";
+            text += outputDigest(readFile(dir.file(name))) + "  " + name + "\n";
     return text;
 }
 
@@ -158,7 +139,7 @@ void expectSameText(const std::string& file, const std::string& expected,
 
 // Compares (or, when updating, stores) the outputs of one run.
 void checkOutputs(const std::string& name, const testing_support::TempDir& dir) {
-    const std::string golden = kGoldenDir + name + "/";
+    const std::string golden = kKeptDir + name + "/";
     std::vector<std::pair<std::string, std::string>> outputs;
     for (const char* file : kTextOutputs)
         if (testing_support::fileExists(dir.file(file)))
