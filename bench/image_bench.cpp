@@ -14,7 +14,7 @@
 #include "image/raw_reader.h"
 #include "image/sample_memory.h"
 #include "image/sample_scaling.h"
-#include "tests/support/flat_field.h"
+#include "tools/flatfield/flat_field.h"
 
 #include <sys/mman.h>
 #include <unistd.h>
@@ -39,7 +39,7 @@ public:
         for (std::size_t i = 0; i < samples.size(); ++i)
             samples[i] = static_cast<std::uint16_t>((i * 2654435761u >> 7) & 1023);
         const float gains[4] = {1.0f, 1.0f, 1.0f, 1.0f};
-        const std::string bytes = testing_support::KqRawBuilder()
+        const std::string bytes = flatfield::KqRawBuilder()
                                       .header(kWidth, kHeight, 0x52474742)
                                       .pixels(samples)
                                       .capture(33.0f, gains)

@@ -37,9 +37,9 @@
 #include "lsc/lens_shading_fit.h"
 #include "lsc/sample_collection.h"
 #include "lsc/shading_settings.h"
-#include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
+#include "tools/flatfield/flat_field.h"
 
 using lsc::applyLensShading;
 using lsc::collectSamples;
@@ -54,8 +54,8 @@ using img::BayerImage;
 
 namespace {
 
-using testing_support::FlatField;
-using testing_support::FlatFieldShape;
+using flatfield::FlatField;
+using flatfield::FlatFieldShape;
 
 constexpr int kBlock = 8;
 
@@ -90,15 +90,14 @@ const PreparedField& preparedField(bool offCentre, bool medianFilter, std::uint3
     if (found != cache.end())
         return found->second;
     PreparedField& entry = cache[key];
-    entry.field = testing_support::makeFlatField(benchShape(offCentre, seed));
+    entry.field = flatfield::makeFlatField(benchShape(offCentre, seed));
     entry.defect.assign(entry.field.samples.size(), false);
     for (std::size_t at : entry.field.hotPixels)
         entry.defect[at] = true;
     for (std::size_t at : entry.field.deadPixels)
         entry.defect[at] = true;
     testing_support::TempDir dir;
-    testing_support::writeFile(dir.file("flat.kqraw"),
-                               testing_support::kqraw2FileBytes(entry.field));
+    testing_support::writeFile(dir.file("flat.kqraw"), flatfield::kqraw2FileBytes(entry.field));
     // Without the filter the defects stay, and the pixel limits must let them through.
     testing_support::writeFile(dir.file("lsc.cfg"), medianFilter
                                                         ? "shared.proc_sampling_factor = 1;\n"

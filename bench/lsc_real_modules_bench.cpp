@@ -40,10 +40,10 @@
 #include "image/bayer_image.h"
 #include "lsc/fit_result.h"
 #include "lsc/lens_shading_correction.h"
-#include "tests/support/flat_field.h"
-#include "tests/support/module_shading.h"
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
+#include "tools/flatfield/flat_field.h"
+#include "tools/flatfield/module_shading.h"
 
 using lsc::applyLensShading;
 using lsc::ShadingCorrection;
@@ -52,9 +52,9 @@ using img::BayerImage;
 
 namespace {
 
-using testing_support::FlatField;
-using testing_support::FlatFieldShape;
-using testing_support::ModuleShading;
+using flatfield::FlatField;
+using flatfield::FlatFieldShape;
+using flatfield::ModuleShading;
 
 struct Module {
     const char* name;
@@ -122,7 +122,7 @@ const Capture& capture(const Module& module, int temperature, int seed) {
     const int scale = quick() ? 2 : 1;
     shape.width = (module.width / scale) & ~1;
     shape.height = (module.height / scale) & ~1;
-    shape.cfa = testing_support::cfaOfBayerOrder(module.order);
+    shape.cfa = flatfield::cfaOfBayerOrder(module.order);
     shape.module = std::make_shared<const ModuleShading>(
         ModuleShading::fromTuningFile(dataPath(module.file), temperature));
     shape.fullWell = 5000;
@@ -130,10 +130,10 @@ const Capture& capture(const Module& module, int temperature, int seed) {
     shape.defects = 300;
     shape.blackLevel = module.blackLevel;
     shape.seed = std::uint32_t(seed);
-    entry.field = testing_support::makeFlatField(shape);
+    entry.field = flatfield::makeFlatField(shape);
     entry.dir = std::make_unique<testing_support::TempDir>();
     testing_support::writeFile(entry.dir->file("flat.kqraw"),
-                               testing_support::kqraw2FileBytes(entry.field));
+                               flatfield::kqraw2FileBytes(entry.field));
     return entry;
 }
 

@@ -12,7 +12,7 @@
 #include "image/image_buffer.h"
 #include "prep/bayer_planes.h"
 #include "prep/median_filter.h"
-#include "tests/support/flat_field.h"
+#include "tools/flatfield/flat_field.h"
 
 #include <unistd.h>
 
@@ -79,12 +79,11 @@ BENCHMARK(BM_MedianFilterDownsample)
 
 // Loading the same capture from a KQRAW2 file, for comparison.
 void BM_LoadKqraw2(benchmark::State& state) {
-    testing_support::FlatFieldShape shape;
+    flatfield::FlatFieldShape shape;
     shape.width = kWidth;
     shape.height = kHeight;
     shape.noise = 0.01;
-    const std::string bytes =
-        testing_support::kqraw2FileBytes(testing_support::makeFlatField(shape));
+    const std::string bytes = flatfield::kqraw2FileBytes(flatfield::makeFlatField(shape));
     char path[] = "/tmp/prep_bench_XXXXXX";
     const int fd = mkstemp(path);
     if (fd < 0 || write(fd, bytes.data(), bytes.size()) != static_cast<ssize_t>(bytes.size())) {

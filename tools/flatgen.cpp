@@ -12,10 +12,10 @@
 #include <vector>
 
 #include "image/output_file.h"
-#include "tests/support/flat_field.h"
-#include "tests/support/module_shading.h"
+#include "tools/flatfield/flat_field.h"
+#include "tools/flatfield/module_shading.h"
 
-using namespace testing_support;
+using namespace flatfield;
 
 using img::writeWholeFile;
 

@@ -12,7 +12,7 @@
 #include <sstream>
 
 #include "tests/e2e/e2e_fixture.h"
-#include "tests/support/module_shading.h"
+#include "tools/flatfield/module_shading.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -97,12 +97,12 @@ FlatFieldShape shapeOf(const std::string& text) {
         const std::string key = setting.substr(0, eq), value = setting.substr(eq + 1);
         if (key == "module") {
             const auto at = value.find('@');
-            shape.module = std::make_shared<const testing_support::ModuleShading>(
-                testing_support::ModuleShading::fromTuningFile(
+            shape.module = std::make_shared<const flatfield::ModuleShading>(
+                flatfield::ModuleShading::fromTuningFile(
                     std::string(LSC_SOURCE_DIR) + "/tests/data/real_modules/" + value.substr(0, at),
                     std::stod(value.substr(at + 1))));
         } else if (key == "order") {
-            shape.cfa = testing_support::cfaOfBayerOrder(value);
+            shape.cfa = flatfield::cfaOfBayerOrder(value);
         } else {
             const double number = std::stod(value);
             const int whole = static_cast<int>(number);
@@ -215,25 +215,25 @@ protected:
             return runs.find(" " + name + " ") != std::string::npos;
         };
         const CaptureInfo info = captureOf(c.get("capture"));
-        field_ = testing_support::makeFlatField(shapeOf(c.get("shape")));
+        field_ = flatfield::makeFlatField(shapeOf(c.get("shape")));
         for (const std::string& area : c.all("paint"))
             paint(field_, area);
         write("lsc.cfg", c.get("cfg"));
-        const std::string capture = testing_support::kqraw2FileBytes(field_, info);
+        const std::string capture = flatfield::kqraw2FileBytes(field_, info);
         write("flat.kqraw", capture);
         write("empty.kqraw", "");
-        write("flat.txt", testing_support::headerlessDetailsText(field_));
+        write("flat.txt", flatfield::headerlessDetailsText(field_));
         write("guid.txt",
-              testing_support::headerlessDetailsText(field_) + "image.sensor_guid = IMX219\n");
+              flatfield::headerlessDetailsText(field_) + "image.sensor_guid = IMX219\n");
         // The larger files only where a run names them.
         if (used("short.kqraw"))
             write("short.kqraw", capture.substr(0, capture.size() - 100));
         if (used("flat.raw"))
-            write("flat.raw", testing_support::headerlessFileBytes(field_));
+            write("flat.raw", flatfield::headerlessFileBytes(field_));
         if (used("fixed.kqraw"))
-            write("fixed.kqraw", testing_support::fixedHeaderFileBytes(field_, info));
+            write("fixed.kqraw", flatfield::fixedHeaderFileBytes(field_, info));
         if (used("odd.kqraw")) {
-            testing_support::KqRawBuilder odd;
+            flatfield::KqRawBuilder odd;
             odd.header(640, 480, 0x12345678).pixels(field_.samples);
             write("odd.kqraw", odd.bytes());
         }
@@ -252,8 +252,8 @@ protected:
             if (key.rfind("file ", 0) == 0)
                 write(key.substr(5), value);
             if (key.rfind("other ", 0) == 0)
-                write(key.substr(6), testing_support::kqraw2FileBytes(
-                                         testing_support::makeFlatField(shapeOf(value))));
+                write(key.substr(6),
+                      flatfield::kqraw2FileBytes(flatfield::makeFlatField(shapeOf(value))));
         }
     }
 

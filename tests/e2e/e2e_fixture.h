@@ -7,15 +7,15 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
 #include "tests/support/tool_runner.h"
+#include "tools/flatfield/flat_field.h"
 
 namespace e2e {
 
-using testing_support::CaptureInfo;
-using testing_support::FlatField;
-using testing_support::FlatFieldShape;
+using flatfield::CaptureInfo;
+using flatfield::FlatField;
+using flatfield::FlatFieldShape;
 using testing_support::ToolResult;
 
 // A small, clean 10-bit RGGB flat field that passes the default checks (the
@@ -41,8 +41,8 @@ protected:
     // Writes "flat.kqraw" (a container of `shape`) and "lsc.cfg" with `config`.
     void prepare(const std::string& config = "", const FlatFieldShape& shape = smallShape(),
                  const CaptureInfo& capture = {}) {
-        field_ = testing_support::makeFlatField(shape);
-        write("flat.kqraw", testing_support::kqraw2FileBytes(field_, capture));
+        field_ = flatfield::makeFlatField(shape);
+        write("flat.kqraw", flatfield::kqraw2FileBytes(field_, capture));
         write("lsc.cfg", config);
     }
 

@@ -76,7 +76,7 @@ TEST_F(Integrity, SignalsDuringAWriteLeaveNothingBehind) {
     large.shape.width = 4000;
     large.shape.height = 3000;
     large.samples.assign(4000 * 3000, 512);
-    write("flat.kqraw", testing_support::kqraw2FileBytes(large));
+    write("flat.kqraw", flatfield::kqraw2FileBytes(large));
     write("lsc.cfg", "");
     for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
         write("out.bmp", "previous contents\n");
@@ -117,7 +117,7 @@ TEST_F(Integrity, SignalsDuringAWriteLeaveNothingBehind) {
 // enough to hold them, is refused before allocating.
 TEST_F(Integrity, SparseContainerBeyondTheSampleMemoryLimitIsRefused) {
     prepare();
-    testing_support::KqRawBuilder container;
+    flatfield::KqRawBuilder container;
     container.header(65535, 32769, 0x52474742)
         .block("PIXELDATA_111107", std::string(8, '\0'), 0xFFFFFFF8u);
     write("huge.kqraw", container.bytes());

@@ -10,13 +10,13 @@
 #include "image/bayer_image.h"
 #include "raw_test_files.h"
 #include "tests/blob/golden_file.h"
-#include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
+#include "tools/flatfield/flat_field.h"
 
 namespace img {
 namespace {
 
-using testing_support::KqRawBuilder;
+using flatfield::KqRawBuilder;
 using testing_support::readFile;
 using testing_support::writeFile;
 

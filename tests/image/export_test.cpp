@@ -18,8 +18,8 @@
 #include "image/image_save.h"
 #include "raw_test_files.h"
 #include "tests/blob/golden_file.h"
-#include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
+#include "tools/flatfield/flat_field.h"
 
 namespace img {
 namespace {
@@ -168,7 +168,7 @@ TEST(Export, FixedHeaderAndContainerInputsAreStoredBackAsRead) {
     ASSERT_EQ(imageSave(dir.file("a").c_str(), fromFile(fixed).get(), 3, nullptr, 0), 0);
     EXPECT_TRUE(readFile(dir.file("a")) == fixed);
     // A container keeps its blocks byte for byte; header and pixels follow the image.
-    const std::string input = testing_support::KqRawBuilder()
+    const std::string input = flatfield::KqRawBuilder()
                                   .header(2, 1, 0x52474742)
                                   .pixels({3, 2000})
                                   .block("M3DATA____111107", "m3", 2, "0123456789abcdef")

@@ -15,14 +15,14 @@
 #include "image/raw_reader.h"
 #include "raw_test_files.h"
 #include "tests/blob/golden_file.h"
-#include "tests/support/flat_field.h"
 #include "tests/support/temp_dir.h"
+#include "tools/flatfield/flat_field.h"
 
 namespace img {
 namespace {
 
+using flatfield::KqRawBuilder;
 using rawtest::readBytes;
-using testing_support::KqRawBuilder;
 using Samples = std::vector<std::uint16_t>;
 
 std::string container(std::uint32_t w, std::uint32_t h, const Samples& s) {

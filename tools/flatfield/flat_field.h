@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-namespace testing_support {
+namespace flatfield {
 
 class ModuleShading;
 
@@ -118,4 +118,4 @@ std::uint32_t bayerCodeOf(std::uint32_t cfa);
 std::string bayerOrderName(std::uint32_t cfa);
 std::uint32_t cfaOfBayerOrder(const std::string& name);
 
-} // namespace testing_support
+} // namespace flatfield

@@ -1,4 +1,4 @@
-#include "tests/support/flat_field.h"
+#include "tools/flatfield/flat_field.h"
 
 #include <algorithm>
 #include <cmath>
@@ -10,9 +10,9 @@
 #include <stdexcept>
 
 #include "image/hex_text.h"
-#include "tests/support/module_shading.h"
+#include "tools/flatfield/module_shading.h"
 
-namespace testing_support {
+namespace flatfield {
 
 namespace {
 
@@ -380,4 +380,4 @@ std::uint32_t cfaOfBayerOrder(const std::string& name) {
     return 0;
 }
 
-} // namespace testing_support
+} // namespace flatfield

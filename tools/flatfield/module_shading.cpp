@@ -1,4 +1,4 @@
-#include "tests/support/module_shading.h"
+#include "tools/flatfield/module_shading.h"
 
 #include <algorithm>
 #include <cmath>
@@ -8,7 +8,7 @@
 
 #include <nlohmann/json.hpp>
 
-namespace testing_support {
+namespace flatfield {
 
 namespace {
 
@@ -232,4 +232,4 @@ std::vector<double> ModuleShading::mosaic(int width, int height, int phase) cons
     return values;
 }
 
-} // namespace testing_support
+} // namespace flatfield

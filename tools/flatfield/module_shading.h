@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-namespace testing_support {
+namespace flatfield {
 
 class ModuleShading {
 public:
@@ -52,4 +52,4 @@ private:
 // beyond the outer nodes: value(t) = sum of weights[i] * node value i.
 std::vector<double> splineWeights(int count, double size, double t);
 
-} // namespace testing_support
+} // namespace flatfield
