@@ -4,7 +4,6 @@
 #include <cmath>
 #include <csetjmp>
 #include <cstdint>
-#include <functional>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -95,67 +94,42 @@ std::string written(const std::string& path, int format) {
     return bytes;
 }
 
-struct ExportCase {
-    const char* name;
-    std::function<ImagePtr()> image;
-    int format;
-};
-
-// Formats: 2 FIXRAW, 3 KQRAW, 4 KQRAW2, 6 TIFF, 7 BMP, 9 PNM.
-const ExportCase kExports[] = {
-    {"rgb_rows_padded.bmp", [] { return rgb(3, 2); }, 7},
-    {"rgb_no_padding.bmp", [] { return rgb(4, 1); }, 7},
-    {"grey_palette.bmp",
-     [] {
-         return mono(2, 2, {10, 20, 30, 40});
-     },
-     7},
-    {"grey_properties.pgm",
-     [] {
-         return mono(2, 1, {'a', 'b'});
-     },
-     9},
-    {"raw_clipped_metadata.pgm",
-     [] {
-         return withMetadata(raw16(2, 1, 12, {0x0123, 0xFFFF}));
-     },
-     9},
-    {"float_scaled.pgm", floats, 9},
-    {"planar_interleaved.ppm", [] { return rgb(2, 1, kBufferPlanar); }, 9},
-    {"rgb.tif", [] { return rgb(3, 2); }, 6},
-    {"raw_levels_metadata.tif", rawWithLevels, 6},
-    {"planar.tif", [] { return rgb(2, 1, kBufferPlanar); }, 6},
-    {"float.tif", floats, 6},
-    {"bare_samples.fixraw",
-     [] {
-         return raw16(2, 1, 8, {0x0102, 0x00FF});
-     },
-     2},
-    {"fresh_header.kqraw",
-     [] {
-         return raw16(2, 1, 10, {7, 1023});
-     },
-     3},
-    {"fresh_container.kqraw2",
-     [] {
-         return raw16(1, 2, 12, {4095, 0});
-     },
-     4},
-    {"nkraw_translated.kqraw",
-     [] {
-         return fromFile(rawtest::nkrawFile(2, 1, {1, 1500}));
-     },
-     3},
-};
+// An image as tests/data/image/exports.txt describes it.
+ImagePtr described(std::istringstream& in) {
+    std::string kind;
+    std::int32_t w = 0, h = 0;
+    std::uint16_t bits = 8;
+    in >> kind >> w >> h;
+    if (kind.rfind("raw", 0) == 0)
+        in >> bits;
+    std::vector<double> values;
+    for (double v = 0; in >> v;)
+        values.push_back(v);
+    if (kind == "floats" || kind == "levels" || kind == "nkraw")
+        return kind == "floats"   ? floats()
+               : kind == "levels" ? rawWithLevels()
+                                  : fromFile(rawtest::nkrawFile(2, 1, {1, 1500}));
+    if (kind == "mono")
+        return mono(w, h, values);
+    if (kind == "raw")
+        return raw16(w, h, bits, values);
+    if (kind == "raw+meta")
+        return withMetadata(raw16(w, h, bits, values));
+    return rgb(w, h, kind == "rgbp" ? kBufferPlanar : kBufferInterleaved);
+}
 
 TEST(Export, WritesTheGoldenFiles) {
     TempDir dir;
-    for (const ExportCase& c : kExports) {
-        const ImagePtr image = c.image();
-        ASSERT_EQ(imageSave(dir.file(c.name).c_str(), image.get(), c.format, nullptr, 0), 0)
-            << c.name;
-        testing_support::expectGolden(std::string("image/export/") + c.name,
-                                      written(dir.file(c.name), c.format));
+    const std::vector<std::string> rows = testing_support::dataRows("image/exports.txt");
+    EXPECT_EQ(rows.size(), 15u);
+    for (const std::string& row : rows) {
+        std::istringstream in(row);
+        std::string name;
+        int format = 0;
+        in >> name >> format;
+        const ImagePtr image = described(in);
+        ASSERT_EQ(imageSave(dir.file(name).c_str(), image.get(), format, nullptr, 0), 0) << row;
+        testing_support::expectGolden("image/export/" + name, written(dir.file(name), format));
     }
 }
 

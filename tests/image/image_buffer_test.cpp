@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <cstring>
 #include <memory>
+#include <sstream>
+#include <string>
 #include <tuple>
 
 #include <gtest/gtest.h>
@@ -15,6 +17,7 @@
 #include "image/image_result.h"
 #include "image/sample_memory.h"
 #include "image/sample_scaling.h"
+#include "tests/blob/golden_file.h"
 #include "tests/support/temp_dir.h"
 
 #include <fcntl.h>
@@ -29,54 +32,40 @@ ImagePtr create(std::int32_t w, std::int32_t h, std::uint16_t bits, std::uint16_
     return ImagePtr(imageCreate(w, h, bits, spp, images, 0, cfa, pixel, buffer, type, rc));
 }
 
+// A type by the name its naming function gives it.
+std::uint32_t byName(const char* (*name)(std::uint32_t) noexcept, const std::string& wanted) {
+    std::uint32_t value = 0;
+    while (wanted != name(value) && value < 9)
+        ++value;
+    return value;
+}
+
 TEST(ImageCreate, LevelsCfaAndRefusals) {
-    const struct {
-        std::int32_t w, h;
-        std::uint16_t bits, spp;
-        std::uint32_t pixel, buffer, type, images;
-        int rc = 0;
-        std::uint16_t bitsKept = 0;
-        float white = 0;
-        std::uint32_t cfa = 0;
-    } cases[] = {
-        {4, 2, 16, 1, kPixelRaw, kBufferRawCfa, kDataUint16, 1, 0, 16, 65536, kCfaRggb},
-        {2, 2, 12, 1, kPixelRaw, kBufferRawCfa, kDataUint8, 1, 0, 8, 256, kCfaRggb},
-        {2, 2, 40, 1, kPixelRaw, kBufferRawCfa, kDataReal32, 1, 0, 32, 0, kCfaRggb},
-        {2, 2, 8, 1, kPixelMono, kBufferRawCfa, kDataUint8, 1, 0, 8, 256, 0}, // CFA for raw only
-        {4, 4, 8, 7, kPixelOther, kBufferRawCfa, kDataUint8, 1, 0, 8, 256, 0},
-        {2, 2, 8, 1, kPixelRaw, kBufferRawCfa, kDataNone, 1, 0, 8, 256, kCfaRggb},
-        {4, 4, 8, 1, kPixelRgb, kBufferRawCfa, kDataUint8, 1, -6},
-        {4, 4, 8, 3, kPixelRaw, kBufferRawCfa, kDataUint8, 1, -6},
-        {0, 4, 8, 1, kPixelRaw, kBufferRawCfa, kDataUint8, 1, -1},
-        {4, -1, 8, 1, kPixelRaw, kBufferRawCfa, kDataUint8, 1, -1},
-        {2, 2, 8, 1, kPixelRaw, kBufferRawCfa, kDataOther, 1},
-        // Sizes that wrap 64 bits must not become small blocks.
-        {0x7FFFFFFF, 0x7FFFFFFF, 16, 1, kPixelRaw, kBufferRawCfa, kDataUint16, 0xFFFFFFFFu, -3},
-        {0x7FFFFFFF, 0x7FFFFFFF, 8, 0xFFFF, kPixelOther, kBufferPlanar, kDataReal32, 0xFFFFFFFFu,
-         -3},
-        {2, 2, 8, 1, kPixelRaw, kBufferRawCfa, kDataUint8, 0, -3},
-    };
-    for (const auto& c : cases) {
+    std::string text;
+    for (const std::string& row : testing_support::dataRows("image/create_cases.txt")) {
+        std::istringstream in(row);
+        std::int32_t w = 0, h = 0;
+        std::uint32_t bits = 0, spp = 0, images = 0;
+        std::string pixel, buffer, type;
+        ASSERT_TRUE(in >> w >> h >> bits >> spp >> pixel >> buffer >> type >> images) << row;
         int rc = 1;
         const ImagePtr image =
-            create(c.w, c.h, c.bits, c.spp, c.pixel, c.buffer, c.type, &rc, c.images, kCfaRggb);
-        ASSERT_EQ(image != nullptr, c.bitsKept != 0) << c.w << "x" << c.h << " type " << c.type;
-        if (c.rc != 0 || c.bitsKept != 0) {
-            EXPECT_EQ(rc, c.rc);
+            create(w, h, static_cast<std::uint16_t>(bits), static_cast<std::uint16_t>(spp),
+                   byName(pixelTypeName, pixel), byName(bufferTypeName, buffer),
+                   byName(dataTypeName, type), &rc, images);
+        std::ostringstream line;
+        line << row << ": rc " << rc;
+        if (image) {
+            line << ", bits " << image->bitsPerSample << ", cfa " << std::hex << image->cfa[1]
+                 << std::dec << ", file " << image->fileType << ", data "
+                 << (image->data != nullptr) << ", white/clip/black/min";
+            for (int ch = 0; ch < 4; ++ch)
+                line << " " << image->level[ch].whiteVal << "/" << image->clip[ch].maxClip << "/"
+                     << image->level[ch].blackVal << "/" << image->clip[ch].minClip;
         }
-        if (!image)
-            continue;
-        EXPECT_EQ(image->bitsPerSample, c.bitsKept);
-        EXPECT_EQ(image->cfa[1], c.cfa);
-        EXPECT_EQ(image->fileType, kFileNone);
-        EXPECT_EQ(image->data != nullptr, c.type != kDataNone);
-        for (int ch = 0; ch < 4; ++ch) {
-            EXPECT_EQ(image->level[ch].whiteVal, c.white);
-            EXPECT_EQ(image->clip[ch].maxClip, c.white);
-            EXPECT_EQ(image->level[ch].blackVal, 0.0f);
-            EXPECT_EQ(image->clip[ch].minClip, 0.0f);
-        }
+        text += line.str() + "\n";
     }
+    testing_support::expectGolden("image/create_results.txt", text);
 }
 
 TEST(ImageBuffer, PlanesMetadataDisplayTestAndNames) {
@@ -261,49 +250,40 @@ std::vector<float> steps(const std::vector<int>& values) { // steps of 1/255 con
     return result;
 }
 
+// Each case's demosaiced rows, in demosaic.txt: a 3 x 3 RGGB image (cross and
+// diagonal averages at the blue site, row and column pairs at green sites,
+// missing neighbours seen twice), a flat colour in every order (it comes back
+// everywhere, borders included), clamping (NaN is black, half steps round up)
+// and lines of one pixel, which read nothing beyond the samples.
 TEST(Demosaic, InterpolatesEachSiteFromItsNeighboursMirroredAtTheEdges) {
-    // R G R / G B G / R G R: cross and diagonal averages at the blue site, row
-    // and column pairs at green sites, missing neighbours seen twice.
-    EXPECT_EQ(demosaiced(bayer(3, 3, kCfaRggb, steps({8, 16, 40, 4, 100, 12, 24, 32, 200}))),
-              "8,10,100 24,16,100 40,14,100\n"
-              "16,4,100 68,16,100 120,12,100\n"
-              "24,18,100 112,32,100 200,22,100\n");
-    // A flat colour comes back everywhere, borders included, in every order.
-    const std::pair<std::uint32_t, const char*> orders[] = {
-        {kCfaRggb, "RGGB"}, {kCfaGrbg, "GRBG"}, {kCfaGbrg, "GBRG"}, {kCfaBggr, "BGGR"}};
-    for (const auto& [cfa, letters] : orders) {
+    std::string text =
+        demosaiced(bayer(3, 3, kCfaRggb, steps({8, 16, 40, 4, 100, 12, 24, 32, 200})));
+    for (const std::uint32_t cfa : {kCfaRggb, kCfaGrbg, kCfaGbrg, kCfaBggr}) {
+        const std::string letters = cfaPatternName(cfa);
         std::vector<float> values;
         for (int y = 0; y < 5; ++y)
             for (int x = 0; x < 7; ++x) {
-                const char colour = letters[(y & 1) * 2 + (x & 1)];
+                const char colour = letters[static_cast<std::size_t>((y & 1) * 2 + (x & 1))];
                 values.push_back(colour == 'R' ? 0.2f : colour == 'G' ? 0.4f : 0.8f);
             }
-        const std::string row =
-            "51,102,204 51,102,204 51,102,204 51,102,204 51,102,204 51,102,204 51,102,204\n";
-        EXPECT_EQ(demosaiced(bayer(7, 5, cfa, values)), row + row + row + row + row) << letters;
+        text += letters + "\n" + demosaiced(bayer(7, 5, cfa, values));
     }
-    // Out-of-range values clamp, NaN is black, half steps round up; lines of
-    // one pixel keep their own colour and read nothing beyond the samples.
-    EXPECT_EQ(demosaiced(bayer(2, 2, kCfaRggb, {1.5f, -0.3f, -0.3f, std::nanf("")})).substr(0, 6),
-              "255,0,");
-    EXPECT_EQ(demosaiced(bayer(2, 2, kCfaRggb, {0.5f, 1.0f, 1.0f, 0.0f})).substr(0, 8), "128,255,");
-    EXPECT_EQ(demosaiced(bayer(1, 1, kCfaRggb, {0.5f})), "128,128,128\n");
-    const std::string column = demosaiced(bayer(1, 4, kCfaGrbg, steps({10, 20, 30, 40})));
-    EXPECT_EQ(column.substr(column.size() - 3), "40\n"); // blue of the last site
-    const std::string line = demosaiced(bayer(5, 1, kCfaBggr, steps({10, 20, 30, 40, 50})));
-    EXPECT_EQ(line.substr(line.size() - 3), "50\n");
+    text += demosaiced(bayer(2, 2, kCfaRggb, {1.5f, -0.3f, -0.3f, std::nanf("")})) +
+            demosaiced(bayer(2, 2, kCfaRggb, {0.5f, 1.0f, 1.0f, 0.0f})) +
+            demosaiced(bayer(1, 1, kCfaRggb, {0.5f})) +
+            demosaiced(bayer(1, 4, kCfaGrbg, steps({10, 20, 30, 40}))) +
+            demosaiced(bayer(5, 1, kCfaBggr, steps({10, 20, 30, 40, 50})));
+    testing_support::expectGolden("image/demosaic.txt", text);
     // Only normalised Bayer images of the four orders.
     int rc = 0;
-    EXPECT_EQ(demosaicToRgb8(nullptr, &rc), nullptr);
-    EXPECT_EQ(rc, -6);
-    EXPECT_EQ(demosaicToRgb8(rawImage(2, 2, 10, kDataUint16).get(), &rc), nullptr);
-    EXPECT_EQ(rc, -6);
-    EXPECT_EQ(demosaicToRgb8(
-                  create(2, 2, 32, 1, kPixelMono, kBufferInterleaved, kDataReal32, &rc).get(), &rc),
-              nullptr);
-    EXPECT_EQ(rc, -6);
-    EXPECT_EQ(demosaicToRgb8(bayer(2, 2, 0x23330000, {0, 0, 0, 0}).get(), &rc), nullptr);
-    EXPECT_EQ(rc, -4);
+    const ImagePtr refused[] = {
+        nullptr, rawImage(2, 2, 10, kDataUint16),
+        create(2, 2, 32, 1, kPixelMono, kBufferInterleaved, kDataReal32, &rc),
+        bayer(2, 2, 0x23330000, {0, 0, 0, 0})};
+    for (const ImagePtr& image : refused) {
+        EXPECT_EQ(demosaicToRgb8(image.get(), &rc), nullptr);
+        EXPECT_EQ(rc, &image == &refused[3] ? -4 : -6);
+    }
 }
 
 // Sizes and offsets past 2 GiB, which a 32-bit host only reaches with 64-bit
