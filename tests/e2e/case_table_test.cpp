@@ -22,6 +22,7 @@ namespace {
 
 namespace fs = std::filesystem;
 using testing_support::readFile;
+using testing_support::words;
 using testing_support::writeFile;
 
 struct Case {
@@ -55,14 +56,6 @@ std::string unescaped(const std::string& text) {
         const char next = text[++i];
         result += next == 'n' ? '\n' : next == 'r' ? '\r' : next == 't' ? '\t' : next;
     }
-    return result;
-}
-
-std::vector<std::string> words(const std::string& text) {
-    std::vector<std::string> result;
-    std::istringstream in(text);
-    for (std::string word; in >> word;)
-        result.push_back(word);
     return result;
 }
 

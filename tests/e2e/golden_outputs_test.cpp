@@ -22,6 +22,7 @@ namespace {
 
 using testing_support::readFile;
 using testing_support::toolCommandPrefix;
+using testing_support::words;
 using testing_support::writeFile;
 
 const std::string kSourceDir = LSC_SOURCE_DIR;
@@ -94,14 +95,6 @@ std::string configText(const GoldenCase& c) {
          << "apply_lsc.max_delta_ab = 10;\n"
          << "blob.log_flag = 1;\n";
     return text.str();
-}
-
-std::vector<std::string> words(const std::string& text) {
-    std::vector<std::string> result;
-    std::istringstream in(text);
-    for (std::string word; in >> word;)
-        result.push_back(word);
-    return result;
 }
 
 // "<md5>  <name>" for each binary output the run wrote, in table order.

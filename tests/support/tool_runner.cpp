@@ -3,6 +3,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
+#include <sstream>
 
 #include <fcntl.h>
 #include <poll.h>
@@ -123,6 +124,14 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir,
         }
     }
     result.status = exitStatus(pid);
+    return result;
+}
+
+std::vector<std::string> words(const std::string& text) {
+    std::vector<std::string> result;
+    std::istringstream in(text);
+    for (std::string word; in >> word;)
+        result.push_back(word);
     return result;
 }
 

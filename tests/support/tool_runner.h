@@ -28,6 +28,9 @@ ToolResult runTool(const std::vector<std::string>& args, const std::string& dir 
 pid_t startTool(const std::vector<std::string>& args, const std::string& dir);
 int exitStatus(pid_t pid);
 
+// The whitespace-separated words of `text`, as a command line's arguments.
+std::vector<std::string> words(const std::string& text);
+
 // What starts a program of this build: empty natively; in a cross build the
 // emulator and its arguments, so tests run the target's programs on the host.
 const std::vector<std::string>& toolPrefix();
