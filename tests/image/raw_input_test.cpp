@@ -59,6 +59,12 @@ std::string described(int rc, const ImageBuffer* image) {
     return text + "\n";
 }
 
+// A fixed-header file whose version field is `version` instead of 1.
+std::string versioned(std::string file, char version) {
+    file[img::kqfix::kVersion] = version;
+    return file;
+}
+
 TEST(RawRead, EachKindOfFileGivesItsImageOrItsCode) {
     const std::pair<const char*, std::string> cases[] = {
         {"fixed header", rawtest::fixedHeaderFile(3, 2, {0, 1, 2, 3, 4, 700})},
@@ -77,6 +83,7 @@ TEST(RawRead, EachKindOfFileGivesItsImageOrItsCode) {
         {"other bytes", "just some bytes"}, // no console to ask
         {"empty", ""},
         {"fixed header, 2 bytes long", rawtest::fixedHeaderFile(2, 1, {5, 6}) + "xx"},
+        {"fixed header, version 2", versioned(rawtest::fixedHeaderFile(2, 1, {5, 6}), 2)},
     };
     std::vector<std::pair<std::string, std::string>> files(std::begin(cases), std::end(cases));
     // The depth comes from the largest sample, with ten bits as the floor.
@@ -274,6 +281,7 @@ TEST(KqRawContainer, ParsedBlocksAreGoldenFiles) {
     ContainerPtr c = parse(minimal().comment("hi").bytes(), &rc);
     EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kComment), 2);
     EXPECT_EQ(kqrawContainerFind(c.get(), kqtag::kMakerNote), -1);
+    EXPECT_EQ(kqrawContainerFindLast(c.get(), kqtag::kFileHeader), 0); // the first block counts
 }
 
 TEST(KqRawContainer, ApiKeepsHeaderPixelsSizesAndTheBlockLimit) {
