@@ -221,7 +221,6 @@ void Pipeline::runStages() {
     }
 }
 
-// The report of a failed run shows what failed and everything computed before.
 // The report and the result file of a failed run show what failed and
 // everything computed before.
 void Pipeline::recordFailure() {
