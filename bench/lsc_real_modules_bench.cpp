@@ -32,6 +32,7 @@
 #include <memory>
 #include <regex>
 #include <sstream>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -105,6 +106,21 @@ struct Capture {
     std::unique_ptr<testing_support::TempDir> dir;
 };
 
+// The rendered shading must pass through the tuning table's values at the
+// cell centres: otherwise these figures would measure the generator, not the
+// calibration.
+void checkCellCentres(const ModuleShading& shading, int width, int height) {
+    for (int channel = 0; channel < 4; ++channel)
+        for (int row = 0; row < ModuleShading::kRows; ++row)
+            for (int column = 0; column < ModuleShading::kColumns; ++column) {
+                const double x = (column + 0.5) * width / ModuleShading::kColumns;
+                const double y = (row + 0.5) * height / ModuleShading::kRows;
+                const double table = shading.cell(channel, column, row);
+                if (std::fabs(shading.at(channel, x, y, width, height) / table - 1) > 1e-9)
+                    throw std::logic_error("rendered shading misses the table at a cell centre");
+            }
+}
+
 const Capture& capture(const Module& module, int temperature, int seed) {
     // The seeds of one module and colour temperature at a time.
     static std::string cached;
@@ -125,6 +141,7 @@ const Capture& capture(const Module& module, int temperature, int seed) {
     shape.cfa = flatfield::cfaOfBayerOrder(module.order);
     shape.module = std::make_shared<const ModuleShading>(
         ModuleShading::fromTuningFile(dataPath(module.file), temperature));
+    checkCellCentres(*shape.module, shape.width, shape.height);
     shape.fullWell = 5000;
     shape.readNoise = 2.5;
     shape.defects = 300;
